@@ -1,0 +1,18 @@
+# orvo_add_tests(<name> <source>...): the test program orvo_<name>_tests, one entry of ctest.
+find_package(GTest REQUIRED)
+
+# Compiled once and reused by every test program: the headers that each of them includes.
+add_library(orvo_test_support STATIC ${PROJECT_SOURCE_DIR}/tests/support/TestMain.cpp)
+target_link_libraries(orvo_test_support PUBLIC orvo orvo_compiler GTest::gtest Threads::Threads)
+target_include_directories(orvo_test_support PUBLIC "${PROJECT_SOURCE_DIR}")
+target_precompile_headers(orvo_test_support PRIVATE
+    <gtest/gtest.h> <algorithm> <cmath> <cstdint> <functional> <map> <memory> <sstream> <string> <vector>)
+
+function(orvo_add_tests name)
+    set(target "orvo_${name}_tests")
+    add_executable(${target} ${ARGN})
+    target_link_libraries(${target} PRIVATE orvo_test_support)
+    target_precompile_headers(${target} REUSE_FROM orvo_test_support)
+    add_test(NAME ${name} COMMAND ${target})
+    set_tests_properties(${name} PROPERTIES TIMEOUT 900)
+endfunction()
