@@ -1,0 +1,7 @@
+#include "orvo/filter_graph/internal/IExecutableBuilder.h"
+
+namespace ORVO::FilterGraph::Internal {
+
+IExecutableBuilder::~IExecutableBuilder() = default;
+
+} // namespace ORVO::FilterGraph::Internal
