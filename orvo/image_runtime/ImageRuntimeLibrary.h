@@ -1,0 +1,101 @@
+#pragma once
+
+#include "orvo/core/Export.h"
+#include "orvo/image_runtime/VideoMemoryConfiguration.h"
+
+#include <vector>
+
+namespace ORVO {
+
+namespace OGL {
+class Context;
+}
+class TexturePool;
+class ShaderManagerOGL;
+
+namespace ImageRuntime {
+
+/// Static entry of the image runtime: started once a process with the OpenGL contexts that the host will work
+/// in, a single null context meaning that there are none and all work is done on the CPU.
+///
+/// Start Core::Library and OGL::Library first:
+///
+///     Core::AutoInitializer core;
+///     OGL::AutoInitializer ogl;
+///     ImageRuntime::AutoInitializer runtime(nullptr, VideoMemory::Configuration());
+///
+/// Threads: initialize() and terminate() while nothing else uses the library; the queries from any thread.
+class ORVO_API Library {
+public:
+    /// What the library holds for one context. All three are null for the single null context.
+    struct DeviceObject {
+        OGL::Context const* pContext_; ///< not owned; outlives the library's use.
+        TexturePool* pTPool_;          ///< owned by the library.
+        ShaderManagerOGL* pSMOGL_;     ///< owned by the library.
+    };
+
+    /// Starts the library.
+    /// @param vpContext the contexts, at least one; a null context only as the single one. Not owned.
+    /// @param configuration what the texture pools are made with.
+    /// @throws InternalException "Core::Library::isInitialized()", "OGL::Library::isInitialized()",
+    /// "vpContext.size()"
+    ///         (an empty list), "!pvDeviceObject_" (started already) or "vpContext.size() == 1" (a null
+    ///         context beside others), in this order; the library stays as it was.
+    /// @throws ResourceException "OpenGL contexts are not supported by this version." for any context that is
+    /// not null.
+    static void initialize(std::vector<OGL::Context const*> const& vpContext,
+                           VideoMemory::Configuration const& configuration);
+    /// The same with a list of one.
+    static void initialize(OGL::Context const* pContext, VideoMemory::Configuration const& configuration);
+
+    /// Stops the library; does nothing more if it is not started.
+    /// @throws InternalException "Core::Library::isInitialized()" or "OGL::Library::isInitialized()".
+    static void terminate();
+
+    static bool isInitialized();
+
+    /// The contexts that the library was started with, in order, null included.
+    /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started.
+    static std::vector<OGL::Context const*> initializationContextList();
+
+    /// The texture pool that serves the current context; null where there is none. Not for the caller to
+    /// delete.
+    /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started.
+    static TexturePool* texturePool();
+
+    /// The shader manager that serves the current context; null where there is none. Not for the caller to
+    /// delete.
+    /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started.
+    static ShaderManagerOGL* shaderManager();
+
+    static bool bNativeIntrinsicsRegistered_;
+    static bool bInterpretedIntrinsicsRegistered_;
+
+private:
+    static std::vector<DeviceObject>* pvDeviceObject_;
+};
+
+/// Starts the library for the length of a scope.
+///
+/// Threads: as Library::initialize().
+class ORVO_API AutoInitializer {
+public:
+    /// Both throw what Library::initialize() throws.
+    AutoInitializer(std::vector<OGL::Context const*> const& vpContext,
+                    VideoMemory::Configuration const& configuration);
+    AutoInitializer(OGL::Context const* pContext, VideoMemory::Configuration const& configuration);
+    /// Stops the library, unless released. No exception leaves it.
+    ~AutoInitializer();
+
+    AutoInitializer(AutoInitializer const&) = delete;
+    AutoInitializer& operator=(AutoInitializer const&) = delete;
+
+    /// The library stays started when the scope ends.
+    void release();
+
+private:
+    bool bArmed_;
+};
+
+} // namespace ImageRuntime
+} // namespace ORVO

@@ -1,0 +1,7 @@
+#include "orvo/image_runtime/images/ImageAccessorBase.h"
+
+namespace ORVO {
+
+ImageAccessorBase::~ImageAccessorBase() = default;
+
+} // namespace ORVO

@@ -1,0 +1,7 @@
+#include "orvo/image_runtime/images/ImageWriteAccessor.h"
+
+namespace ORVO {
+
+ImageWriteAccessor::~ImageWriteAccessor() = default;
+
+} // namespace ORVO

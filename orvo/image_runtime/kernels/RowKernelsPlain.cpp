@@ -1,0 +1,150 @@
+#include "orvo/image_runtime/kernels/RowKernelTables.h"
+
+#include "orvo/core/math/Half.h"
+#include "orvo/core/utility/SaturatingCast.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstring>
+
+namespace ORVO::ImageRuntime::Internal {
+
+void headFloatFromUInt8(float* pOutput, std::uint8_t const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        pOutput[i] = static_cast<float>(pInput[i]) / 255.0f;
+    }
+}
+
+void headFloatFromUInt16(float* pOutput, std::uint16_t const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        pOutput[i] = static_cast<float>(pInput[i]) * 3.0517578125e-05f;
+    }
+}
+
+void headUInt8FromFloat(std::uint8_t* pOutput, float const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        // Out of range, the low byte of the integer is kept.
+        pOutput[i] = static_cast<std::uint8_t>(saturatingCast<std::int32_t>(pInput[i] * 255.0f));
+    }
+}
+
+void headUInt16FromFloat(std::uint16_t* pOutput, float const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        float const clamped = std::min(std::max(pInput[i], 0.0f), 1.0f);
+        pOutput[i] = saturatingCast<std::uint16_t>(std::floor(clamped * 32768.0f + 0.5f));
+    }
+}
+
+namespace {
+
+void groupsFloatFromUInt8(float* pOutput, std::uint8_t const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        pOutput[i] = static_cast<float>(pInput[i]) * (1.0f / 255.0f);
+    }
+}
+
+void groupsFloatFromUInt16(float* pOutput, std::uint16_t const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        pOutput[i] = static_cast<float>(static_cast<double>(pInput[i]) * 3.0517578125e-05);
+    }
+}
+
+/// To the nearest integer, ties to even, whatever the rounding mode of the thread. For numbers from 0 to
+/// 32768.
+float roundedToNearest(float value) {
+    float const lower = std::floor(value);
+    float const fraction = value - lower;
+    bool const bUp = fraction > 0.5f || (fraction == 0.5f && std::fmod(lower, 2.0f) == 1.0f);
+    return bUp ? lower + 1.0f : lower;
+}
+
+template <class Integer>
+void groupsIntegerFromFloat(Integer* pOutput, float const* pInput, std::size_t n, float white) {
+    for (std::size_t i = 0; i < n; ++i) {
+        float const scaled = pInput[i] * white;
+        // The comparisons are false for a NaN, which thus becomes 0.
+        float const clamped = scaled > 0.0f ? std::min(scaled, white) : 0.0f;
+        pOutput[i] = saturatingCast<Integer>(roundedToNearest(clamped));
+    }
+}
+
+void groupsUInt8FromFloat(std::uint8_t* pOutput, float const* pInput, std::size_t n) {
+    groupsIntegerFromFloat(pOutput, pInput, n, 255.0f);
+}
+
+void groupsUInt16FromFloat(std::uint16_t* pOutput, float const* pInput, std::size_t n) {
+    groupsIntegerFromFloat(pOutput, pInput, n, 32768.0f);
+}
+
+/// Splits a row in head, groups of four and tail by the address of its floats.
+template <auto headAndTail, auto groups, class OutputChannel, class InputChannel>
+void inStretches(OutputChannel* pOutput, InputChannel const* pInput, std::size_t n, void const* pFloats) {
+    std::size_t const nHead =
+        std::min<std::size_t>(((16 - (reinterpret_cast<std::uintptr_t>(pFloats) & 15)) >> 2) & 3, n);
+    std::size_t const nGroups = (n - nHead) / 4 * 4;
+    headAndTail(pOutput, pInput, nHead);
+    groups(pOutput + nHead, pInput + nHead, nGroups);
+    headAndTail(pOutput + nHead + nGroups, pInput + nHead + nGroups, n - nHead - nGroups);
+}
+
+void floatFromUInt8(float* pOutput, std::uint8_t const* pInput, std::size_t n, StoreMode) {
+    inStretches<headFloatFromUInt8, groupsFloatFromUInt8>(pOutput, pInput, n, pOutput);
+}
+
+void floatFromUInt16(float* pOutput, std::uint16_t const* pInput, std::size_t n, StoreMode) {
+    inStretches<headFloatFromUInt16, groupsFloatFromUInt16>(pOutput, pInput, n, pOutput);
+}
+
+void uInt8FromFloat(std::uint8_t* pOutput, float const* pInput, std::size_t n, StoreMode) {
+    inStretches<headUInt8FromFloat, groupsUInt8FromFloat>(pOutput, pInput, n, pInput);
+}
+
+void uInt16FromFloat(std::uint16_t* pOutput, float const* pInput, std::size_t n, StoreMode) {
+    inStretches<headUInt16FromFloat, groupsUInt16FromFloat>(pOutput, pInput, n, pInput);
+}
+
+void copyFloat(float* pOutput, float const* pInput, std::size_t n, StoreMode) {
+    if (n) {
+        std::memcpy(pOutput, pInput, n * sizeof(float));
+    }
+}
+
+void floatFromHalf(float* pOutput, std::uint16_t const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        // A signalling NaN is made quiet, as the processor's own conversion does.
+        bool const bNaN = (pInput[i] & 0x7fff) > 0x7c00;
+        pOutput[i] = half::fromBits(static_cast<std::uint16_t>(bNaN ? pInput[i] | 0x0200 : pInput[i]));
+    }
+}
+
+float clampedToUnit(float value) { return value > 1.0f ? 1.0f : value < 0.0f ? 0.0f : value; }
+
+void clampedToUnit(float* pOutput, float const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        pOutput[i] = clampedToUnit(pInput[i]);
+    }
+}
+
+void uInt8FromUnit(std::uint8_t* pOutput, float const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        // In double the product of a float and 255 is exact.
+        pOutput[i] = saturatingCast<std::uint8_t>(static_cast<double>(clampedToUnit(pInput[i])) * 255.0);
+    }
+}
+
+void halfFromUnit(std::uint16_t* pOutput, float const* pInput, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) {
+        pOutput[i] = half(clampedToUnit(pInput[i])).bits();
+    }
+}
+
+} // namespace
+
+RowKernels const& plainRowKernels() {
+    static constexpr RowKernels KERNELS = {
+        floatFromUInt8,     floatFromUInt16, uInt8FromFloat, uInt16FromFloat, copyFloat,
+        headFloatFromUInt8, floatFromHalf,   clampedToUnit,  uInt8FromUnit,   halfFromUnit};
+    return KERNELS;
+}
+
+} // namespace ORVO::ImageRuntime::Internal
