@@ -1,5 +1,5 @@
-// Uses every layer of the installed package through its umbrella headers: a frame of the public graph, an exception
-// and a type test across the library's border.
+// Uses every layer of the installed package through its umbrella headers: a frame of the public graph, an
+// exception and a type test across the library's border.
 #include <orvo/core/Core.h>
 #include <orvo/data_flow/DataFlow.h>
 #include <orvo/filter_graph/FilterGraph.h>
@@ -11,25 +11,25 @@
 #include <cmath>
 #include <cstdio>
 #include <memory>
+#include <string>
 #include <vector>
 
 namespace FG = ORVO::FilterGraph;
 
 namespace {
 
-int check(bool condition, char const* what)
-{
+int check(bool condition, char const* what) {
     if (!condition)
         std::fprintf(stderr, "consumer: failed: %s\n", what);
     return condition ? 0 : 1;
 }
 
 // The bilateral filter of an image of one value gives that value again, in every pixel.
-int filterConstantImage()
-{
+int filterConstantImage() {
     ORVO::PositionExtentInPixelSpace const rectangle(ORVO::PositionInPixelSpace(0, 0),
                                                      ORVO::ExtentInPixelSpace(20, 10));
-    FG::ImageDescriptorCPU const descriptor({4, FG::CHANNEL_TYPE_FLOAT32}, ORVO::PixelExtentInWorldSpace());
+    FG::ImageDescriptorCPU const descriptor({4, FG::ImageDescriptor::CHANNEL_TYPE_FLOAT32},
+                                            ORVO::PixelExtentInWorldSpace());
     std::vector<float> source(20 * 10 * 4, 0.5F);
     for (std::size_t alpha = 3; alpha < source.size(); alpha += 4)
         source[alpha] = 1.0F;
@@ -47,8 +47,8 @@ int filterConstantImage()
     input->setImage(&sourceImage);
     output->setImage(&resultImage);
 
-    FG::IProcessor::OptimizationOptions options;
-    options.setProcessingMode(FG::IProcessor::OptimizationOptions::CPU_PROCESSING);
+    FG::OptimizationOptions options;
+    options.setProcessingMode(FG::OptimizationOptions::CPU_PROCESSING);
     FG::createProcessor(output, nullptr)->processFrame(options);
 
     for (std::size_t i = 0; i < result.size(); ++i)
@@ -57,20 +57,19 @@ int filterConstantImage()
     return 0;
 }
 
-int catchAcrossTheBorder()
-{
+int catchAcrossTheBorder() {
     try {
         FG::FilterFactory::Instance()->create(FG::IFilter::Identifier("no such filter", "", ""));
     } catch (ORVO::InternalException const& failure) {
-        return check(failure.message() == "Enforce pPrototype != NULL", "the message of an unknown filter");
+        return check(failure.message() == std::string("Enforce pPrototype != NULL"),
+                     "the message of an unknown filter");
     }
     return check(false, "an unknown filter is refused");
 }
 
 } // namespace
 
-int main()
-{
+int main() {
     ORVO::Core::AutoInitializer core;
     ORVO::OGL::AutoInitializer ogl;
     ORVO::ImageRuntime::AutoInitializer runtime(nullptr, ORVO::VideoMemory::Configuration());

@@ -1,0 +1,58 @@
+#include "apply_filter/FilterList.h"
+
+#include "apply_filter/FilterValues.h"
+#include "orvo/filter_graph/FilterGraph.h"
+
+#include <ostream>
+
+namespace example {
+
+namespace {
+
+namespace FG = ORVO::FilterGraph;
+
+void listParameter(std::ostream& stream, FG::ParameterBase const& parameter) {
+    stream << "    " << parameter.name() << "  " << typeName(parameter);
+    std::string const text = valueText(parameter);
+    if (!text.empty())
+        stream << "  default " << text;
+    std::string const minimum = valueText(parameter, "Minimum Value");
+    std::string const maximum = valueText(parameter, "Maximum Value");
+    if (!minimum.empty() && !maximum.empty())
+        stream << "  from " << minimum << " to " << maximum;
+    if (auto const* description = parameter.metadataItem("Description"))
+        stream << "\n        " << description->as<std::string>().value();
+    stream << '\n';
+}
+
+void listFilter(std::ostream& stream, FG::IFilter const& filter) {
+    auto const& identifier = filter.identifier();
+    stream << identifier.name() << "  (" << identifier.nameSpace() << ", " << identifier.vendor()
+           << ", version " << identifier.version() << ")\n";
+    for (auto input = filter.inputs(); input.isValid(); ++input) {
+        stream << "    input " << input->name();
+        if (input->nChannel() > 0)
+            stream << "  " << input->nChannel() << " channels";
+        stream << '\n';
+    }
+    for (auto parameter = filter.parameters(); parameter.isValid(); ++parameter)
+        listParameter(stream, **parameter);
+}
+
+} // namespace
+
+std::shared_ptr<FG::IFilter> createFilterNamed(std::string const& name) {
+    FG::FilterFactory& factory = *FG::FilterFactory::Instance();
+    for (auto prototype = factory.prototypes(); prototype.isValid(); ++prototype)
+        if (prototype->identifier().name() == name)
+            return factory.create(prototype->identifier());
+    return {};
+}
+
+void listFilters(std::ostream& stream) {
+    FG::FilterFactory& factory = *FG::FilterFactory::Instance();
+    for (auto prototype = factory.prototypes(); prototype.isValid(); ++prototype)
+        listFilter(stream, *factory.create(prototype->identifier()));
+}
+
+} // namespace example

@@ -1,0 +1,208 @@
+// Reading and writing of picture files, all through OpenImageIO.
+#include "common/Picture.h"
+
+#include <OpenImageIO/imageio.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <filesystem>
+#include <system_error>
+
+#include <unistd.h>
+
+namespace example {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr float white15_1 = 32768.0F;
+
+// OpenImageIO's own messages may have several lines: the first one says it.
+std::string firstLine(std::string const& text) { return text.substr(0, text.find('\n')); }
+
+std::unique_ptr<OIIO::ImageInput> openForReading(std::string const& path) {
+    if (!fs::exists(path))
+        throw PictureError("Cannot read " + path + ": no such file");
+    OIIO::ImageSpec hints;
+    hints["oiio:UnassociatedAlpha"] = 1;
+    auto input = OIIO::ImageInput::open(path, &hints);
+    if (!input)
+        throw PictureError("Cannot read " + path + ": " + firstLine(OIIO::geterror()));
+    int const channels = input->spec().nchannels;
+    if (channels < 1 || channels > 4)
+        throw PictureError("Cannot read " + path + ": it has " + std::to_string(channels) +
+                           " channels, and 1 to 4 are supported");
+    if (input->spec().depth > 1)
+        throw PictureError("Cannot read " + path + ": volumes are not supported");
+    return input;
+}
+
+// Divides the colour by alpha, or multiplies with it.
+void changeAlpha(std::vector<float>& pixels, std::size_t channels, bool divide) {
+    for (std::size_t pixel = 0; pixel + channels <= pixels.size(); pixel += channels) {
+        float const alpha = pixels[pixel + channels - 1];
+        if (divide && alpha == 0.0F)
+            continue;
+        for (std::size_t channel = 0; channel + 1 < channels; ++channel)
+            pixels[pixel + channel] =
+                divide ? pixels[pixel + channel] / alpha : pixels[pixel + channel] * alpha;
+    }
+}
+
+void floatsToPicture(std::vector<float> const& values, Picture& picture) {
+    if (picture.depth == Depth::float32) {
+        std::copy(values.begin(), values.end(), reinterpret_cast<float*>(picture.pixels.data()));
+        return;
+    }
+    auto const quantised = [](float value, float white) {
+        float const scaled = std::isnan(value) ? 0.0F : std::clamp(value, 0.0F, 1.0F) * white;
+        return std::floor(scaled + 0.5F);
+    };
+    auto* words = reinterpret_cast<std::uint16_t*>(picture.pixels.data());
+    for (std::size_t i = 0; i < values.size(); ++i) {
+        if (picture.depth == Depth::uint8)
+            picture.pixels[i] = static_cast<unsigned char>(quantised(values[i], 255.0F));
+        else
+            words[i] = static_cast<std::uint16_t>(quantised(values[i], white15_1));
+    }
+}
+
+std::vector<float> pictureToFloats(Picture const& picture) {
+    std::vector<float> values(picture.width * picture.height * picture.channels);
+    auto const* floats = reinterpret_cast<float const*>(picture.pixels.data());
+    auto const* words = reinterpret_cast<std::uint16_t const*>(picture.pixels.data());
+    for (std::size_t i = 0; i < values.size(); ++i) {
+        if (picture.depth == Depth::float32)
+            values[i] = floats[i];
+        else if (picture.depth == Depth::uint8)
+            values[i] = static_cast<float>(picture.pixels[i]) / 255.0F;
+        else
+            values[i] = static_cast<float>(words[i]) / white15_1;
+    }
+    return values;
+}
+
+std::string extensionOf(std::string const& path) {
+    std::string extension = fs::path(path).extension().string();
+    std::transform(extension.begin(), extension.end(), extension.begin(),
+                   [](unsigned char letter) { return static_cast<char>(std::tolower(letter)); });
+    return extension;
+}
+
+// What the file's channels are stored as: the picture's depth where the format knows it.
+OIIO::TypeDesc fileType(std::string const& extension, Depth depth) {
+    if (extension == ".jpg" || extension == ".jpeg" || (depth == Depth::uint8 && extension != ".exr"))
+        return OIIO::TypeDesc::UINT8;
+    if (extension == ".exr")
+        return depth == Depth::uint8 ? OIIO::TypeDesc::HALF : OIIO::TypeDesc::FLOAT;
+    bool const floats = depth == Depth::float32 && extension != ".png";
+    return floats ? OIIO::TypeDesc::FLOAT : OIIO::TypeDesc::UINT16;
+}
+
+std::unique_ptr<OIIO::ImageOutput> outputFor(std::string const& path) {
+    auto output = OIIO::ImageOutput::create(path);
+    if (!output)
+        throw PictureError("Cannot write " + path + ": " + firstLine(OIIO::geterror()));
+    return output;
+}
+
+fs::path temporaryBeside(std::string const& path) {
+    fs::path const target(path);
+    return target.parent_path() /
+           ("." + target.stem().string() + "." + std::to_string(::getpid()) + target.extension().string());
+}
+
+// Removes the temporary file unless it was renamed.
+class TemporaryFile {
+public:
+    explicit TemporaryFile(fs::path path) : path_(std::move(path)) {}
+    TemporaryFile(TemporaryFile const&) = delete;
+    TemporaryFile& operator=(TemporaryFile const&) = delete;
+    ~TemporaryFile() {
+        std::error_code ignored;
+        fs::remove(path_, ignored);
+    }
+
+    [[nodiscard]] fs::path const& path() const { return path_; }
+
+private:
+    fs::path path_;
+};
+
+std::vector<float> withoutAlpha(std::vector<float> const& pixels, std::size_t channels) {
+    std::vector<float> result;
+    result.reserve(pixels.size() / channels * (channels - 1));
+    for (std::size_t pixel = 0; pixel < pixels.size(); pixel += channels)
+        result.insert(result.end(), pixels.begin() + static_cast<std::ptrdiff_t>(pixel),
+                      pixels.begin() + static_cast<std::ptrdiff_t>(pixel + channels - 1));
+    return result;
+}
+
+} // namespace
+
+Depth depthOfFile(std::string const& path) {
+    OIIO::TypeDesc const type = openForReading(path)->spec().format;
+    if (type.is_floating_point())
+        return Depth::float32;
+    return type.size() == 1 ? Depth::uint8 : Depth::uint15_1;
+}
+
+Picture readPicture(std::string const& path, Depth depth) {
+    auto const input = openForReading(path);
+    OIIO::ImageSpec const& spec = input->spec();
+    Picture picture(static_cast<std::size_t>(spec.width), static_cast<std::size_t>(spec.height),
+                    static_cast<std::size_t>(spec.nchannels), depth);
+    std::vector<float> values(picture.width * picture.height * picture.channels);
+    if (!input->read_image(0, 0, 0, spec.nchannels, OIIO::TypeDesc::FLOAT, values.data()))
+        throw PictureError("Cannot read " + path + ": " + firstLine(input->geterror()));
+    if (picture.hasAlpha() && spec.get_int_attribute("oiio:UnassociatedAlpha") == 0)
+        changeAlpha(values, picture.channels, true);
+    floatsToPicture(values, picture);
+    return picture;
+}
+
+void checkWritable(std::string const& path) {
+    static_cast<void>(outputFor(path));
+    fs::path const folder = fs::path(path).parent_path();
+    if (fs::is_directory(path))
+        throw PictureError("Cannot write " + path + ": it is a folder");
+    if (!folder.empty() && !fs::is_directory(folder))
+        throw PictureError("Cannot write " + path + ": no such folder");
+    if (::access(folder.empty() ? "." : folder.c_str(), W_OK) != 0)
+        throw PictureError("Cannot write " + path + ": the folder is not writable");
+}
+
+void writePicture(std::string const& path, Picture const& picture) {
+    checkWritable(path);
+    std::string const extension = extensionOf(path);
+    auto const output = outputFor(path);
+    std::vector<float> values = pictureToFloats(picture);
+    std::size_t channels = picture.channels;
+    if (picture.hasAlpha()) {
+        bool const keepsAlpha = output->supports("alpha");
+        if (!keepsAlpha || extension == ".exr")
+            changeAlpha(values, channels, false);
+        if (!keepsAlpha)
+            values = withoutAlpha(values, channels--);
+    }
+
+    OIIO::ImageSpec spec(static_cast<int>(picture.width), static_cast<int>(picture.height),
+                         static_cast<int>(channels), fileType(extension, picture.depth));
+    spec.alpha_channel =
+        channels == picture.channels && picture.hasAlpha() ? static_cast<int>(channels) - 1 : -1;
+    if (spec.alpha_channel >= 0 && extension != ".exr")
+        spec["oiio:UnassociatedAlpha"] = 1;
+
+    TemporaryFile const temporary(temporaryBeside(path));
+    if (!output->open(temporary.path().string(), spec) ||
+        !output->write_image(OIIO::TypeDesc::FLOAT, values.data()) || !output->close())
+        throw PictureError("Cannot write " + path + ": " + firstLine(output->geterror()));
+    std::error_code failure;
+    fs::rename(temporary.path(), path, failure);
+    if (failure)
+        throw PictureError("Cannot write " + path + ": " + failure.message());
+}
+
+} // namespace example
