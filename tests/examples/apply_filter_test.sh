@@ -1,0 +1,94 @@
+#!/usr/bin/env bash
+# apply_filter_test.sh PROGRAM DATA SCRATCH: runs the example host with good and with bad command lines.
+set -u
+program=$1 data=$2 scratch=$3
+failures=0
+rm -rf "$scratch"
+mkdir -p "$scratch"
+
+fail() {
+    echo "FAILED: $*"
+    failures=$((failures + 1))
+}
+
+# refused STATUS PATTERN ARGUMENT...: ends with STATUS, one line on standard error that has PATTERN, no output file.
+refused() {
+    local status=$1 pattern=$2
+    shift 2
+    rm -f "$scratch/out.png"
+    "$program" "$@" > "$scratch/stdout" 2> "$scratch/stderr"
+    local got=$?
+    [ $got -eq "$status" ] || fail "status $got, not $status: $*"
+    [ "$(wc -l < "$scratch/stderr")" -eq 1 ] || fail "not one line: $(cat "$scratch/stderr")"
+    grep -qF -- "$pattern" "$scratch/stderr" || fail "no \"$pattern\" in: $(cat "$scratch/stderr")"
+    [ ! -e "$scratch/out.png" ] || fail "an output file is there: $*"
+    [ -z "$(find "$scratch" -name '.*')" ] || fail "a temporary file is left: $*"
+}
+
+# accepted ARGUMENT...: ends well, silently.
+accepted() {
+    "$program" "$@" > "$scratch/stdout" 2> "$scratch/stderr" || fail "refused: $* ($(cat "$scratch/stderr"))"
+    [ ! -s "$scratch/stderr" ] || fail "standard error: $(cat "$scratch/stderr")"
+}
+
+photograph="$data/astronaut.png"
+bilateral=(--filter FastBilateralBlur)
+
+accepted "${bilateral[@]}" "$photograph" "$scratch/reference.png"
+for variation in "--threads 1" "--threads 8" "--async" "--repeat 3" "--async --repeat 2"; do
+    # shellcheck disable=SC2086
+    accepted "${bilateral[@]}" $variation "$photograph" "$scratch/same.png"
+    cmp -s "$scratch/reference.png" "$scratch/same.png" || fail "another picture with $variation"
+done
+[ "$(grep -c '^frame [12]: [0-9.]* ms$' "$scratch/stdout")" -eq 2 ] || fail "times: $(cat "$scratch/stdout")"
+for precision in 8 16 32f; do
+    for extension in png tif jpg exr; do
+        accepted "${bilateral[@]}" --precision $precision "$photograph" "$scratch/out.$extension"
+        [ -s "$scratch/out.$extension" ] || fail "no out.$extension"
+    done
+done
+accepted "${bilateral[@]}" --set spatialSigma=4,4 --set rangeSigma=0.1 --set colorize=true \
+    "$photograph" "$scratch/colour.png"
+cmp -s "$scratch/reference.png" "$scratch/colour.png" && fail "colorize changes nothing"
+for filter in SimpleBilateralCPU RGBToLABCPU LABToRGBCPU FastBilateralFilter; do
+    accepted --filter $filter "$data/chelsea.png" "$scratch/$filter.png"
+done
+
+accepted --list
+for line in 'FastBilateralBlur  (Motion Loft, Norvane Works, version 1)' \
+    'spatialSigma  float2  default 10,10  from 0.1,0.1 to 100,100' 'rangeSigma  float  default 0.15' \
+    'colorize  bool  default false' 'input src' 'RGBToLABCPU' 'SimpleBilateralCPU'; do
+    grep -qF "$line" "$scratch/stdout" || fail "no \"$line\" in the list"
+done
+accepted --help
+grep -q '^Usage: apply_filter' "$scratch/stdout" || fail "no usage in --help"
+
+refused 2 'There is no filter "Nonsense"' --filter Nonsense "$photograph" "$scratch/out.png"
+refused 2 'has no parameter "sigma"' "${bilateral[@]}" --set sigma=1 "$photograph" "$scratch/out.png"
+refused 2 'is of type float2, which "10" is not' "${bilateral[@]}" --set spatialSigma=10 "$photograph" "$scratch/out.png"
+refused 2 'is of type float, which "wide" is not' "${bilateral[@]}" --set rangeSigma=wide "$photograph" "$scratch/out.png"
+refused 2 'is of type bool, which "yes" is not' "${bilateral[@]}" --set colorize=yes "$photograph" "$scratch/out.png"
+refused 1 'no such file' "${bilateral[@]}" "$scratch/none.png" "$scratch/out.png"
+refused 1 'Cannot read' "${bilateral[@]}" "$0" "$scratch/out.png"
+refused 1 'no such folder' "${bilateral[@]}" "$photograph" "$scratch/none/out.png"
+refused 1 'Cannot write' "${bilateral[@]}" "$photograph" "$scratch/out.nonsense"
+
+# A value outside its interval is a warning: the picture is written.
+rm -f "$scratch/out.png"
+"$program" "${bilateral[@]}" --set rangeSigma=2 "$photograph" "$scratch/out.png" 2> "$scratch/stderr" ||
+    fail "a value outside its interval is refused"
+grep -qF 'warning: rangeSigma=2 is outside 0.01 to 1' "$scratch/stderr" || fail "warning: $(cat "$scratch/stderr")"
+[ -s "$scratch/out.png" ] || fail "no picture after a warning"
+
+# An interrupt cancels the frame: no output, status 130.
+rm -f "$scratch/out.png"
+"$program" "${bilateral[@]}" --async --repeat 100000 "$photograph" "$scratch/out.png" > /dev/null 2> "$scratch/stderr" &
+sleep 1
+kill -TERM $!
+wait $!
+[ $? -eq 130 ] || fail "status of an interrupted run"
+grep -q 'cancelled, nothing was written' "$scratch/stderr" || fail "interrupt: $(cat "$scratch/stderr")"
+[ ! -e "$scratch/out.png" ] || fail "an output file after an interrupt"
+
+[ $failures -eq 0 ] && echo "all passed"
+exit $failures
