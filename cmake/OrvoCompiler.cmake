@@ -25,6 +25,14 @@ if(ORVO_WARNINGS_AS_ERRORS)
     target_compile_options(orvo_compiler INTERFACE -Werror)
 endif()
 
+# For the sources that hold kernels of one instruction set, chosen at run time by what the processor has.
+set(ORVO_AVX2_OPTIONS -mavx2 -mf16c)
+set(ORVO_AVX512_OPTIONS -mavx512f -mavx512bw -mavx512dq -mavx512vl -mf16c)
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+    # GCC 12 warns of uninitialised values inside its own intrinsics (its bug 105593).
+    list(APPEND ORVO_AVX512_OPTIONS -Wno-maybe-uninitialized)
+endif()
+
 if(ORVO_SANITIZE STREQUAL "address")
     set(orvo_sanitizer_flags -fsanitize=address,undefined -fno-sanitize-recover=all -fno-omit-frame-pointer)
 elseif(ORVO_SANITIZE STREQUAL "thread")
