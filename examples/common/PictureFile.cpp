@@ -108,10 +108,15 @@ std::unique_ptr<OIIO::ImageOutput> outputFor(std::string const& path) {
     return output;
 }
 
-fs::path temporaryBeside(std::string const& path) {
+fs::path temporaryBeside(std::string const& path)
+{
     fs::path const target(path);
-    return target.parent_path() /
-           ("." + target.stem().string() + "." + std::to_string(::getpid()) + target.extension().string());
+    std::string name(1, '.');
+    name += target.stem().string();
+    name += '.';
+    name += std::to_string(::getpid());
+    name += target.extension().string();
+    return target.parent_path() / name;
 }
 
 // Removes the temporary file unless it was renamed.
