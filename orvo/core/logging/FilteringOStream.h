@@ -27,6 +27,10 @@ public:
         fill(stream.fill());
     }
 
+    /// On a stream of this very class: nests, rather than copies.
+    explicit FilteringOStream(FilteringOStream& stream)
+        : FilteringOStream(static_cast<std::ostream&>(stream)) {}
+
     Inserter& inserter() noexcept { return oBuffer_.inserter(); }
 
     /// The inserter's setIndent.
