@@ -1,0 +1,26 @@
+#pragma once
+
+#include "orvo/data_flow/controllers/Controller.h"
+#include "orvo/data_flow/controllers/ControllerImpl.h"
+#include "orvo/data_flow/librarian/NodeLibrarian.h"
+
+#include <memory>
+#include <utility>
+
+namespace ORVO::DataFlow::internal {
+
+/// Reaches what no client can, for states that cannot arise otherwise.
+struct TestAccess {
+    static std::unique_ptr<FrameLatch> takeRoot(Controller& controller) {
+        return std::move(controller.pImpl_->pRoot_);
+    }
+    static void giveRoot(Controller& controller, std::unique_ptr<FrameLatch> pRoot) {
+        controller.pImpl_->pRoot_ = std::move(pRoot);
+    }
+    static std::size_t rootCount(Controller& controller) { return controller.pImpl_->root()->count(); }
+
+    static void createLibrarian() { NodeLibrarian::Create(); }
+    static void destroyLibrarian() { NodeLibrarian::Destroy(); }
+};
+
+} // namespace ORVO::DataFlow::internal
