@@ -1,0 +1,30 @@
+#pragma once
+
+// Everything that a program needs to build data-flow graphs, run frames on them, and look nodes up by their
+// identity.
+
+#include "orvo/data_flow/DataFlowLibrary.h"
+#include "orvo/data_flow/connectors/Connect.h"
+#include "orvo/data_flow/connectors/Connector.h"
+#include "orvo/data_flow/connectors/ConnectorNameEquals.h"
+#include "orvo/data_flow/connectors/InputConnector.h"
+#include "orvo/data_flow/connectors/Inputs.h"
+#include "orvo/data_flow/connectors/OutputConnector.h"
+#include "orvo/data_flow/connectors/Outputs.h"
+#include "orvo/data_flow/connectors/ParameterInput.h"
+#include "orvo/data_flow/controllers/Controller.h"
+#include "orvo/data_flow/data/ConstDataPointer.h"
+#include "orvo/data_flow/librarian/CreateNodeFunctionNodeFactory.h"
+#include "orvo/data_flow/librarian/MetaDataBase.h"
+#include "orvo/data_flow/librarian/NodeFactory.h"
+#include "orvo/data_flow/librarian/NodeLibrarian.h"
+#include "orvo/data_flow/librarian/NodeMetaData.h"
+#include "orvo/data_flow/librarian/NodeMetaDataSorter.h"
+#include "orvo/data_flow/librarian/NodeTargetType.h"
+#include "orvo/data_flow/nodes/Node.h"
+#include "orvo/data_flow/parameters/IntervalParameter.h"
+#include "orvo/data_flow/parameters/Parameter.h"
+#include "orvo/data_flow/parameters/ParameterBase.h"
+#include "orvo/data_flow/parameters/ParameterNameEquals.h"
+#include "orvo/data_flow/parameters/ParameterSet.h"
+#include "orvo/data_flow/parameters/ParameterVisitorBase.h"
