@@ -1,0 +1,164 @@
+#include "orvo/data_flow/parameters/IntervalParameter.h"
+
+#include "tests/data_flow/parameters/ParameterSamples.h"
+#include "tests/support/Expect.h"
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <sstream>
+
+namespace {
+
+using namespace ORVO::DataFlow;
+using ORVO::Test::Samples;
+
+void setAllClean(ParameterBase& oParameter) {
+    oParameter.setClean();
+    oParameter.setCleanSimpleCaching();
+    oParameter.setCleanGlyphcast();
+}
+
+bool anyFlag(ParameterBase const& oParameter) {
+    return oParameter.isDirty() || oParameter.isDirtySimpleCaching() || oParameter.isDirtyGlyphcast();
+}
+
+bool allFlags(ParameterBase const& oParameter) {
+    return oParameter.isDirty() && oParameter.isDirtySimpleCaching() && oParameter.isDirtyGlyphcast();
+}
+
+template <typename T>
+class IntervalParameterTest : public testing::Test {};
+TYPED_TEST_SUITE(IntervalParameterTest, ORVO::Test::IntervalParameterTypes);
+
+TYPED_TEST(IntervalParameterTest, HasBoundsBesideItsValue) {
+    using T = TypeParam;
+    IntervalParameter<T> const oParameter(Samples<T>::first(), Samples<T>::second(), Samples<T>::first(),
+                                          "name", "text");
+    EXPECT_TRUE(oParameter.isInterval());
+    EXPECT_TRUE(oParameter.value() == Samples<T>::first());
+    EXPECT_TRUE(oParameter.defaultValue() == Samples<T>::first());
+    EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::second());
+    EXPECT_TRUE(oParameter.upperBound() == Samples<T>::first());
+    EXPECT_EQ("name", oParameter.name());
+    EXPECT_EQ("text", oParameter.description());
+    EXPECT_TRUE(oParameter.datatype() == typeid(T));
+    EXPECT_TRUE(allFlags(oParameter));
+    IntervalParameter<T> const oShort(Samples<T>::first(), Samples<T>::second(), Samples<T>::first(), "name");
+    EXPECT_EQ("", oShort.description());
+    auto const spCreated = IntervalParameter<T>::create(Samples<T>::first(), Samples<T>::first(),
+                                                        Samples<T>::second(), "n", "d");
+    EXPECT_TRUE(spCreated->upperBound() == Samples<T>::second());
+    EXPECT_EQ("d", spCreated->description());
+}
+
+TYPED_TEST(IntervalParameterTest, ClonesItsBounds) {
+    using T = TypeParam;
+    IntervalParameter<T> oParameter(Samples<T>::first(), Samples<T>::first(), Samples<T>::second(), "name",
+                                    "text");
+    oParameter.setValue(Samples<T>::second());
+    setAllClean(oParameter);
+    std::shared_ptr<ParameterBase> const spClone = oParameter.clone();
+    ASSERT_TRUE(spClone->isInterval());
+    auto const& oClone = dynamic_cast<IntervalParameter<T> const&>(*spClone);
+    EXPECT_TRUE(oClone.value() == Samples<T>::second());
+    EXPECT_TRUE(oClone.defaultValue() == Samples<T>::first());
+    EXPECT_TRUE(oClone.lowerBound() == Samples<T>::first());
+    EXPECT_TRUE(oClone.upperBound() == Samples<T>::second());
+    EXPECT_EQ("name", oClone.name());
+    EXPECT_EQ("text", oClone.description());
+    EXPECT_TRUE(allFlags(oClone));
+    std::shared_ptr<ParameterBase> const spRenamed = oParameter.clone("other");
+    EXPECT_EQ("other", spRenamed->name());
+    EXPECT_TRUE(spRenamed->isInterval());
+}
+
+TYPED_TEST(IntervalParameterTest, CloneParameterGivesAPlainOne) {
+    using T = TypeParam;
+    IntervalParameter<T> oParameter(Samples<T>::first(), Samples<T>::first(), Samples<T>::second(), "name",
+                                    "text");
+    std::shared_ptr<Parameter<T>> const spClone = oParameter.cloneParameter();
+    EXPECT_FALSE(spClone->isInterval());
+    EXPECT_TRUE(spClone->value() == Samples<T>::first());
+    EXPECT_EQ("text", spClone->description());
+}
+
+TYPED_TEST(IntervalParameterTest, TakesTheBoundsOfAnIntervalWithoutAFlag) {
+    using T = TypeParam;
+    IntervalParameter<T> oParameter(Samples<T>::first(), Samples<T>::first(), Samples<T>::first(), "name");
+    IntervalParameter<T> const oSource(Samples<T>::first(), Samples<T>::second(), Samples<T>::second(),
+                                       "source");
+    setAllClean(oParameter);
+    oParameter.setValueFromParameter(oSource);
+    EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::second());
+    EXPECT_TRUE(oParameter.upperBound() == Samples<T>::second());
+    EXPECT_FALSE(anyFlag(oParameter));
+}
+
+TYPED_TEST(IntervalParameterTest, KeepsItsBoundsWhenTheSourceHasNone) {
+    using T = TypeParam;
+    IntervalParameter<T> oParameter(Samples<T>::first(), Samples<T>::first(), Samples<T>::first(), "name");
+    Parameter<T> const oSource(Samples<T>::second(), "source");
+    setAllClean(oParameter);
+    oParameter.setValueFromParameter(oSource);
+    EXPECT_TRUE(oParameter.value() == Samples<T>::second());
+    EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::first());
+    EXPECT_TRUE(oParameter.upperBound() == Samples<T>::first());
+    EXPECT_TRUE(allFlags(oParameter));
+}
+
+TYPED_TEST(IntervalParameterTest, RefusesAnotherTypeAndKeepsItsBounds) {
+    using T = TypeParam;
+    IntervalParameter<T> oParameter(Samples<T>::first(), Samples<T>::first(), Samples<T>::first(), "name");
+    IntervalParameter<short> const oForeign(1, 0, 2, "foreign");
+    setAllClean(oParameter);
+    ORVO_EXPECT_INTERNAL(oParameter.setValueFromParameter(oForeign), "isOfType<T>()");
+    EXPECT_TRUE(oParameter.value() == Samples<T>::first());
+    EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::first());
+    EXPECT_FALSE(anyFlag(oParameter));
+}
+
+TEST(IntervalParameterValueTest, BoundsAreNotEnforced) {
+    IntervalParameter<float> oParameter(0.5f, 0.0f, 1.0f, "mix");
+    oParameter.setValue(2.0f);
+    EXPECT_EQ(2.0f, oParameter.value());
+    oParameter.setValueFromParameter(Parameter<float>(-3.0f, "source"));
+    EXPECT_EQ(-3.0f, oParameter.value());
+    EXPECT_EQ(0.0f, oParameter.lowerBound());
+    EXPECT_EQ(1.0f, oParameter.upperBound());
+    IntervalParameter<int> const oOutside(7, 1, 0, "outside");
+    EXPECT_EQ(7, oOutside.value());
+    EXPECT_EQ(1, oOutside.lowerBound());
+    EXPECT_EQ(0, oOutside.upperBound());
+}
+
+TEST(IntervalParameterValueTest, APlainParameterTakesTheValueAlone) {
+    Parameter<float> oParameter(0.0f, "plain");
+    oParameter.setValueFromParameter(IntervalParameter<float>(0.5f, 0.0f, 1.0f, "mix"));
+    EXPECT_EQ(0.5f, oParameter.value());
+    EXPECT_FALSE(oParameter.isInterval());
+}
+
+TEST(IntervalParameterValueTest, WritesAsAPlainOne) {
+    std::ostringstream oText;
+    oText << IntervalParameter<float>(0.5f, 0.0f, 1.0f, "mix", "of both");
+    EXPECT_EQ("mix of both 0.5", oText.str());
+}
+
+TEST(IntervalParameterValueTest, CopiesTakeBoundsAndFlagsOver) {
+    IntervalParameter<int> oParameter(1, 0, 2, "name");
+    setAllClean(oParameter);
+    IntervalParameter<int> const oCopy(oParameter);
+    IntervalParameter<int> oAssigned(5, 5, 5, "other");
+    oAssigned = oParameter;
+    for (IntervalParameter<int> const* const pCopy :
+         {&oCopy, static_cast<IntervalParameter<int> const*>(&oAssigned)}) {
+        EXPECT_EQ(1, pCopy->value());
+        EXPECT_EQ(0, pCopy->lowerBound());
+        EXPECT_EQ(2, pCopy->upperBound());
+        EXPECT_EQ("name", pCopy->name());
+        EXPECT_FALSE(anyFlag(*pCopy));
+    }
+}
+
+} // namespace
