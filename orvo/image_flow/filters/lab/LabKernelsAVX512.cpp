@@ -1,0 +1,20 @@
+#include "orvo/image_flow/filters/lab/LabKernelTables.h"
+#include "orvo/image_flow/filters/lab/LabKernels.h"
+
+#include "orvo/image_flow/filters/vector/VectorAVX512.h"
+
+#include "orvo/image_flow/filters/vector/VectorMath.h"
+
+#include "orvo/image_flow/filters/lab/LabVector.h"
+
+#include "orvo/image_flow/filters/lab/LabKernelBody.h"
+
+namespace ORVO::ImageFlow::lab {
+
+namespace {
+LabKernels const kKernels = {transformLabRow<LabVector::toLab>, transformLabRow<LabVector::toRGB>};
+}
+
+LabKernels const& labKernelsAVX512() { return kKernels; }
+
+} // namespace ORVO::ImageFlow::lab
