@@ -10,14 +10,14 @@
 
 namespace ORVO::FilterGraph {
 
-std::shared_ptr<IProcessor> createProcessor(std::shared_ptr<IOutputAdapter> output, OGL::Context const* context)
-{
-    return std::make_shared<Internal::StandardProcessor>(dynamic_cast<Internal::OutputAdapter*>(output.get()), context);
+std::shared_ptr<IProcessor> createProcessor(std::shared_ptr<IOutputAdapter> output,
+                                            OGL::Context const* context) {
+    return std::make_shared<Internal::StandardProcessor>(dynamic_cast<Internal::OutputAdapter*>(output.get()),
+                                                         context);
 }
 
 std::shared_ptr<IEmbeddedProcessor> createEmbeddedProcessor(std::shared_ptr<IOutputAdapter> output,
-                                                            OGL::Context const* context)
-{
+                                                            OGL::Context const* context) {
     return std::make_shared<Internal::Processor>(dynamic_cast<Internal::OutputAdapter*>(output.get()),
                                                  IAdapter::REGION_SYNC_EXPLICIT, context);
 }

@@ -6,14 +6,11 @@
 namespace ORVO::FilterGraph::Internal {
 
 CheckTimeStampVisitor::CheckTimeStampVisitor(std::map<Filter*, std::shared_ptr<Filter>> const* pClones)
-    : pClones_(pClones)
-{
-}
+    : pClones_(pClones) {}
 
 CheckTimeStampVisitor::~CheckTimeStampVisitor() = default;
 
-void CheckTimeStampVisitor::preVisit(Filter* pFilter)
-{
+void CheckTimeStampVisitor::preVisit(Filter* pFilter) {
     if (!bUpToDate_) {
         return;
     }

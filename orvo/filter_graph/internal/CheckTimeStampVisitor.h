@@ -7,8 +7,8 @@
 
 namespace ORVO::FilterGraph::Internal {
 
-/// Finds out whether the clones of a graph still stand for it: each filter visited must have a clone that was made at
-/// the filter's present time stamp.
+/// Finds out whether the clones of a graph still stand for it: each filter visited must have a clone that was
+/// made at the filter's present time stamp.
 ///
 /// Threads: the thread that owns the graph.
 class ORVO_API CheckTimeStampVisitor : public INodeVisitor {

@@ -5,15 +5,13 @@
 namespace ORVO::FilterGraph::Internal {
 
 ClientImageSource::ClientImageSource()
-    : oChange_(0, "ContentChange", "Number of times that the pixels of the source may have changed")
-{
+    : oChange_(0, "ContentChange", "Number of times that the pixels of the source may have changed") {
     registerParameter(&oChange_);
 }
 
 ClientImageSource::~ClientImageSource() = default;
 
-void ClientImageSource::noteContent(ImageCPU const* pImage, std::uint64_t contentStamp)
-{
+void ClientImageSource::noteContent(ImageCPU const* pImage, std::uint64_t contentStamp) {
     void const* const pPixels = pImage ? pImage->pixels() : nullptr;
     PositionExtentInPixelSpace const rect = pImage ? pImage->positionExtent() : PositionExtentInPixelSpace();
     bool const bSame = contentStamp != 0 && contentStamp == iLastStamp_ && pImage == pLastImage_ &&

@@ -9,8 +9,9 @@
 
 namespace ORVO::FilterGraph::Internal {
 
-/// The source of a compiled graph: an `ImageCPUInput` that knows whether the client's image may have changed. It
-/// counts the changes in the parameter "ContentChange", so that the dirty pass sees them like any other change.
+/// The source of a compiled graph: an `ImageCPUInput` that knows whether the client's image may have changed.
+/// It counts the changes in the parameter "ContentChange", so that the dirty pass sees them like any other
+/// change.
 ///
 /// Threads: as `ImageCPUInput`.
 class ORVO_API ClientImageSource : public ImageCPUInput {
@@ -18,8 +19,9 @@ public:
     ClientImageSource();
     ~ClientImageSource() override;
 
-    /// To be called with the image of each frame (not owned, may be null) and its content stamp. Counts a change unless
-    /// `contentStamp` is not 0 and image, pixels, rectangle (pixel space) and stamp are those of the last call.
+    /// To be called with the image of each frame (not owned, may be null) and its content stamp. Counts a
+    /// change unless `contentStamp` is not 0 and image, pixels, rectangle (pixel space) and stamp are those
+    /// of the last call.
     void noteContent(ImageCPU const* pImage, std::uint64_t contentStamp);
 
 private:

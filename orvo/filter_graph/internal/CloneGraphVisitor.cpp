@@ -9,14 +9,11 @@ namespace ORVO::FilterGraph::Internal {
 
 CloneGraphVisitor::CloneGraphVisitor(std::map<Filter*, std::shared_ptr<Filter>>* pClones,
                                      ParameterForwarder* pForwarder)
-    : pClones_(pClones), pForwarder_(pForwarder)
-{
-}
+    : pClones_(pClones), pForwarder_(pForwarder) {}
 
 CloneGraphVisitor::~CloneGraphVisitor() = default;
 
-void CloneGraphVisitor::preVisit(Filter* pFilter)
-{
+void CloneGraphVisitor::preVisit(Filter* pFilter) {
     std::shared_ptr<Filter> const spClone = pFilter->clone();
     ORVO_ENFORCE(spClone.get());
     ORVO_CHECK(pFilter->getTimeStamp() == spClone->getClonedTimeStamp());

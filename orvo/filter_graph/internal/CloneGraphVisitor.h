@@ -14,8 +14,8 @@ class ParameterForwarder;
 /// Threads: the thread that owns the graph.
 class ORVO_API CloneGraphVisitor : public INodeVisitor {
 public:
-    /// `pClones` receives a clone for each filter, `pForwarder` a pair for each parameter of each filter that is no
-    /// adapter. Neither is owned.
+    /// `pClones` receives a clone for each filter, `pForwarder` a pair for each parameter of each filter that
+    /// is no adapter. Neither is owned.
     CloneGraphVisitor(std::map<Filter*, std::shared_ptr<Filter>>* pClones, ParameterForwarder* pForwarder);
 
     /// Throws InternalException "Enforce spClone.get() != NULL" if `clone` gives nothing, and

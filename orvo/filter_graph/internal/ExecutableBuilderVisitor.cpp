@@ -14,14 +14,11 @@ namespace ORVO::FilterGraph::Internal {
 ExecutableBuilderVisitor::ExecutableBuilderVisitor(
     std::map<Filter*, std::shared_ptr<IFilterExecutable>>* pExecutables, GraphExecutable* pGraphExecutable,
     TargetPlatform target)
-    : pExecutables_(pExecutables), pGraphExecutable_(pGraphExecutable), target_(target)
-{
-}
+    : pExecutables_(pExecutables), pGraphExecutable_(pGraphExecutable), target_(target) {}
 
 ExecutableBuilderVisitor::~ExecutableBuilderVisitor() = default;
 
-void ExecutableBuilderVisitor::postVisit(Filter* pFilter)
-{
+void ExecutableBuilderVisitor::postVisit(Filter* pFilter) {
     ORVO_CHECK(pFilter, "pFilter");
     if (pExecutables_->find(pFilter) != pExecutables_->end()) {
         return;
@@ -32,10 +29,12 @@ void ExecutableBuilderVisitor::postVisit(Filter* pFilter)
     ORVO_CHECK(filterExecutable.get(), "filterExecutable.get()");
     (*pExecutables_)[pFilter] = filterExecutable;
 
-    if (target_ == ORVO_TARGET_CPU || dynamic_cast<InputAdapter*>(pFilter) || dynamic_cast<OutputAdapter*>(pFilter)) {
+    if (target_ == ORVO_TARGET_CPU || dynamic_cast<InputAdapter*>(pFilter) ||
+        dynamic_cast<OutputAdapter*>(pFilter)) {
         return;
     }
-    auto const* const imageFlowFilterExecutable = dynamic_cast<ImageFlowFilterExecutable*>(filterExecutable.get());
+    auto const* const imageFlowFilterExecutable =
+        dynamic_cast<ImageFlowFilterExecutable*>(filterExecutable.get());
     ORVO_CHECK(imageFlowFilterExecutable, "imageFlowFilterExecutable");
     ImageFilter* const pImageFlowFilter = imageFlowFilterExecutable->getImageFlowFilter();
     ORVO_CHECK(pImageFlowFilter, "pImageFlowFilter");

@@ -44,25 +44,24 @@ constexpr std::size_t kFormCPU = 2;
 constexpr std::size_t kForms = 10;
 
 constexpr double kNoTimeout = std::numeric_limits<double>::infinity();
-constexpr double kTailInterval = 1e-4; // seconds between two looks at a frame whose end is a few instructions away
+constexpr double kTailInterval =
+    1e-4; // seconds between two looks at a frame whose end is a few instructions away
 
 template <typename Converter>
-std::shared_ptr<ImageFilter> makeConverter()
-{
+std::shared_ptr<ImageFilter> makeConverter() {
     return std::shared_ptr<ImageFilter>(ORVO_NEW Converter(), ImageNodeDeleter());
 }
 
 /// The converters between host memory and OpenGL memory come with the OpenGL nodes.
-[[noreturn]] void refuseOpenGL()
-{
+[[noreturn]] void refuseOpenGL() {
     throw ResourceException(__FILE__, __LINE__, "Images in OpenGL memory are not supported by this build");
 }
 
 } // namespace
 
-GraphExecutable::GraphExecutable(IFilter* pGraph, OptimizationOptions const& options, OGL::Context const* context)
-    : pOutput_(dynamic_cast<OutputAdapter*>(pGraph)), options_(options)
-{
+GraphExecutable::GraphExecutable(IFilter* pGraph, OptimizationOptions const& options,
+                                 OGL::Context const* context)
+    : pOutput_(dynamic_cast<OutputAdapter*>(pGraph)), options_(options) {
     ORVO_ENFORCE(pOutput_);
     spController_ = std::make_shared<ImageFlowController>();
     if (options_.debuggingMode() == OptimizationOptions::DEBUGGING_SINGLE_THREAD) {
@@ -76,8 +75,7 @@ GraphExecutable::GraphExecutable(IFilter* pGraph, OptimizationOptions const& opt
     buildGraphExecutable();
 }
 
-GraphExecutable::~GraphExecutable()
-{
+GraphExecutable::~GraphExecutable() {
     try {
         if (bFrameOut_) {
             cancelFrame();
@@ -90,8 +88,7 @@ GraphExecutable::~GraphExecutable()
 
 // ---- Building
 
-void GraphExecutable::buildGraphExecutable()
-{
+void GraphExecutable::buildGraphExecutable() {
     TargetPlatform target = ORVO_TARGET_UNSET;
     switch (static_cast<int>(options_.processingMode())) {
     case OptimizationOptions::FULL_OPTIMIZATION:
@@ -124,8 +121,7 @@ void GraphExecutable::buildGraphExecutable()
 }
 
 ImageFilter* GraphExecutable::connectConsumers(Filter* pFilter, IFilterExecutable& executable,
-                                               ConvertedOutputs& convertedOutputs)
-{
+                                               ConvertedOutputs& convertedOutputs) {
     OutputConnector* out = executable.getImageFlowOutputConnector();
     if (!out) {
         ORVO_CHECK(pFilter == pOutput_, "out == pOutput_");
@@ -151,8 +147,8 @@ ImageFilter* GraphExecutable::connectConsumers(Filter* pFilter, IFilterExecutabl
 }
 
 OutputConnector* GraphExecutable::bringToOutputAdapter(IFilterExecutable& executable,
-                                                       IFilterExecutable& outputExecutable, OutputConnector* pOutput)
-{
+                                                       IFilterExecutable& outputExecutable,
+                                                       OutputConnector* pOutput) {
     if (executable.hasSIMDOutput()) {
         return appendImageFlowConverter(makeConverter<ConvertFromSIMDOptimized>(), pOutput);
     }
@@ -164,8 +160,7 @@ OutputConnector* GraphExecutable::bringToOutputAdapter(IFilterExecutable& execut
     return pOutput;
 }
 
-IFilterExecutable& GraphExecutable::executableOf(Filter* pFilter)
-{
+IFilterExecutable& GraphExecutable::executableOf(Filter* pFilter) {
     auto const iExecutable = aFilterExecutables_.find(pFilter);
     IFilterExecutable* const pFilterExecutable =
         iExecutable == aFilterExecutables_.end() ? nullptr : iExecutable->second.get();
@@ -173,8 +168,7 @@ IFilterExecutable& GraphExecutable::executableOf(Filter* pFilter)
     return *pFilterExecutable;
 }
 
-int GraphExecutable::convertedOutputIndex(TargetPlatform target, bool isSIMD)
-{
+int GraphExecutable::convertedOutputIndex(TargetPlatform target, bool isSIMD) {
     switch (static_cast<int>(target)) {
     case ORVO_TARGET_GL:
         ORVO_CHECK(!isSIMD);
@@ -196,8 +190,7 @@ int GraphExecutable::convertedOutputIndex(TargetPlatform target, bool isSIMD)
 
 OutputConnector* GraphExecutable::checkTargetsAndConnect(Filter* pSrcFilter, OutputConnector* pSrcConnector,
                                                          Filter* pDstFilter, InputConnector* pDstConnector,
-                                                         ConvertedOutputs* pConvertedOutputsVec)
-{
+                                                         ConvertedOutputs* pConvertedOutputsVec) {
     ORVO_ENFORCE(pSrcFilter);
     ORVO_ENFORCE(pSrcConnector);
     ORVO_ENFORCE(pDstFilter);
@@ -240,20 +233,19 @@ OutputConnector* GraphExecutable::checkTargetsAndConnect(Filter* pSrcFilter, Out
     return pConnector;
 }
 
-OutputConnector* GraphExecutable::unconnectedOutput(OutputConnector* pOutputConnector)
-{
+OutputConnector* GraphExecutable::unconnectedOutput(OutputConnector* pOutputConnector) {
     if (!pOutputConnector->connectedInput()) {
         return pOutputConnector;
     }
-    ImageFilter* const pSrcNode = pOutputConnector->node() ? pOutputConnector->node()->asImageFilter() : nullptr;
+    ImageFilter* const pSrcNode =
+        pOutputConnector->node() ? pOutputConnector->node()->asImageFilter() : nullptr;
     ORVO_ENFORCE(pSrcNode);
     OutputConnector* const pClonedSrcConnector = pSrcNode->cloneImageOutput();
     ORVO_ENFORCE(pClonedSrcConnector);
     return pClonedSrcConnector;
 }
 
-void GraphExecutable::makeDataFlowConnection(OutputConnector* pSrcConnector, InputConnector* pDstConnector)
-{
+void GraphExecutable::makeDataFlowConnection(OutputConnector* pSrcConnector, InputConnector* pDstConnector) {
     ORVO_ENFORCE(pSrcConnector);
     ORVO_ENFORCE(pDstConnector);
     if (pSrcConnector->connectedInput()) {
@@ -267,20 +259,19 @@ void GraphExecutable::makeDataFlowConnection(OutputConnector* pSrcConnector, Inp
 }
 
 OutputConnector* GraphExecutable::appendImageFlowConverter(std::shared_ptr<ImageFilter> const& spConverter,
-                                                           OutputConnector* pOutputConnector)
-{
+                                                           OutputConnector* pOutputConnector) {
     aConverters_.push_back(spConverter);
     ImageFilter* const pConverter = spConverter.get();
     spController_->addNode(pConverter);
     OutputConnector* const pFree = unconnectedOutput(pOutputConnector);
-    ORVO_CHECK(pConverter->imageInput(0)->canConnect(pFree), "pConverter->imageInput(0)->canConnect(pOutputConnector)");
+    ORVO_CHECK(pConverter->imageInput(0)->canConnect(pFree),
+               "pConverter->imageInput(0)->canConnect(pOutputConnector)");
     DataFlow::Connect(*pFree, *pConverter->imageInput(0));
     return pConverter->imageOutput();
 }
 
 InputConnector* GraphExecutable::prependImageFlowConverter(std::shared_ptr<ImageFilter> const& spConverter,
-                                                           InputConnector* pInputConnector)
-{
+                                                           InputConnector* pInputConnector) {
     aConverters_.push_back(spConverter);
     ImageFilter* const pConverter = spConverter.get();
     spController_->addNode(pConverter);
@@ -289,8 +280,7 @@ InputConnector* GraphExecutable::prependImageFlowConverter(std::shared_ptr<Image
     return pConverter->imageInput(0);
 }
 
-void GraphExecutable::collectForFrames()
-{
+void GraphExecutable::collectForFrames() {
     for (auto const& [pFilter, spExecutable] : aFilterExecutables_) {
         aExecutablesInOrder_.push_back(spExecutable.get());
         if (dynamic_cast<IAdapter*>(pFilter)) {
@@ -309,15 +299,13 @@ void GraphExecutable::collectForFrames()
 
 // ---- Regions
 
-PixelExtentInWorldSpace GraphExecutable::outputPixelExtentInWorldSpace()
-{
+PixelExtentInWorldSpace GraphExecutable::outputPixelExtentInWorldSpace() {
     OutputAdapter const* const pOutputAdapter = pOutput_;
     ORVO_ENFORCE(pOutputAdapter);
     return pOutputAdapter->getImageDescriptor().pixelExtent();
 }
 
-void GraphExecutable::propagateDOD()
-{
+void GraphExecutable::propagateDOD() {
     waitForRunningFrame();
     forwarder_.forwardStuff();
     for (IFilterExecutable* const pExecutable : aExecutablesInOrder_) {
@@ -328,8 +316,7 @@ void GraphExecutable::propagateDOD()
     returnStuff();
 }
 
-void GraphExecutable::propagateROI()
-{
+void GraphExecutable::propagateROI() {
     waitForRunningFrame();
     for (IFilterExecutable* const pExecutable : aExecutablesInOrder_) {
         pExecutable->forwardStuff();
@@ -338,16 +325,14 @@ void GraphExecutable::propagateROI()
     returnStuff();
 }
 
-void GraphExecutable::forwardImagesToImageFlowGraph()
-{
+void GraphExecutable::forwardImagesToImageFlowGraph() {
     waitForRunningFrame();
     for (IFilterExecutable* const pExecutable : aAdapterExecutables_) {
         pExecutable->forwardStuff();
     }
 }
 
-void GraphExecutable::returnStuff()
-{
+void GraphExecutable::returnStuff() {
     for (IFilterExecutable* const pExecutable : aExecutablesInOrder_) {
         pExecutable->returnStuff();
     }
@@ -355,8 +340,7 @@ void GraphExecutable::returnStuff()
 
 // ---- Frames
 
-void GraphExecutable::setIntermediateBufferPrecision()
-{
+void GraphExecutable::setIntermediateBufferPrecision() {
     if (options_.processingMode() != OptimizationOptions::FULL_OPTIMIZATION) {
         return;
     }
@@ -383,8 +367,7 @@ void GraphExecutable::setIntermediateBufferPrecision()
     }
 }
 
-void GraphExecutable::settleLastFrame()
-{
+void GraphExecutable::settleLastFrame() {
     waitForRunningFrame();
     try {
         spController_->checkException();
@@ -396,22 +379,20 @@ void GraphExecutable::settleLastFrame()
         bLastFrameBroken_ = true;
     }
     if (bLastFrameBroken_) {
-        // A node that threw counts as running until it is flushed, a cancelled task group runs no slices until it is
-        // reset, and what some nodes hold belongs to a frame of which the others know nothing.
+        // A node that threw counts as running until it is flushed, a cancelled task group runs no slices
+        // until it is reset, and what some nodes hold belongs to a frame of which the others know nothing.
         spBedding_->wait(kNoTimeout, kTailInterval);
         spController_->flushGraph();
         bLastFrameBroken_ = false;
     }
 }
 
-void GraphExecutable::prepareNodes()
-{
+void GraphExecutable::prepareNodes() {
     setIntermediateBufferPrecision();
     spController_->setNodeImageDescriptorInfo(true);
 }
 
-void GraphExecutable::prepareCaches()
-{
+void GraphExecutable::prepareCaches() {
     bool const bKeepNothing = options_.cachingMode() == OptimizationOptions::CACHING_OFF;
     if (!bKeepNothing) {
         spBedding_->setDirtyState();
@@ -430,10 +411,10 @@ void GraphExecutable::prepareCaches()
     }
 }
 
-// One consumer of a clean node may have left its image where it was, another may have taken its share along. The node
-// does not run as long as one output holds data, so the consumer whose output is empty would wait for it forever.
-void GraphExecutable::shareAmongOutputs(ImageFilter& node)
-{
+// One consumer of a clean node may have left its image where it was, another may have taken its share along.
+// The node does not run as long as one output holds data, so the consumer whose output is empty would wait
+// for it forever.
+void GraphExecutable::shareAmongOutputs(ImageFilter& node) {
     using CPUOutput = DataFlow::ConstOutput<ORVO::ImageCPU>;
     CPUOutput* pFull = nullptr;
     bool bShareable = true;
@@ -462,15 +443,16 @@ void GraphExecutable::shareAmongOutputs(ImageFilter& node)
     }
 }
 
-void GraphExecutable::allocateOutputImages()
-{
-    // A node that does not run keeps what was allocated for it, and would write a later frame of another size into it.
+void GraphExecutable::allocateOutputImages() {
+    // A node that does not run keeps what was allocated for it, and would write a later frame of another size
+    // into it.
     for (ImageFilter* const pNode : aNodesProducersFirst_) {
         pNode->setColor(DataFlow::Node::COLOR_NOT_VISITED);
     }
     for (auto iNode = aNodesProducersFirst_.rbegin(); iNode != aNodesProducersFirst_.rend(); ++iNode) {
         ImageFilter* const iff = *iNode;
-        bool const bRuns = iNode == aNodesProducersFirst_.rbegin() || iff->color() == DataFlow::Node::COLOR_DISCOVERED;
+        bool const bRuns =
+            iNode == aNodesProducersFirst_.rbegin() || iff->color() == DataFlow::Node::COLOR_DISCOVERED;
         if (!bRuns) {
             continue;
         }
@@ -484,8 +466,7 @@ void GraphExecutable::allocateOutputImages()
     }
 }
 
-void GraphExecutable::processFrame()
-{
+void GraphExecutable::processFrame() {
     settleLastFrame();
     ORVO_CHECK(pOutput_, "pOutputAdapter");
     bProcessingComplete_.store(false, std::memory_order_release);
@@ -498,8 +479,7 @@ void GraphExecutable::processFrame()
     returnStuff();
 }
 
-void* GraphExecutable::asyncProcessFrame()
-{
+void* GraphExecutable::asyncProcessFrame() {
     settleLastFrame();
     ORVO_CHECK(pOutput_, "pOutputAdapter");
     bProcessingComplete_.store(false, std::memory_order_release);
@@ -521,14 +501,12 @@ void* GraphExecutable::asyncProcessFrame()
     return this;
 }
 
-void GraphExecutable::cancelFrame()
-{
+void GraphExecutable::cancelFrame() {
     bCancelled_.store(true);
     spController_->cancelProcess();
 }
 
-bool GraphExecutable::waitForFrame(double timeout, double interval)
-{
+bool GraphExecutable::waitForFrame(double timeout, double interval) {
     bool const bEnded = spController_->wait(timeout, interval);
     if (bEnded) {
         bFrameOut_ = false;
@@ -536,8 +514,7 @@ bool GraphExecutable::waitForFrame(double timeout, double interval)
     return bEnded;
 }
 
-void GraphExecutable::waitForRunningFrame()
-{
+void GraphExecutable::waitForRunningFrame() {
     if (!bFrameOut_) {
         return;
     }
@@ -549,13 +526,9 @@ void GraphExecutable::waitForRunningFrame()
     bFrameOut_ = false;
 }
 
-void GraphExecutable::sleep(double seconds)
-{
-    spController_->sleep(seconds);
-}
+void GraphExecutable::sleep(double seconds) { spController_->sleep(seconds); }
 
-void GraphExecutable::checkException()
-{
+void GraphExecutable::checkException() {
     try {
         spController_->checkException();
     } catch (...) {
@@ -564,13 +537,9 @@ void GraphExecutable::checkException()
     }
 }
 
-void GraphExecutable::setCompletionCallback(bool (*callback)(void*))
-{
-    pCompletionCallback_.store(callback);
-}
+void GraphExecutable::setCompletionCallback(bool (*callback)(void*)) { pCompletionCallback_.store(callback); }
 
-bool GraphExecutable::internalCompletionCallback(void* self)
-{
+bool GraphExecutable::internalCompletionCallback(void* self) {
     auto* const pExecutable = static_cast<GraphExecutable*>(self);
     try {
         pExecutable->returnStuff();
@@ -578,7 +547,8 @@ bool GraphExecutable::internalCompletionCallback(void* self)
     } catch (ExceptionBase const& exception) {
         pExecutable->spController_->saveException(exception.clone());
     } catch (...) {
-        pExecutable->spController_->saveException(ORVO_NEW CPURuntimeException(CPURuntimeException::CONDITION_UNKNOWN));
+        pExecutable->spController_->saveException(
+            ORVO_NEW CPURuntimeException(CPURuntimeException::CONDITION_UNKNOWN));
     }
     // The host may destroy the frame's results, but not this object, as soon as it sees this.
     pExecutable->bProcessingComplete_.store(true, std::memory_order_release);
@@ -586,8 +556,7 @@ bool GraphExecutable::internalCompletionCallback(void* self)
     return true;
 }
 
-void GraphExecutable::callCompletionCallback()
-{
+void GraphExecutable::callCompletionCallback() {
     auto* const pCallback = pCompletionCallback_.load();
     if (!pCallback) {
         return;

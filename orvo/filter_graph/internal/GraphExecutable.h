@@ -37,29 +37,33 @@ class Filter;
 class IFilterExecutable;
 class OutputAdapter;
 
-/// The compiled form of one intermediate graph for one set of options: image nodes on a controller, wired together,
-/// with the conversions that the graph needs. Built by its constructor; afterwards it only runs frames and carries
-/// regions.
+/// The compiled form of one intermediate graph for one set of options: image nodes on a controller, wired
+/// together, with the conversions that the graph needs. Built by its constructor; afterwards it only runs
+/// frames and carries regions.
 ///
-/// One target serves the whole graph and is taken from the processing mode. Converter nodes bridge what differs: the
-/// layout that a node wants its pixels in, and the place where the client's images live. Images in OpenGL memory, and
-/// graphs that run there, are refused by this build (ResourceException).
+/// One target serves the whole graph and is taken from the processing mode. Converter nodes bridge what
+/// differs: the layout that a node wants its pixels in, and the place where the client's images live. Images
+/// in OpenGL memory, and graphs that run there, are refused by this build (ResourceException).
 ///
-/// What a frame may keep of the one before: with `cachingMode` 0 nothing. With any other mode the results of the nodes
-/// that are not dirty, where dirty is a node one of whose parameters changed, a source whose image may have changed, and
-/// all that hangs behind these. A frame that failed or was cancelled leaves nothing that a later one would take.
+/// What a frame may keep of the one before: with `cachingMode` 0 nothing. With any other mode the results of
+/// the nodes that are not dirty, where dirty is a node one of whose parameters changed, a source whose image
+/// may have changed, and all that hangs behind these. A frame that failed or was cancelled leaves nothing
+/// that a later one would take.
 ///
-/// Threads: the host's thread; `returnStuff` and the completion callback of an asynchronous frame run on the thread that
-/// ends it. `cancelFrame` and `isProcessingComplete` may be called from any thread while a frame runs.
+/// Threads: the host's thread; `returnStuff` and the completion callback of an asynchronous frame run on the
+/// thread that ends it. `cancelFrame` and `isProcessingComplete` may be called from any thread while a frame
+/// runs.
 class ORVO_API GraphExecutable {
 public:
     using OptimizationOptions = IProcessorBase::OptimizationOptions;
 
-    /// Builds the graph that ends at `pGraph`, an output adapter with an image. `pGraph` and all filters above it must
-    /// outlive this object. Throws InternalException "Enforce pOutput_ != NULL" if `pGraph` is no output adapter,
-    /// "!ORVO::ImageFlow::Library::cpuOnlyMode()" if a context is given to a library that was started without one,
-    /// "!\"unsupported processing mode!\"" for a processing mode other than 0 and 1, and what building the filters and
-    /// connecting them throws.
+    /// Builds the graph that ends at `pGraph`, an output adapter with an image. `pGraph` and all filters
+    /// above it must outlive this object. Throws InternalException "Enforce pOutput_ != NULL" if `pGraph` is
+    /// no output adapter,
+    /// "!ORVO::ImageFlow::Library::cpuOnlyMode()" if a context is given to a library that was started without
+    /// one,
+    /// "!\"unsupported processing mode!\"" for a processing mode other than 0 and 1, and what building the
+    /// filters and connecting them throws.
     GraphExecutable(IFilter* pGraph, OptimizationOptions const& options, OGL::Context const* context);
 
     /// Cancels a running frame, waits for it, and frees the nodes.
@@ -89,24 +93,26 @@ public:
     /// Rethrows, once, what a worker thread saved (as SharedException).
     void checkException();
 
-    /// Waits until no asynchronous frame runs. Throws InternalException "The completion callback must not change the
-    /// frame that it ends" if called from within that callback.
+    /// Waits until no asynchronous frame runs. Throws InternalException "The completion callback must not
+    /// change the frame that it ends" if called from within that callback.
     void waitForRunningFrame();
 
     /// Called at the end of each asynchronous frame with the frame's handle. Null is allowed.
     void setCompletionCallback(bool (*callback)(void*));
 
-    /// Forwards values to the nodes, then carries pixel extents and domains of definition from the sources to the sink.
+    /// Forwards values to the nodes, then carries pixel extents and domains of definition from the sources to
+    /// the sink.
     void propagateDOD();
 
-    /// Forwards values to the nodes, then carries the region of interest of the output adapter to the sources.
+    /// Forwards values to the nodes, then carries the region of interest of the output adapter to the
+    /// sources.
     void propagateROI();
 
     /// Forwards to the nodes of the adapters alone.
     void forwardImagesToImageFlowGraph();
 
-    /// The pixel extent of the output adapter's image. Throws InternalException "Enforce pOutputAdapter != NULL" without
-    /// an adapter.
+    /// The pixel extent of the output adapter's image. Throws InternalException "Enforce pOutputAdapter !=
+    /// NULL" without an adapter.
     PixelExtentInWorldSpace outputPixelExtentInWorldSpace();
 
     /// The options that the graph was built for.
@@ -116,21 +122,24 @@ public:
     std::shared_ptr<ImageFlowController> const& controller() const { return spController_; }
 
 private:
-    /// The connectors that bear one producer's image, by form (see `convertedOutputIndex`); null where a form does not
-    /// exist.
+    /// The connectors that bear one producer's image, by form (see `convertedOutputIndex`); null where a form
+    /// does not exist.
     using ConvertedOutputs = std::vector<DataFlow::OutputConnector*>;
 
     void buildGraphExecutable();
     /// Connects the node of `pFilter` to those of its consumers; the sink, where it feeds the output adapter.
-    ImageFilter* connectConsumers(Filter* pFilter, IFilterExecutable& executable, ConvertedOutputs& convertedOutputs);
-    DataFlow::OutputConnector* bringToOutputAdapter(IFilterExecutable& executable, IFilterExecutable& outputExecutable,
+    ImageFilter* connectConsumers(Filter* pFilter, IFilterExecutable& executable,
+                                  ConvertedOutputs& convertedOutputs);
+    DataFlow::OutputConnector* bringToOutputAdapter(IFilterExecutable& executable,
+                                                    IFilterExecutable& outputExecutable,
                                                     DataFlow::OutputConnector* pOutput);
     void collectForFrames();
     IFilterExecutable& executableOf(Filter* pFilter);
-    DataFlow::OutputConnector* checkTargetsAndConnect(Filter* pSrcFilter, DataFlow::OutputConnector* pSrcConnector,
-                                                      Filter* pDstFilter, DataFlow::InputConnector* pDstConnector,
-                                                      ConvertedOutputs* pConvertedOutputsVec);
-    void makeDataFlowConnection(DataFlow::OutputConnector* pSrcConnector, DataFlow::InputConnector* pDstConnector);
+    DataFlow::OutputConnector*
+    checkTargetsAndConnect(Filter* pSrcFilter, DataFlow::OutputConnector* pSrcConnector, Filter* pDstFilter,
+                           DataFlow::InputConnector* pDstConnector, ConvertedOutputs* pConvertedOutputsVec);
+    void makeDataFlowConnection(DataFlow::OutputConnector* pSrcConnector,
+                                DataFlow::InputConnector* pDstConnector);
     DataFlow::OutputConnector* appendImageFlowConverter(std::shared_ptr<ImageFilter> const& spConverter,
                                                         DataFlow::OutputConnector* pOutputConnector);
     DataFlow::InputConnector* prependImageFlowConverter(std::shared_ptr<ImageFilter> const& spConverter,
@@ -143,8 +152,8 @@ private:
     void settleLastFrame();
     /// Fixes the formats of the nodes from the output image.
     void prepareNodes();
-    /// Drops every result that the frame must not take over, and sees to it that the outputs of one node hold its image
-    /// either all or none.
+    /// Drops every result that the frame must not take over, and sees to it that the outputs of one node hold
+    /// its image either all or none.
     void prepareCaches();
     void shareAmongOutputs(ImageFilter& node);
     /// Allocates the output image of each node that the frame will run, on this thread.
@@ -169,9 +178,9 @@ private:
     std::vector<ImageFilter*> aNodesProducersFirst_;      // all that the sink reaches
     std::vector<ImageFilter*> aFanOutNodes_;              // those among them with more than one output
 
-    bool bFrameOut_ = false;              // an asynchronous frame was launched and not waited for
-    bool bLastFrameBroken_ = false;       // the last frame threw, or failed on its thread
-    std::atomic<bool> bCancelled_{false}; // a cancel was asked for since the last launch
+    bool bFrameOut_ = false;                         // an asynchronous frame was launched and not waited for
+    bool bLastFrameBroken_ = false;                  // the last frame threw, or failed on its thread
+    std::atomic<bool> bCancelled_{false};            // a cancel was asked for since the last launch
     std::atomic<std::thread::id> oCallbackThread_{}; // the thread that is inside the completion callback
 };
 

@@ -24,50 +24,38 @@ struct Step {
     InputIterator oInputs;
 };
 
-[[noreturn]] void failOnCycle(Filter const& filter)
-{
+[[noreturn]] void failOnCycle(Filter const& filter) {
     throw Exception(filter.identifier().name() + ": circular reference detected in filter");
 }
 
-[[noreturn]] void failOnUnconnectedInput(Filter const& filter, Input const& input)
-{
+[[noreturn]] void failOnUnconnectedInput(Filter const& filter, Input const& input) {
     throw Exception(filter.identifier().name() + "::" + input.name() + " is not connected");
 }
 
 } // namespace
 
-GraphTraverser::GraphTraverser(IFilter* graph, INodeVisitor* visitor) : pGraph_(graph), pVisitor_(visitor)
-{
+GraphTraverser::GraphTraverser(IFilter* graph, INodeVisitor* visitor) : pGraph_(graph), pVisitor_(visitor) {
     ORVO_ENFORCE(pGraph_);
 }
 
-void GraphTraverser::depthFirstTraversal()
-{
+void GraphTraverser::depthFirstTraversal() {
     traverseDepthFirst(dynamic_cast<Filter*>(pGraph_));
     // Every filter that the walk marked is one that a walk to reset the marks would reach.
     clearMarks();
 }
 
-void GraphTraverser::breadthFirstTraversal()
-{
-    ORVO_FAIL("Not implemented.");
-}
+void GraphTraverser::breadthFirstTraversal() { ORVO_FAIL("Not implemented."); }
 
-void GraphTraverser::resetGraph()
-{
-    traverseAndResetGraph(dynamic_cast<Filter*>(pGraph_));
-}
+void GraphTraverser::resetGraph() { traverseAndResetGraph(dynamic_cast<Filter*>(pGraph_)); }
 
-void GraphTraverser::clearMarks() noexcept
-{
+void GraphTraverser::clearMarks() noexcept {
     for (Filter* pFilter : aMarked_) {
         pFilter->resetColor();
     }
     aMarked_.clear();
 }
 
-void GraphTraverser::traverseDepthFirst(Filter* pFilter)
-{
+void GraphTraverser::traverseDepthFirst(Filter* pFilter) {
     aMarked_.clear();
     if (!pFilter) {
         return;
@@ -110,8 +98,8 @@ void GraphTraverser::traverseDepthFirst(Filter* pFilter)
             }
         }
     } catch (...) {
-        // The marks of a broken graph stay. What a visitor throws says nothing about the graph, which must remain
-        // walkable.
+        // The marks of a broken graph stay. What a visitor throws says nothing about the graph, which must
+        // remain walkable.
         if (!bGraphIsBroken) {
             clearMarks();
         }
@@ -119,8 +107,7 @@ void GraphTraverser::traverseDepthFirst(Filter* pFilter)
     }
 }
 
-void GraphTraverser::traverseAndResetGraph(Filter* pFilter)
-{
+void GraphTraverser::traverseAndResetGraph(Filter* pFilter) {
     if (!pFilter) {
         return;
     }

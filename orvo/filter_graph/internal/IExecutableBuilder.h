@@ -20,8 +20,9 @@ public:
     /// Whether `buildFilterExecutable` can serve this target.
     virtual bool canBuildFilterExecutable(TargetPlatform target) const = 0;
 
-    /// Makes the executable of this filter for `target`, with its node on the controller of `graphExecutable`.
-    /// The executable keeps references to this filter and to `graphExecutable`, which must both outlive it.
+    /// Makes the executable of this filter for `target`, with its node on the controller of
+    /// `graphExecutable`. The executable keeps references to this filter and to `graphExecutable`, which must
+    /// both outlive it.
     virtual std::shared_ptr<IFilterExecutable> buildFilterExecutable(TargetPlatform target,
                                                                      GraphExecutable& graphExecutable) = 0;
 

@@ -4,14 +4,8 @@ namespace ORVO::FilterGraph::Internal {
 
 IFilterExecutable::~IFilterExecutable() = default;
 
-bool IFilterExecutable::hasSIMDInput()
-{
-    return false;
-}
+bool IFilterExecutable::hasSIMDInput() { return false; }
 
-bool IFilterExecutable::hasSIMDOutput()
-{
-    return false;
-}
+bool IFilterExecutable::hasSIMDOutput() { return false; }
 
 } // namespace ORVO::FilterGraph::Internal

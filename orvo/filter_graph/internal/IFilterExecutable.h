@@ -13,8 +13,8 @@ class OutputConnector;
 
 namespace ORVO::FilterGraph::Internal {
 
-/// What one filter of a compiled graph has become: the object that the graph compiler connects, and that carries
-/// values between the filter and the image node behind it.
+/// What one filter of a compiled graph has become: the object that the graph compiler connects, and that
+/// carries values between the filter and the image node behind it.
 ///
 /// Threads: the thread that builds and launches the frames; `returnStuff` also on the thread that ends an
 /// asynchronous frame, when no other operation runs.
@@ -35,7 +35,8 @@ public:
     /// Makes one more image output, which bears the same image; null at the end of the graph.
     virtual DataFlow::OutputConnector* cloneImageFlowOutputConnector() = 0;
 
-    /// The image output that `cloneImageFlowOutputConnector` made as number `index`; null at the end of the graph.
+    /// The image output that `cloneImageFlowOutputConnector` made as number `index`; null at the end of the
+    /// graph.
     virtual DataFlow::OutputConnector* getClonedImageFlowOutputConnector(std::size_t index) = 0;
 
     /// Where the images of the inputs have to live.

@@ -6,7 +6,8 @@ namespace ORVO::FilterGraph::Internal {
 
 class Filter;
 
-/// What a `GraphTraverser` does at each filter. Both hooks do nothing unless overridden; what they throw ends the walk.
+/// What a `GraphTraverser` does at each filter. Both hooks do nothing unless overridden; what they throw ends
+/// the walk.
 ///
 /// Threads: the thread that owns the graph.
 class ORVO_API INodeVisitor {

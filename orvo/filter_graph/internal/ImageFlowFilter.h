@@ -14,9 +14,7 @@ template <typename T>
 class ImageFlowFilter : public ImageFlowFilterWrapperBase {
 public:
     ImageFlowFilter(IFilter::Identifier const& identifier, TargetPlatform target)
-        : ImageFlowFilterWrapperBase(identifier), target_(target)
-    {
-    }
+        : ImageFlowFilterWrapperBase(identifier), target_(target) {}
 
     /// An unconnected copy for the same target, without a node.
     std::shared_ptr<Filter> clone() override { return std::shared_ptr<Filter>(new ImageFlowFilter(*this)); }
@@ -28,8 +26,7 @@ protected:
     ImageFlowFilter(ImageFlowFilter const& other) = default;
 
 private:
-    ImageFilter* createFilter(TargetPlatform target) override
-    {
+    ImageFilter* createFilter(TargetPlatform target) override {
         if (target != target_) {
             return nullptr;
         }

@@ -10,8 +10,7 @@
 
 namespace ORVO::FilterGraph::Internal {
 
-void ImageNodeDeleter::operator()(ImageFilter* pNode) const noexcept
-{
+void ImageNodeDeleter::operator()(ImageFilter* pNode) const noexcept {
     if (pNode) {
         pNode->disconnect();
         trackedDelete(pNode);
@@ -20,28 +19,23 @@ void ImageNodeDeleter::operator()(ImageFilter* pNode) const noexcept
 
 ImageFlowFilterExecutable::ImageFlowFilterExecutable(GraphExecutable& graphExecutable, Filter& filter,
                                                      ImageFilter* pImageFlowFilter)
-    : pFilterGraphFilter_(&filter), pGraphExecutable_(&graphExecutable)
-{
+    : pFilterGraphFilter_(&filter), pGraphExecutable_(&graphExecutable) {
     if (pImageFlowFilter) {
         adopt(pImageFlowFilter);
     }
 }
 
-ImageFlowFilterExecutable::~ImageFlowFilterExecutable()
-{
-    ImageNodeDeleter{}(pImageFlowFilter_);
-}
+ImageFlowFilterExecutable::~ImageFlowFilterExecutable() { ImageNodeDeleter{}(pImageFlowFilter_); }
 
-void ImageFlowFilterExecutable::adopt(ImageFilter* pImageFlowFilter)
-{
+void ImageFlowFilterExecutable::adopt(ImageFilter* pImageFlowFilter) {
     forwarder_.addForward(*pFilterGraphFilter_, *pImageFlowFilter);
     pGraphExecutable_->controller()->addNode(pImageFlowFilter);
     pImageFlowFilter_ = pImageFlowFilter;
-    bGenerator_ = pImageFlowFilter->numberOfImageInputs() == 0 && !dynamic_cast<InputAdapter*>(pFilterGraphFilter_);
+    bGenerator_ =
+        pImageFlowFilter->numberOfImageInputs() == 0 && !dynamic_cast<InputAdapter*>(pFilterGraphFilter_);
 }
 
-void ImageFlowFilterExecutable::setImageFlowFilter(ImageFilter* pImageFlowFilter)
-{
+void ImageFlowFilterExecutable::setImageFlowFilter(ImageFilter* pImageFlowFilter) {
     ORVO_ENFORCE(pImageFlowFilter);
     if (pImageFlowFilter_) {
         pGraphExecutable_->controller()->removeNode(pImageFlowFilter_);
@@ -52,8 +46,7 @@ void ImageFlowFilterExecutable::setImageFlowFilter(ImageFilter* pImageFlowFilter
     adopt(pImageFlowFilter);
 }
 
-void ImageFlowFilterExecutable::forwardStuff()
-{
+void ImageFlowFilterExecutable::forwardStuff() {
     forwarder_.forwardStuff();
     if (bGenerator_) {
         pImageFlowFilter_->setOutputPixelExtent(pGraphExecutable_->outputPixelExtentInWorldSpace());
@@ -62,50 +55,42 @@ void ImageFlowFilterExecutable::forwardStuff()
 
 void ImageFlowFilterExecutable::returnStuff() {}
 
-DataFlow::InputConnector* ImageFlowFilterExecutable::getImageFlowInputConnector(std::string const& name)
-{
+DataFlow::InputConnector* ImageFlowFilterExecutable::getImageFlowInputConnector(std::string const& name) {
     ORVO_ENFORCE(pImageFlowFilter_);
     return pImageFlowFilter_->imageInput(name);
 }
 
-DataFlow::OutputConnector* ImageFlowFilterExecutable::getImageFlowOutputConnector()
-{
+DataFlow::OutputConnector* ImageFlowFilterExecutable::getImageFlowOutputConnector() {
     ORVO_ENFORCE(pImageFlowFilter_);
     return pImageFlowFilter_->imageOutput();
 }
 
-DataFlow::OutputConnector* ImageFlowFilterExecutable::cloneImageFlowOutputConnector()
-{
+DataFlow::OutputConnector* ImageFlowFilterExecutable::cloneImageFlowOutputConnector() {
     ORVO_ENFORCE(pImageFlowFilter_);
     return pImageFlowFilter_->cloneImageOutput();
 }
 
-DataFlow::OutputConnector* ImageFlowFilterExecutable::getClonedImageFlowOutputConnector(std::size_t index)
-{
+DataFlow::OutputConnector* ImageFlowFilterExecutable::getClonedImageFlowOutputConnector(std::size_t index) {
     ORVO_ENFORCE(pImageFlowFilter_);
     return pImageFlowFilter_->clonedImageOutput(index);
 }
 
-TargetPlatform ImageFlowFilterExecutable::getInputTargetPlatform()
-{
+TargetPlatform ImageFlowFilterExecutable::getInputTargetPlatform() {
     ORVO_ENFORCE(pImageFlowFilter_);
     return pImageFlowFilter_->getInputTargetPlatform();
 }
 
-TargetPlatform ImageFlowFilterExecutable::getOutputTargetPlatform()
-{
+TargetPlatform ImageFlowFilterExecutable::getOutputTargetPlatform() {
     ORVO_ENFORCE(pImageFlowFilter_);
     return pImageFlowFilter_->getOutputTargetPlatform();
 }
 
-bool ImageFlowFilterExecutable::hasSIMDInput()
-{
+bool ImageFlowFilterExecutable::hasSIMDInput() {
     ORVO_ENFORCE(pImageFlowFilter_);
     return pImageFlowFilter_->isSIMD();
 }
 
-bool ImageFlowFilterExecutable::hasSIMDOutput()
-{
+bool ImageFlowFilterExecutable::hasSIMDOutput() {
     ORVO_ENFORCE(pImageFlowFilter_);
     return pImageFlowFilter_->isSIMD();
 }

@@ -12,8 +12,8 @@ namespace ORVO::FilterGraph::Internal {
 class Filter;
 class GraphExecutable;
 
-/// Takes an image node out of its graph and frees it: connectors do not disconnect themselves, and a partner must not
-/// keep a pointer into a node that is gone.
+/// Takes an image node out of its graph and frees it: connectors do not disconnect themselves, and a partner
+/// must not keep a pointer into a node that is gone.
 struct ORVO_API ImageNodeDeleter {
     void operator()(ImageFilter* pNode) const noexcept;
 };
@@ -23,17 +23,18 @@ struct ORVO_API ImageNodeDeleter {
 /// Threads: as `IFilterExecutable`.
 class ORVO_API ImageFlowFilterExecutable : public IFilterExecutable {
 public:
-    /// Adds `pImageFlowFilter` to the controller of `graphExecutable`, and pairs each parameter of the node with the
-    /// parameter of the same name on `filter`, where there is one. Takes ownership of the node, but not if it throws.
-    /// A null node is allowed: `setImageFlowFilter` then does the same later. `graphExecutable` and `filter` must
-    /// outlive this object.
-    ImageFlowFilterExecutable(GraphExecutable& graphExecutable, Filter& filter, ImageFilter* pImageFlowFilter);
+    /// Adds `pImageFlowFilter` to the controller of `graphExecutable`, and pairs each parameter of the node
+    /// with the parameter of the same name on `filter`, where there is one. Takes ownership of the node, but
+    /// not if it throws. A null node is allowed: `setImageFlowFilter` then does the same later.
+    /// `graphExecutable` and `filter` must outlive this object.
+    ImageFlowFilterExecutable(GraphExecutable& graphExecutable, Filter& filter,
+                              ImageFilter* pImageFlowFilter);
 
     /// Frees the node.
     ~ImageFlowFilterExecutable() override;
 
-    /// Parameter values go to the node. A generator (a node without image inputs that is no source of client images)
-    /// is also given the pixel extent of the graph's output.
+    /// Parameter values go to the node. A generator (a node without image inputs that is no source of client
+    /// images) is also given the pixel extent of the graph's output.
     void forwardStuff() override;
 
     /// Nothing.
@@ -54,8 +55,9 @@ public:
     /// The filter that this executable stands for; not owned.
     Filter* getFilterGraphFilter() const { return pFilterGraphFilter_; }
 
-    /// Adds the node to the controller and pairs the parameters, as the constructor does. A node that was set before is
-    /// freed. Takes ownership, but not if it throws; null throws InternalException "Enforce pImageFlowFilter != NULL".
+    /// Adds the node to the controller and pairs the parameters, as the constructor does. A node that was set
+    /// before is freed. Takes ownership, but not if it throws; null throws InternalException "Enforce
+    /// pImageFlowFilter != NULL".
     void setImageFlowFilter(ImageFilter* pImageFlowFilter);
 
 private:
@@ -65,7 +67,8 @@ private:
     Filter* pFilterGraphFilter_;
     GraphExecutable* pGraphExecutable_;
     ParameterForwarder forwarder_;
-    bool bGenerator_ = false; // whether the node takes the pixel extent of the graph's output; settled with the node
+    bool bGenerator_ =
+        false; // whether the node takes the pixel extent of the graph's output; settled with the node
 };
 
 } // namespace ORVO::FilterGraph::Internal

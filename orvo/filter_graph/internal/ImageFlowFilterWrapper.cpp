@@ -19,28 +19,25 @@ using DataFlow::NodeLibrarian;
 using DataFlow::NodeMetaData;
 
 /// The first record of the librarian with exactly this identity, or null.
-NodeMetaData const* findMetaData(IFilter::Identifier const& id)
-{
+NodeMetaData const* findMetaData(IFilter::Identifier const& id) {
     NodeLibrarian const* const librarian = NodeLibrarian::exists() ? NodeLibrarian::Instance() : nullptr;
     ORVO_ENFORCE(librarian);
     auto const iFound = std::find_if(librarian->begin(), librarian->end(), [&](NodeMetaData const* node) {
         ORVO_ENFORCE(node);
-        return node->name() == id.name() && node->nameSpace() == id.nameSpace() && node->vendor() == id.vendor() &&
-               static_cast<long long>(node->version()) == id.version();
+        return node->name() == id.name() && node->nameSpace() == id.nameSpace() &&
+               node->vendor() == id.vendor() && static_cast<long long>(node->version()) == id.version();
     });
     return iFound == librarian->end() ? nullptr : *iFound;
 }
 
 /// The librarian counts its targets the other way round.
-DataFlow::NodeTargetType librarianTarget(TargetPlatform target)
-{
+DataFlow::NodeTargetType librarianTarget(TargetPlatform target) {
     ORVO_CHECK(target == ORVO_TARGET_GL || target == ORVO_TARGET_CPU, "Target must be CPU or GPU");
     return target == ORVO_TARGET_GL ? DataFlow::NODE_TARGET_GPU : DataFlow::NODE_TARGET_CPU;
 }
 
 std::unique_ptr<DataFlow::Node, ORVODeleter<DataFlow::Node>> createNode(std::string const& clientID,
-                                                                       TargetPlatform target)
-{
+                                                                        TargetPlatform target) {
     return std::unique_ptr<DataFlow::Node, ORVODeleter<DataFlow::Node>>(
         NodeLibrarian::Instance()->createNodeByClientID(clientID, librarianTarget(target)));
 }
@@ -48,8 +45,7 @@ std::unique_ptr<DataFlow::Node, ORVODeleter<DataFlow::Node>> createNode(std::str
 } // namespace
 
 ImageFlowFilterWrapper::ImageFlowFilterWrapper(IFilter::Identifier const& identifier)
-    : ImageFlowFilterWrapperBase(identifier)
-{
+    : ImageFlowFilterWrapperBase(identifier) {
     NodeMetaData const* const pMetaData = findMetaData(identifier);
     if (!pMetaData) {
         return;
@@ -67,18 +63,15 @@ ImageFlowFilterWrapper::ImageFlowFilterWrapper(ImageFlowFilterWrapper const& oth
 
 ImageFlowFilterWrapper::~ImageFlowFilterWrapper() = default;
 
-std::shared_ptr<Filter> ImageFlowFilterWrapper::clone()
-{
+std::shared_ptr<Filter> ImageFlowFilterWrapper::clone() {
     return std::shared_ptr<Filter>(new ImageFlowFilterWrapper(*this));
 }
 
-bool ImageFlowFilterWrapper::canBuildFilterExecutable(TargetPlatform target) const
-{
+bool ImageFlowFilterWrapper::canBuildFilterExecutable(TargetPlatform target) const {
     return target == lastTarget_;
 }
 
-ImageFilter* ImageFlowFilterWrapper::createFilter(TargetPlatform target)
-{
+ImageFilter* ImageFlowFilterWrapper::createFilter(TargetPlatform target) {
     if (target != ORVO_TARGET_CPU && ORVO::ImageFlow::Library::cpuOnlyMode()) {
         return nullptr;
     }

@@ -11,22 +11,20 @@
 
 namespace ORVO::FilterGraph::Internal {
 
-ImageFlowFilterWrapperBase::ImageFlowFilterWrapperBase(IFilter::Identifier const& identifier)
-{
+ImageFlowFilterWrapperBase::ImageFlowFilterWrapperBase(IFilter::Identifier const& identifier) {
     setIdentifier(identifier);
 }
 
-ImageFlowFilterWrapperBase::ImageFlowFilterWrapperBase(ImageFlowFilterWrapperBase const& other) : Filter(other) {}
+ImageFlowFilterWrapperBase::ImageFlowFilterWrapperBase(ImageFlowFilterWrapperBase const& other)
+    : Filter(other) {}
 
-ImageFlowFilterWrapperBase::~ImageFlowFilterWrapperBase()
-{
+ImageFlowFilterWrapperBase::~ImageFlowFilterWrapperBase() {
     for (ImageFilter* const pFilter : pFilters_) {
         ImageNodeDeleter{}(pFilter);
     }
 }
 
-void ImageFlowFilterWrapperBase::finishLazyInitialization()
-{
+void ImageFlowFilterWrapperBase::finishLazyInitialization() {
     ImageFilter* pNode = nullptr;
     for (std::size_t iTarget = 0; iTarget < pFilters_.size() && !pNode; ++iTarget) {
         pNode = createFilter(static_cast<TargetPlatform>(iTarget));
@@ -41,8 +39,7 @@ void ImageFlowFilterWrapperBase::finishLazyInitialization()
     Filter::finishLazyInitialization();
 }
 
-void ImageFlowFilterWrapperBase::adoptInterface(ImageFilter& node)
-{
+void ImageFlowFilterWrapperBase::adoptInterface(ImageFilter& node) {
     for (std::size_t iInput = 0; iInput < node.numberOfImageInputs(); ++iInput) {
         addInput(node.imageInput(iInput)->name(), 0);
     }
@@ -54,15 +51,15 @@ void ImageFlowFilterWrapperBase::adoptInterface(ImageFilter& node)
     }
 }
 
-std::shared_ptr<IFilterExecutable> ImageFlowFilterWrapperBase::buildFilterExecutable(TargetPlatform target,
-                                                                                     GraphExecutable& graphExecutable)
-{
+std::shared_ptr<IFilterExecutable>
+ImageFlowFilterWrapperBase::buildFilterExecutable(TargetPlatform target, GraphExecutable& graphExecutable) {
     std::unique_ptr<ImageFilter, ImageNodeDeleter> filter(createFilter(target));
     if (filter) {
         pFilters_.at(static_cast<std::size_t>(target)) = nullptr;
     }
     ORVO_CHECK(filter, "filter");
-    auto const spExecutable = std::make_shared<ImageFlowFilterExecutable>(graphExecutable, *this, filter.get());
+    auto const spExecutable =
+        std::make_shared<ImageFlowFilterExecutable>(graphExecutable, *this, filter.get());
     static_cast<void>(filter.release());
     return spExecutable;
 }

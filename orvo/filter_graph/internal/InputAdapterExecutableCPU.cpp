@@ -13,8 +13,7 @@
 namespace ORVO::FilterGraph::Internal {
 
 InputAdapterExecutableCPU::InputAdapterExecutableCPU(GraphExecutable& graphExecutable, InputAdapter& adapter)
-    : ImageFlowFilterExecutable(graphExecutable, adapter, nullptr), pAdapter_(&adapter)
-{
+    : ImageFlowFilterExecutable(graphExecutable, adapter, nullptr), pAdapter_(&adapter) {
     std::unique_ptr<ClientImageSource, ImageNodeDeleter> pSource(ORVO_NEW ClientImageSource());
     setImageFlowFilter(pSource.get());
     pNode_ = pSource.release();
@@ -22,8 +21,7 @@ InputAdapterExecutableCPU::InputAdapterExecutableCPU(GraphExecutable& graphExecu
 
 InputAdapterExecutableCPU::~InputAdapterExecutableCPU() = default;
 
-void InputAdapterExecutableCPU::forwardStuff()
-{
+void InputAdapterExecutableCPU::forwardStuff() {
     if (FilterGraph::ImageBase* const pImage = pAdapter_->getImage()) {
         auto* const pPixels = ImageAccessor::getImpl<ORVO::ImageCPU>(pImage);
         pNode_->noteContent(pPixels, pImage->contentStamp());
@@ -34,14 +32,8 @@ void InputAdapterExecutableCPU::forwardStuff()
     pNode_->setGeneratedRegion(pAdapter_->getDomainOfDefinition());
 }
 
-void InputAdapterExecutableCPU::returnStuff()
-{
-    pAdapter_->updateROI(pNode_->regionOfInterest());
-}
+void InputAdapterExecutableCPU::returnStuff() { pAdapter_->updateROI(pNode_->regionOfInterest()); }
 
-TargetPlatform InputAdapterExecutableCPU::getOutputTargetPlatform()
-{
-    return ORVO_TARGET_CPU;
-}
+TargetPlatform InputAdapterExecutableCPU::getOutputTargetPlatform() { return ORVO_TARGET_CPU; }
 
 } // namespace ORVO::FilterGraph::Internal

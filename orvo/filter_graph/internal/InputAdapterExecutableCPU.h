@@ -7,8 +7,8 @@ namespace ORVO::FilterGraph::Internal {
 class ClientImageSource;
 class InputAdapter;
 
-/// The executable of an input adapter whose image lives in host memory: a source node that is handed the client's
-/// image before each frame.
+/// The executable of an input adapter whose image lives in host memory: a source node that is handed the
+/// client's image before each frame.
 ///
 /// Threads: as `IFilterExecutable`.
 class ORVO_API InputAdapterExecutableCPU : public ImageFlowFilterExecutable {
@@ -18,8 +18,9 @@ public:
 
     ~InputAdapterExecutableCPU() override;
 
-    /// Hands the adapter's image, its pixel extent and its domain of definition (world space) to the source. The source
-    /// counts as changed unless the image bears a content stamp and image and stamp are those of the last frame.
+    /// Hands the adapter's image, its pixel extent and its domain of definition (world space) to the source.
+    /// The source counts as changed unless the image bears a content stamp and image and stamp are those of
+    /// the last frame.
     void forwardStuff() override;
 
     /// The source's region of interest (world space) goes back to the adapter.

@@ -12,8 +12,7 @@ namespace ORVO::FilterGraph::Internal {
 
 namespace {
 
-ImageFilter::teOutputPrecisionHint precisionHint(ImageDescriptor const& descriptor)
-{
+ImageFilter::teOutputPrecisionHint precisionHint(ImageDescriptor const& descriptor) {
     switch (static_cast<int>(descriptor.format().channelType)) {
     case 0:
         return ImageFilter::OUTPUT_PRECISION_8_BIT_INT;
@@ -32,17 +31,15 @@ ImageFilter::teOutputPrecisionHint precisionHint(ImageDescriptor const& descript
 } // namespace
 
 OutputAdapterExecutable::OutputAdapterExecutable(GraphExecutable& graphExecutable, OutputAdapter& adapter)
-    : pAdapter_(&adapter), pGraphExecutable_(&graphExecutable)
-{
-}
+    : pAdapter_(&adapter), pGraphExecutable_(&graphExecutable) {}
 
 OutputAdapterExecutable::~OutputAdapterExecutable() = default;
 
-void OutputAdapterExecutable::forwardStuff()
-{
+void OutputAdapterExecutable::forwardStuff() {
     ORVO_ENFORCE(pSink_);
     FilterGraph::ImageBase* const pImage = pAdapter_->getImage();
-    // An image without pixels unbinds what an earlier one bound: nothing may be written through a stale pointer.
+    // An image without pixels unbinds what an earlier one bound: nothing may be written through a stale
+    // pointer.
     pSink_->setBoundOutputImage(pImage ? ImageAccessor::getImpl<ORVO::ImageBase>(pImage) : nullptr);
 
     ImageDescriptor const& descriptor = pAdapter_->getImageDescriptor();
@@ -51,45 +48,29 @@ void OutputAdapterExecutable::forwardStuff()
     pSink_->outputPrecisionHintParameter().setValue(precisionHint(descriptor));
 }
 
-void OutputAdapterExecutable::returnStuff()
-{
+void OutputAdapterExecutable::returnStuff() {
     ORVO_ENFORCE(pSink_);
     pAdapter_->updateDOD(pSink_->domainOfDefinition());
 }
 
-DataFlow::InputConnector* OutputAdapterExecutable::getImageFlowInputConnector(std::string const& /*name*/)
-{
+DataFlow::InputConnector* OutputAdapterExecutable::getImageFlowInputConnector(std::string const& /*name*/) {
     return nullptr;
 }
 
-DataFlow::OutputConnector* OutputAdapterExecutable::getImageFlowOutputConnector()
-{
+DataFlow::OutputConnector* OutputAdapterExecutable::getImageFlowOutputConnector() { return nullptr; }
+
+DataFlow::OutputConnector* OutputAdapterExecutable::cloneImageFlowOutputConnector() { return nullptr; }
+
+DataFlow::OutputConnector* OutputAdapterExecutable::getClonedImageFlowOutputConnector(std::size_t /*index*/) {
     return nullptr;
 }
 
-DataFlow::OutputConnector* OutputAdapterExecutable::cloneImageFlowOutputConnector()
-{
-    return nullptr;
-}
-
-DataFlow::OutputConnector* OutputAdapterExecutable::getClonedImageFlowOutputConnector(std::size_t /*index*/)
-{
-    return nullptr;
-}
-
-TargetPlatform OutputAdapterExecutable::getInputTargetPlatform()
-{
+TargetPlatform OutputAdapterExecutable::getInputTargetPlatform() {
     return pAdapter_->getImageDescriptor().type();
 }
 
-TargetPlatform OutputAdapterExecutable::getOutputTargetPlatform()
-{
-    return ORVO_TARGET_UNSET;
-}
+TargetPlatform OutputAdapterExecutable::getOutputTargetPlatform() { return ORVO_TARGET_UNSET; }
 
-void OutputAdapterExecutable::bind(ImageFilter* pSink)
-{
-    pSink_ = pSink;
-}
+void OutputAdapterExecutable::bind(ImageFilter* pSink) { pSink_ = pSink; }
 
 } // namespace ORVO::FilterGraph::Internal

@@ -11,8 +11,8 @@ namespace ORVO::FilterGraph::Internal {
 class GraphExecutable;
 class OutputAdapter;
 
-/// The end of a compiled graph. It has no node of its own: the node that feeds the output adapter, the sink, writes
-/// straight into the client's image.
+/// The end of a compiled graph. It has no node of its own: the node that feeds the output adapter, the sink,
+/// writes straight into the client's image.
 ///
 /// Threads: as `IFilterExecutable`.
 class ORVO_API OutputAdapterExecutable : public IFilterExecutable {
@@ -22,9 +22,10 @@ public:
 
     ~OutputAdapterExecutable() override;
 
-    /// Binds the client's image to the sink, or unbinds what was bound if the image has no pixels, and sets the sink's
-    /// pixel extent, its region of interest (world space) and its output precision, which follows the channel type of
-    /// the client's image. Throws InternalException "Enforce pSink_ != NULL" before `bind`.
+    /// Binds the client's image to the sink, or unbinds what was bound if the image has no pixels, and sets
+    /// the sink's pixel extent, its region of interest (world space) and its output precision, which follows
+    /// the channel type of the client's image. Throws InternalException "Enforce pSink_ != NULL" before
+    /// `bind`.
     void forwardStuff() override;
 
     /// The sink's domain of definition (world space) goes back to the adapter.

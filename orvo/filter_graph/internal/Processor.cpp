@@ -22,10 +22,9 @@ namespace ORVO::FilterGraph::Internal {
 
 namespace {
 
-/// Walks the client graph. A graph that is not whole is reported, and left without marks: the host repairs it and asks
-/// for the frame again.
-void traverseClientGraph(OutputAdapter& graph, INodeVisitor& visitor)
-{
+/// Walks the client graph. A graph that is not whole is reported, and left without marks: the host repairs it
+/// and asks for the frame again.
+void traverseClientGraph(OutputAdapter& graph, INodeVisitor& visitor) {
     GraphTraverser traverser(graph.getIFilter(), &visitor);
     try {
         traverser.depthFirstTraversal();
@@ -37,23 +36,19 @@ void traverseClientGraph(OutputAdapter& graph, INodeVisitor& visitor)
 
 } // namespace
 
-Processor::Processor(OutputAdapter* pGraph, IAdapter::eRegionSyncMode regionSyncMode, OGL::Context const* context)
-    : pOriginalGraph_(pGraph), regionSyncMode_(regionSyncMode), frameStatus_(FRAME_NONE), context_(context)
-{
+Processor::Processor(OutputAdapter* pGraph, IAdapter::eRegionSyncMode regionSyncMode,
+                     OGL::Context const* context)
+    : pOriginalGraph_(pGraph), regionSyncMode_(regionSyncMode), frameStatus_(FRAME_NONE), context_(context) {
     ORVO_ENFORCE(pOriginalGraph_);
 }
 
 Processor::~Processor() = default;
 
-IOutputAdapter* Processor::output()
-{
-    return pOriginalGraph_;
-}
+IOutputAdapter* Processor::output() { return pOriginalGraph_; }
 
 // ---- Status
 
-IProcessorBase::eFrameStatus Processor::frameStatus()
-{
+IProcessorBase::eFrameStatus Processor::frameStatus() {
     if (frameStatus_ == FRAME_RUNNING || frameStatus_ == FRAME_CANCELLED) {
         ORVO_ENFORCE(spGraphExecutable_);
         if (spGraphExecutable_->isProcessingComplete()) {
@@ -64,37 +59,32 @@ IProcessorBase::eFrameStatus Processor::frameStatus()
     return frameStatus_;
 }
 
-IProcessorBase::eFrameStatus Processor::waitForFrame(double timeout, double interval)
-{
+IProcessorBase::eFrameStatus Processor::waitForFrame(double timeout, double interval) {
     ORVO_ENFORCE(spGraphExecutable_);
     spGraphExecutable_->waitForFrame(timeout, interval);
     return frameStatus();
 }
 
-IProcessorBase::eFrameStatus Processor::cancelFrame()
-{
+IProcessorBase::eFrameStatus Processor::cancelFrame() {
     ORVO_ENFORCE(spGraphExecutable_);
     frameStatus_ = FRAME_CANCELLED;
     spGraphExecutable_->cancelFrame();
     return frameStatus();
 }
 
-void Processor::sleep(double seconds)
-{
+void Processor::sleep(double seconds) {
     ORVO_ENFORCE(spGraphExecutable_);
     spGraphExecutable_->sleep(seconds);
 }
 
-void Processor::setCompletionCallback(bool (*callback)(void*))
-{
+void Processor::setCompletionCallback(bool (*callback)(void*)) {
     ORVO_ENFORCE(spGraphExecutable_);
     spGraphExecutable_->setCompletionCallback(callback);
 }
 
 // ---- Preparation
 
-void Processor::prepareForProcessing(OptimizationOptions const& options)
-{
+void Processor::prepareForProcessing(OptimizationOptions const& options) {
     if (options.processingMode() == OptimizationOptions::FULL_OPTIMIZATION) {
         ORVO_CHECK(context_, "Processing with FULL_OPTIMIZATION needs valid GL context.");
     }
@@ -105,25 +95,22 @@ void Processor::prepareForProcessing(OptimizationOptions const& options)
     selectGraphExecutable(options);
 }
 
-void Processor::waitForRunningFrame()
-{
+void Processor::waitForRunningFrame() {
     if (spGraphExecutable_) {
         spGraphExecutable_->waitForRunningFrame();
     }
 }
 
-void Processor::validateGraphExecutableAndIR(OptimizationOptions const& options)
-{
+void Processor::validateGraphExecutableAndIR(OptimizationOptions const& options) {
     if (clones_.empty() || isUpToDate(options)) {
         return;
     }
     dropGraphs();
 }
 
-// A failed build leaves an intermediate graph without an executable. That, too, is kept only as long as it still stands
-// for the client graph: otherwise no repair of the client graph would ever reach it.
-bool Processor::isUpToDate(OptimizationOptions const& options)
-{
+// A failed build leaves an intermediate graph without an executable. That, too, is kept only as long as it
+// still stands for the client graph: otherwise no repair of the client graph would ever reach it.
+bool Processor::isUpToDate(OptimizationOptions const& options) {
     if (!options.equals(irOptions_)) {
         return false;
     }
@@ -138,22 +125,19 @@ bool Processor::isUpToDate(OptimizationOptions const& options)
     return visitor.isUpToDate();
 }
 
-void Processor::dropGraphs() noexcept
-{
+void Processor::dropGraphs() noexcept {
     spGraphExecutable_.reset();
     clearIR();
 }
 
-void Processor::clearIR() noexcept
-{
+void Processor::clearIR() noexcept {
     aAdapters_.clear();
     aChildForwarders_.clear();
     parameterForwarder_.clear();
     clones_.clear();
 }
 
-void Processor::createIR(OptimizationOptions const& options)
-{
+void Processor::createIR(OptimizationOptions const& options) {
     if (!clones_.empty()) {
         return;
     }
@@ -177,8 +161,7 @@ void Processor::createIR(OptimizationOptions const& options)
     }
 }
 
-Filter* Processor::cloneOfConsumer(IFilter* pParent)
-{
+Filter* Processor::cloneOfConsumer(IFilter* pParent) {
     auto* const pConsumer = dynamic_cast<Filter*>(pParent);
     ORVO_ENFORCE(pConsumer);
     // A consumer that the output does not reach has no clone.
@@ -187,8 +170,7 @@ Filter* Processor::cloneOfConsumer(IFilter* pParent)
     return pConsumerClone;
 }
 
-void Processor::connectClones()
-{
+void Processor::connectClones() {
     for (auto const& [pOriginal, spClone] : clones_) {
         for (InputIterator iInput = pOriginal->output()->consumerInputs(); iInput.isValid(); ++iInput) {
             Filter* const pConsumerClone = cloneOfConsumer((*iInput)->parentFilter());
@@ -197,8 +179,7 @@ void Processor::connectClones()
     }
 }
 
-void Processor::collectAdapters()
-{
+void Processor::collectAdapters() {
     for (auto const& [pOriginal, spClone] : clones_) {
         auto* const pOriginalAdapter = dynamic_cast<IAdapter*>(pOriginal);
         if (!pOriginalAdapter) {
@@ -215,8 +196,7 @@ void Processor::collectAdapters()
     }
 }
 
-void Processor::selectGraphExecutable(OptimizationOptions options)
-{
+void Processor::selectGraphExecutable(OptimizationOptions options) {
     if (spGraphExecutable_) {
         return;
     }
@@ -228,8 +208,7 @@ void Processor::selectGraphExecutable(OptimizationOptions options)
 
 // ---- Images and regions
 
-void Processor::forwardImagesFromInputGraphToIRGraph(bool requireImage)
-{
+void Processor::forwardImagesFromInputGraphToIRGraph(bool requireImage) {
     for (AdapterPair const& pair : aAdapters_) {
         IAdapter* const adapterOriginal = pair.pOriginal;
         IAdapter* const adapterClone = pair.pClone;
@@ -241,13 +220,11 @@ void Processor::forwardImagesFromInputGraphToIRGraph(bool requireImage)
     }
 }
 
-void Processor::forwardImagesFromIRGraphToImageFlowGraph()
-{
+void Processor::forwardImagesFromIRGraphToImageFlowGraph() {
     spGraphExecutable_->forwardImagesToImageFlowGraph();
 }
 
-void Processor::forwardAdaptersToIRGraph()
-{
+void Processor::forwardAdaptersToIRGraph() {
     for (AdapterPair const& pair : aAdapters_) {
         IAdapter* const adapterOriginal = pair.pOriginal;
         IAdapter* const adapterClone = pair.pClone;
@@ -265,8 +242,7 @@ void Processor::forwardAdaptersToIRGraph()
     }
 }
 
-void Processor::returnRegionsToInputGraph()
-{
+void Processor::returnRegionsToInputGraph() {
     for (AdapterPair const& pair : aAdapters_) {
         if (pair.pOriginalInput) {
             ORVO_ENFORCE(pair.pCloneInput, "adapterClone");
@@ -279,8 +255,7 @@ void Processor::returnRegionsToInputGraph()
     }
 }
 
-void Processor::propagateDomainsOfDefinition()
-{
+void Processor::propagateDomainsOfDefinition() {
     ORVO_ENFORCE(spGraphExecutable_);
     waitForRunningFrame();
     parameterForwarder_.forwardStuff();
@@ -292,8 +267,7 @@ void Processor::propagateDomainsOfDefinition()
     returnRegionsToInputGraph();
 }
 
-void Processor::propagateRegionOfInterest()
-{
+void Processor::propagateRegionOfInterest() {
     ORVO_ENFORCE(spGraphExecutable_);
     waitForRunningFrame();
     forwardAdaptersToIRGraph();
@@ -303,8 +277,7 @@ void Processor::propagateRegionOfInterest()
 
 // ---- Frames
 
-void Processor::prepareFrame(OptimizationOptions const& options)
-{
+void Processor::prepareFrame(OptimizationOptions const& options) {
     prepareForProcessing(options);
     propagateDomainsOfDefinition();
     propagateRegionOfInterest();
@@ -315,15 +288,13 @@ void Processor::prepareFrame(OptimizationOptions const& options)
     frameStatus_ = FRAME_RUNNING;
 }
 
-void Processor::processFrameEmbedded(OptimizationOptions const& options)
-{
+void Processor::processFrameEmbedded(OptimizationOptions const& options) {
     prepareFrame(options);
     spGraphExecutable_->processFrame();
     frameStatus_ = FRAME_COMPLETE;
 }
 
-void* Processor::asyncProcessFrameEmbedded(OptimizationOptions const& options)
-{
+void* Processor::asyncProcessFrameEmbedded(OptimizationOptions const& options) {
     ORVO_CHECK(pOriginalGraph_ && pOriginalGraph_->getImage());
     prepareFrame(options);
     return spGraphExecutable_->asyncProcessFrame();

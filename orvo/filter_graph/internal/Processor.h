@@ -23,24 +23,25 @@ class GraphExecutable;
 class InputAdapter;
 class OutputAdapter;
 
-/// Computes frames of a client graph. It owns a private copy of the graph, the intermediate graph, and the executable
-/// that was built from it. Before each frame it compares time stamps and options, and builds both anew if a filter was
-/// connected, disconnected or added, if an adapter holds an image of another form, or if an option changed. Values of
-/// parameters, and images of the same form, are carried over on each frame and rebuild nothing.
+/// Computes frames of a client graph. It owns a private copy of the graph, the intermediate graph, and the
+/// executable that was built from it. Before each frame it compares time stamps and options, and builds both
+/// anew if a filter was connected, disconnected or added, if an adapter holds an image of another form, or if
+/// an option changed. Values of parameters, and images of the same form, are carried over on each frame and
+/// rebuild nothing.
 ///
-/// A frame that still runs is waited for before anything that it uses is changed: by the next launch, by a propagation
-/// and by the destructor, which cancels it first. None of these, nor `waitForFrame`, may be called from within the
-/// completion callback: a launch or a propagation is refused there (InternalException "The completion callback must
-/// not change the frame that it ends"), a wait would never end.
+/// A frame that still runs is waited for before anything that it uses is changed: by the next launch, by a
+/// propagation and by the destructor, which cancels it first. None of these, nor `waitForFrame`, may be
+/// called from within the completion callback: a launch or a propagation is refused there (InternalException
+/// "The completion callback must not change the frame that it ends"), a wait would never end.
 ///
-/// If the client graph has a cycle or an unconnected input, the frame fails and the graph can be repaired and run
-/// again: the marks of the failed walk are taken back.
+/// If the client graph has a cycle or an unconnected input, the frame fails and the graph can be repaired and
+/// run again: the marks of the failed walk are taken back.
 ///
 /// Threads: the host's thread. `frameStatus` may be polled from another thread while no other operation runs.
 class ORVO_API Processor : public IEmbeddedProcessor {
 public:
-    /// `pGraph` is the end of the client graph, `context` may be null. Neither is owned, and both must outlive the
-    /// processor. Throws InternalException "Enforce pOriginalGraph_ != NULL" on a null graph.
+    /// `pGraph` is the end of the client graph, `context` may be null. Neither is owned, and both must
+    /// outlive the processor. Throws InternalException "Enforce pOriginalGraph_ != NULL" on a null graph.
     Processor(OutputAdapter* pGraph, IAdapter::eRegionSyncMode regionSyncMode, OGL::Context const* context);
 
     /// Cancels a running frame and waits for it.
@@ -53,8 +54,8 @@ public:
     /// SharedException).
     eFrameStatus frameStatus() override;
 
-    /// Waits for the frame, at most about `timeout` seconds, looking at it every `interval` seconds; then `frameStatus`.
-    /// Throws InternalException "Enforce spGraphExecutable_ != NULL" if nothing was built yet.
+    /// Waits for the frame, at most about `timeout` seconds, looking at it every `interval` seconds; then
+    /// `frameStatus`. Throws InternalException "Enforce spGraphExecutable_ != NULL" if nothing was built yet.
     eFrameStatus waitForFrame(double timeout, double interval) override;
 
     /// Asks the frame to stop, then `frameStatus`. Throws as `waitForFrame`.
@@ -63,20 +64,23 @@ public:
     /// Lets the calling thread sleep for this number of seconds. Throws as `waitForFrame`.
     void sleep(double seconds) override;
 
-    /// The callback of asynchronous frames. It is called on the thread that ends the frame, with the handle that
-    /// `asyncProcessFrameEmbedded` returned; its result is ignored. It is lost with a rebuild. Throws as `waitForFrame`.
+    /// The callback of asynchronous frames. It is called on the thread that ends the frame, with the handle
+    /// that `asyncProcessFrameEmbedded` returned; its result is ignored. It is lost with a rebuild. Throws as
+    /// `waitForFrame`.
     void setCompletionCallback(bool (*callback)(void*)) override;
 
     /// Brings the intermediate graph and the executable up to date. Throws InternalException "Processing with
     /// FULL_OPTIMIZATION needs valid GL context." if the options ask for OpenGL and there is no context,
-    /// FilterGraph::Exception if the client graph is not whole, and what the filters throw when they are built.
+    /// FilterGraph::Exception if the client graph is not whole, and what the filters throw when they are
+    /// built.
     void prepareForProcessing(OptimizationOptions const& options) override;
 
-    /// Carries parameter values and images down, and pixel extents and domains of definition from the sources to the
-    /// sink; the regions then stand in the client's adapters.
+    /// Carries parameter values and images down, and pixel extents and domains of definition from the sources
+    /// to the sink; the regions then stand in the client's adapters.
     void propagateDomainsOfDefinition() override;
 
-    /// Carries the region of interest from the sink to the sources; the regions then stand in the client's adapters.
+    /// Carries the region of interest from the sink to the sources; the regions then stand in the client's
+    /// adapters.
     void propagateRegionOfInterest() override;
 
     /// Computes a frame on this call.
@@ -92,8 +96,8 @@ public:
 private:
     using CloneMap = std::map<Filter*, std::shared_ptr<Filter>>;
 
-    /// An adapter of the client graph, its clone, and both in the forms that are needed on each frame. Exactly one of
-    /// the two pairs of pointers is set.
+    /// An adapter of the client graph, its clone, and both in the forms that are needed on each frame.
+    /// Exactly one of the two pairs of pointers is set.
     struct AdapterPair {
         IAdapter* pOriginal;
         IAdapter* pClone; // null if the clone is no adapter
@@ -131,7 +135,8 @@ private:
     eFrameStatus frameStatus_;
     OGL::Context const* context_;
     OptimizationOptions irOptions_; // those that clones_ were made for
-    std::vector<AdapterPair> aAdapters_; // those of clones_ in map order: a frame need not ask each filter for its kind
+    std::vector<AdapterPair>
+        aAdapters_; // those of clones_ in map order: a frame need not ask each filter for its kind
 };
 
 } // namespace ORVO::FilterGraph::Internal

@@ -1,5 +1,5 @@
-// The scaling filters that a processor puts where 16-bit images of the 0..32768 scale meet a graph on OpenGL, which
-// reads 16-bit textures on the scale 0..65535.
+// The scaling filters that a processor puts where 16-bit images of the 0..32768 scale meet a graph on OpenGL,
+// which reads 16-bit textures on the scale 0..65535.
 #include "orvo/core/Check.h"
 #include "orvo/filter_graph/impl/FilterFactory.h"
 #include "orvo/filter_graph/impl/ImageDescriptor.h"
@@ -17,17 +17,16 @@ namespace {
 
 constexpr int kChannelType15_1 = 2;
 
-bool isOn15_1Scale(ImageDescriptor const& descriptor)
-{
+bool isOn15_1Scale(ImageDescriptor const& descriptor) {
     return static_cast<int>(descriptor.format().channelType) == kChannelType15_1;
 }
 
 /// A scaling filter from the factory; `prefix` is "scaleUp" or "scaleDown".
-std::shared_ptr<Filter> createScalingFilter(std::string const& prefix, std::size_t nChannel)
-{
-    ORVO_CHECK(nChannel >= 1 && nChannel <= 4,
-               "Not implemented: Only 1/2/3/4 channel 15+1 to 16 bit scaling nodes are available in the filter "
-               "factory\n");
+std::shared_ptr<Filter> createScalingFilter(std::string const& prefix, std::size_t nChannel) {
+    ORVO_CHECK(
+        nChannel >= 1 && nChannel <= 4,
+        "Not implemented: Only 1/2/3/4 channel 15+1 to 16 bit scaling nodes are available in the filter "
+        "factory\n");
     IFilter::Identifier const identifier(prefix + std::to_string(nChannel) + "channel", "ORVO", "Norvane", 1);
     auto const spFilter = std::dynamic_pointer_cast<Filter>(FilterFactory::Instance()->create(identifier));
     ORVO_ENFORCE(spFilter.get(), "spFilter");
@@ -36,9 +35,9 @@ std::shared_ptr<Filter> createScalingFilter(std::string const& prefix, std::size
 
 } // namespace
 
-void Processor::insertGPU15_1ScalingNodes()
-{
-    // The scaling filters join the map as their own keys, and are no input adapters when this loop meets them.
+void Processor::insertGPU15_1ScalingNodes() {
+    // The scaling filters join the map as their own keys, and are no input adapters when this loop meets
+    // them.
     for (auto const& [pOriginal, spClone] : clones_) {
         ORVO_ENFORCE(pOriginal->output(), "output");
         insertInputScaling(pOriginal, spClone.get());
@@ -46,8 +45,7 @@ void Processor::insertGPU15_1ScalingNodes()
     insertOutputScaling();
 }
 
-void Processor::insertInputScaling(Filter* pOriginal, Filter* pClone)
-{
+void Processor::insertInputScaling(Filter* pOriginal, Filter* pClone) {
     auto const* const pAdapter = dynamic_cast<InputAdapter*>(pOriginal);
     if (!pAdapter || !isOn15_1Scale(pAdapter->getImageDescriptor())) {
         return;
@@ -63,8 +61,7 @@ void Processor::insertInputScaling(Filter* pOriginal, Filter* pClone)
     }
 }
 
-void Processor::insertOutputScaling()
-{
+void Processor::insertOutputScaling() {
     ImageDescriptor const& descriptor = pOriginalGraph_->getImageDescriptor();
     if (!isOn15_1Scale(descriptor)) {
         return;

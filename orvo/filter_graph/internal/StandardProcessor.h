@@ -5,8 +5,8 @@
 
 namespace ORVO::FilterGraph::Internal {
 
-/// The processor of hosts that want frames and nothing else: each operation is that of a `Processor` whose regions
-/// follow the bound images.
+/// The processor of hosts that want frames and nothing else: each operation is that of a `Processor` whose
+/// regions follow the bound images.
 ///
 /// Threads: as `Processor`.
 class ORVO_API StandardProcessor : public IProcessor {
