@@ -1,0 +1,210 @@
+// Conversions between 8-bit and 16-bit integers and 32-bit floats, RGBA 3840 x 2160, on one and two threads.
+//
+// Bytes per second count bytes read plus bytes written; "memcpy/<bytes>" moves as many. The counter to_memcpy
+// is the time of the conversion in times of memcpy for the same bytes on as many threads, the two run by
+// turns so that both see the same machine. ".../plain/..." are the same conversions by the plain kernels.
+#include "orvo/image_runtime/ConvertSIMDOptimizedImageCPU.h"
+
+#include "benchmarks/support/MemoryBandwidth.h"
+#include "orvo/core/utility/SharedPtr.h"
+#include "orvo/image_runtime/BlankSIMDOptimizedImageCPU.h"
+#include "orvo/image_runtime/kernels/InstructionSet.h"
+
+#include <benchmark/benchmark.h>
+
+#include <algorithm>
+#include <barrier>
+#include <chrono>
+#include <cstdint>
+#include <cstring>
+#include <functional>
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
+
+namespace {
+
+using namespace ORVO;
+
+constexpr int WIDTH = 3840;
+constexpr int HEIGHT = 2160;
+
+/// Runs a job on parts of a range, part 0 on the calling thread and the others on threads that wait between
+/// jobs.
+class Team {
+public:
+    explicit Team(int nThreads) : nThreads_(nThreads), oStart_(nThreads), oEnd_(nThreads) {
+        for (int i = 1; i < nThreads; ++i) {
+            aThreads_.emplace_back([this, i] { work(i); });
+        }
+    }
+
+    ~Team() {
+        job_ = nullptr;
+        oStart_.arrive_and_wait();
+        for (std::thread& thread : aThreads_) {
+            thread.join();
+        }
+    }
+
+    Team(Team const&) = delete;
+    Team& operator=(Team const&) = delete;
+
+    /// job(begin, end) for equal parts of 0 .. n.
+    void run(std::size_t n, std::function<void(std::size_t, std::size_t)> const& job) {
+        n_ = n;
+        job_ = &job;
+        oStart_.arrive_and_wait();
+        runPart(0);
+        oEnd_.arrive_and_wait();
+    }
+
+private:
+    void work(int iPart) {
+        for (;;) {
+            oStart_.arrive_and_wait();
+            if (!job_) {
+                return;
+            }
+            runPart(iPart);
+            oEnd_.arrive_and_wait();
+        }
+    }
+
+    void runPart(int iPart) {
+        std::size_t const nParts = static_cast<std::size_t>(nThreads_);
+        std::size_t const nPart = static_cast<std::size_t>(iPart);
+        (*job_)(n_ * nPart / nParts, n_ * (nPart + 1) / nParts);
+    }
+
+    int nThreads_;
+    std::size_t n_ = 0;
+    std::function<void(std::size_t, std::size_t)> const* job_ = nullptr;
+    std::barrier<> oStart_;
+    std::barrier<> oEnd_;
+    std::vector<std::thread> aThreads_;
+};
+
+double secondsOf(std::function<void()> const& work) {
+    auto const begin = std::chrono::steady_clock::now();
+    work();
+    return std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();
+}
+
+double medianOf(std::vector<double> seconds) {
+    auto const middle = seconds.begin() + static_cast<std::ptrdiff_t>(seconds.size() / 2);
+    std::nth_element(seconds.begin(), middle, seconds.end());
+    return *middle;
+}
+
+PositionExtentInPixelSpace frame() { return PositionExtentInPixelSpace(ExtentInPixelSpace(WIDTH, HEIGHT)); }
+
+using Owned = std::unique_ptr<ImageCPU, ORVODeleter<ImageCPU>>;
+
+std::size_t bytesOf(ImageCPU::tePixelFormat eFormat) {
+    return static_cast<std::size_t>(WIDTH) * HEIGHT * pixelSizeBytes(eFormat);
+}
+
+struct Setting {
+    ImageCPU::tePixelFormat eFormat;
+    ImageRuntime::InstructionSet eInstructionSet;
+    int nThreads;
+
+    /// Bytes read plus bytes written.
+    std::size_t bytes() const { return bytesOf(eFormat) + bytesOf(ImageCPU::PIXEL_FORMAT_RGBA32F); }
+};
+
+/// Integers of all values, at random enough.
+void fill(ImageCPU& image) {
+    std::uint32_t state = 1;
+    for (std::size_t i = 0; i < bytesOf(image.pixelFormat()); i += 2) {
+        state = state * 1664525u + 1013904223u;
+        std::uint16_t const word = static_cast<std::uint16_t>((state >> 16) % 32769u);
+        std::memcpy(image.pixels() + i, &word, sizeof(word));
+    }
+}
+
+/// Converts row ranges on a team, in turns with memcpy for as many bytes.
+void measure(benchmark::State& state, Setting const& setting,
+             std::function<void(int, int)> const& convertRows) {
+    Team team(setting.nThreads);
+    std::vector<unsigned char> aFrom(setting.bytes() / 2, 1);
+    std::vector<unsigned char> aTo(setting.bytes() / 2, 2);
+    auto const convert = [&] {
+        team.run(HEIGHT, [&](std::size_t begin, std::size_t end) {
+            convertRows(static_cast<int>(begin), static_cast<int>(end));
+        });
+    };
+    auto const copy = [&] {
+        team.run(aTo.size(), [&](std::size_t begin, std::size_t end) {
+            std::memcpy(aTo.data() + begin, aFrom.data() + begin, end - begin);
+        });
+    };
+
+    ImageRuntime::setActiveInstructionSet(setting.eInstructionSet);
+    convert();
+    std::vector<double> aConversion, aCopy;
+    for (auto _ : state) {
+        aConversion.push_back(secondsOf(convert));
+        state.PauseTiming();
+        aCopy.push_back(secondsOf(copy));
+        benchmark::DoNotOptimize(aTo.data());
+        state.ResumeTiming();
+    }
+    ImageRuntime::setActiveInstructionSet(ImageRuntime::bestInstructionSet());
+    state.counters["to_memcpy"] = medianOf(aConversion) / medianOf(aCopy);
+    state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(setting.bytes()));
+}
+
+void toFloat(benchmark::State& state, Setting const& setting) {
+    ImageCPU input(setting.eFormat, frame(), PixelExtentInWorldSpace(1, 1), ExtentInPixelSpace());
+    fill(input);
+    Owned const pOutput(ImageRuntime::getBlankSIMDOptimized32FFormat(input));
+    measure(state, setting, [&](int beginY, int endY) {
+        ImageRuntime::convertImageToSIMDOptimized32FFormat(input, pOutput.get(), 0, WIDTH, beginY, endY);
+    });
+}
+
+void fromFloat(benchmark::State& state, Setting const& setting) {
+    ImageCPU output(setting.eFormat, frame(), PixelExtentInWorldSpace(1, 1), ExtentInPixelSpace());
+    fill(output);
+    Owned const pInput(ImageRuntime::convertImageToSIMDOptimized32FFormat(output));
+    measure(state, setting, [&](int beginY, int endY) {
+        ImageRuntime::convertImageFromSIMDOptimized32FFormat(*pInput, &output, 0, WIDTH, beginY, endY);
+    });
+}
+
+void add(std::string const& sName, void (*work)(benchmark::State&, Setting const&), Setting const& setting) {
+    std::string const sFullName = sName + "/threads_" + std::to_string(setting.nThreads);
+    benchmark::RegisterBenchmark(sFullName.c_str(), work, setting)
+        ->UseRealTime()
+        ->Unit(benchmark::kMillisecond);
+}
+
+bool addAll() {
+    struct Row {
+        char const* sName;
+        ImageCPU::tePixelFormat eFormat;
+    };
+    for (Row const& row :
+         {Row{"rgba8", ImageCPU::PIXEL_FORMAT_RGBA8}, Row{"rgba16", ImageCPU::PIXEL_FORMAT_RGBA16}}) {
+        Benchmarks::registerMemcpy(Setting{row.eFormat, ImageRuntime::InstructionSet::PLAIN, 1}.bytes() / 2);
+        for (int nThreads : {1, 2}) {
+            for (bool bPlain : {true, false}) {
+                Setting const setting{row.eFormat,
+                                      bPlain ? ImageRuntime::InstructionSet::PLAIN
+                                             : ImageRuntime::bestInstructionSet(),
+                                      nThreads};
+                std::string const sVariant = std::string("/") + row.sName + (bPlain ? "/plain" : "/simd");
+                add("to_float" + sVariant, toFloat, setting);
+                add("from_float" + sVariant, fromFloat, setting);
+            }
+        }
+    }
+    return true;
+}
+
+bool const bAdded = addAll();
+
+} // namespace
