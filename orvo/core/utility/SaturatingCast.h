@@ -16,7 +16,8 @@ constexpr Int saturatingCast(Number value) noexcept {
     if constexpr (std::is_floating_point_v<Number>) {
         // One past the largest value is a power of two and thus exact in every floating-point type, unlike
         // the largest value itself.
-        constexpr Number beyond = static_cast<Number>(Limits::max() / 2 + 1) * Number(2);
+        constexpr Int halfBeyond = Limits::max() / 2 + 1;
+        constexpr Number beyond = static_cast<Number>(halfBeyond) * Number(2);
         constexpr Number lowest = static_cast<Number>(Limits::min());
         if (value != value)
             return 0;

@@ -67,7 +67,7 @@ public:
 
     /// A plain parameter of the same name, description, default and value, with all flags set.
     virtual std::shared_ptr<Parameter> cloneParameter() {
-        auto const spClone = create(defaultValue(), name(), description());
+        auto spClone = create(defaultValue(), name(), description());
         spClone->setValue(value());
         return spClone;
     }
