@@ -147,9 +147,10 @@ TEST(TrackedNew, CorrectsItselfAfterAPlainDelete) {
     // back.
     std::size_t const before = blocks();
     int* const pObject = ORVO_NEW int(1);
+    std::uintptr_t const volatile address = reinterpret_cast<std::uintptr_t>(pObject);
     delete pObject;
     EXPECT_EQ(before + 1, blocks());
-    ORVO_private::forgetTrackedBlock(pObject);
+    ORVO_private::forgetTrackedBlock(reinterpret_cast<void const*>(address));
     EXPECT_EQ(before, blocks());
 }
 
