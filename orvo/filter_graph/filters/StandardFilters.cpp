@@ -1,0 +1,57 @@
+#include "orvo/filter_graph/filters/StandardFilters.h"
+
+#include "orvo/filter_graph/filters/Bilateral.h"
+#include "orvo/filter_graph/impl/FilterFactory.h"
+#include "orvo/filter_graph/internal/ImageFlowFilter.h"
+#include "orvo/filter_graph/internal/ImageFlowFilterWrapper.h"
+#include "orvo/image_flow/ImageFlowLibrary.h"
+#include "orvo/image_flow/filters/ConvertFromSIMDOptimized.h"
+#include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
+
+#include <memory>
+#include <vector>
+
+namespace ORVO::FilterGraph {
+
+namespace {
+
+IFilter::Identifier imageFlowIdentifier(char const* name) {
+    return {name, ImageFlow::Library::imageFlowNamespace(), ImageFlow::Library::norvaneVendor(), 1};
+}
+
+std::vector<std::shared_ptr<IFilter>> standardPrototypes() {
+    std::vector<std::shared_ptr<IFilter>> prototypes;
+    prototypes.push_back(std::make_shared<Internal::Bilateral>());
+    for (char const* name : {"FastBilateralFilter", "SimpleBilateralCPU", "RGBToLABCPU", "LABToRGBCPU"})
+        prototypes.push_back(std::make_shared<Internal::ImageFlowFilterWrapper>(imageFlowIdentifier(name)));
+    prototypes.push_back(std::make_shared<Internal::ImageFlowFilter<ConvertToSIMDOptimized>>(
+        imageFlowIdentifier("ConvertToSIMDOptimized"), ORVO_TARGET_CPU));
+    prototypes.push_back(std::make_shared<Internal::ImageFlowFilter<ConvertFromSIMDOptimized>>(
+        imageFlowIdentifier("ConvertFromSIMDOptimized"), ORVO_TARGET_CPU));
+    return prototypes;
+}
+
+} // namespace
+
+void insertStandardFilters() {
+    FilterFactory& factory = *FilterFactory::Instance();
+    std::vector<IFilter::Identifier> inserted;
+    try {
+        for (auto const& prototype : standardPrototypes()) {
+            inserted.reserve(inserted.size() + 1);
+            inserted.push_back(factory.insert(*prototype));
+        }
+    } catch (...) {
+        for (auto const& identifier : inserted)
+            factory.remove(identifier);
+        throw;
+    }
+}
+
+void removeStandardFilters() {
+    FilterFactory& factory = *FilterFactory::Instance();
+    for (auto const& prototype : standardPrototypes())
+        factory.remove(prototype->identifier());
+}
+
+} // namespace ORVO::FilterGraph

@@ -1,0 +1,7 @@
+#include "orvo/filter_graph/impl/IProcessorBase.h"
+
+namespace ORVO::FilterGraph {
+
+IProcessorBase::~IProcessorBase() = default;
+
+} // namespace ORVO::FilterGraph

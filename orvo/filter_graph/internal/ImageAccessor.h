@@ -1,0 +1,46 @@
+#pragma once
+
+#include "orvo/core/Export.h"
+#include "orvo/filter_graph/impl/ImageBase.h"
+#include "orvo/filter_graph/impl/ImageDescriptor.h"
+#include "orvo/image_runtime/images/ImageCPU.h"
+
+#include <cstddef>
+#include <memory>
+
+namespace ORVO::FilterGraph::Internal {
+
+/// Translates between client images and the images of the runtime: descriptors, pixel formats, and the images
+/// themselves. The mappings of textures join this class with the texture images.
+///
+/// Threads: no state of its own; as the images that it is given.
+class ORVO_API ImageAccessor {
+public:
+    ImageAccessor() = delete;
+
+    /// The runtime image that a client image wraps, as a `T`; null if there is no client image, if it has no
+    /// storage, or if what it wraps is no `T`. Still owned by the client image.
+    template <class T>
+    static T* getImpl(FilterGraph::ImageBase const* pImage) {
+        return pImage ? dynamic_cast<T*>(pImage->wrappedImage()) : nullptr;
+    }
+
+    /// The pixel format of images in host memory with these channels. Formats in BGR order are never the
+    /// answer.
+    /// @throws InternalException with a text that begins with "Not implemented: " if there is none.
+    static ORVO::ImageCPU::tePixelFormat
+    mapDescriptorToCPUPixelFormat(std::size_t nChannel, ImageDescriptor::eChannelType channelType);
+
+    /// Channels and channel type of a pixel format. 16-bit integers are `CHANNEL_TYPE_UINT15_1`.
+    /// @throws InternalException for half-float and undefined formats and for values that are no format.
+    static ImageDescriptor::Format
+    mapPixelFormatToDescriptorFormat(ORVO::ImageCPU::tePixelFormat ePixelFormat);
+
+    /// A new client image around the pixels of a runtime image, which must have no padding and must outlive
+    /// it.
+    /// @throws InternalException "Enforce pImage != NULL" for null, "Not implemented: ePixelFormat in
+    /// wrapImageFlowImage" for an image on another target than the CPU, and as the mapping of the format.
+    static std::shared_ptr<FilterGraph::ImageBase> wrapImageFlowImage(ORVO::ImageBase* pImage);
+};
+
+} // namespace ORVO::FilterGraph::Internal
