@@ -1,0 +1,143 @@
+#include "orvo/image_flow/ImageFlowLibrary.h"
+
+#include "orvo/core/Check.h"
+#include "orvo/core/CoreLibrary.h"
+#include "orvo/core/memory/TrackedNew.h"
+#include "orvo/data_flow/DataFlowLibrary.h"
+#include "orvo/data_flow/librarian/NodeLibrarian.h"
+#include "orvo/data_flow/librarian/NodeMetaData.h"
+#include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
+#include "orvo/image_flow/filters/LABToRGBCPU.h"
+#include "orvo/image_flow/filters/RGBToLABCPU.h"
+#include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
+#include "orvo/image_flow/sources/ImageCPUInput.h"
+#include "orvo/image_runtime/ImageRuntimeLibrary.h"
+#include "orvo/ogl/OGLLibrary.h"
+
+#include <algorithm>
+#include <cstdint>
+
+namespace ORVO::ImageFlow {
+
+namespace {
+
+using DataFlow::Node;
+using DataFlow::NodeLibrarian;
+using DataFlow::NodeMetaData;
+using DataFlow::NodeTargetType;
+
+constexpr std::uint32_t iNodeVersion = 1;
+
+bool bInitialized = false;
+
+/// A node type that runs on the CPU alone.
+template <typename CPUNode>
+Node* createOnCPU(NodeTargetType target) {
+    return target == DataFlow::NODE_TARGET_GPU ? nullptr : ORVO_NEW CPUNode();
+}
+
+/// A node type with one class for every target.
+template <typename AnyNode>
+Node* createOnAny(NodeTargetType /*target*/) {
+    return ORVO_NEW AnyNode();
+}
+
+struct NodeType {
+    char const* pName_;
+    char const* pClientID_;
+    Node* (*pCreate_)(NodeTargetType);
+};
+
+/// The node types in the order of their registration.
+constexpr NodeType aNodeTypes[] = {
+    {"FastBilateralFilter", "NRVN Fast Bilateral", createOnCPU<FastBilateralFilterCPUNode>},
+    {"RGBToLABCPU", "NRVN ORVO RGB2LAB", createOnCPU<RGBToLABCPU>},
+    {"LABToRGBCPU", "NRVN ORVO LAB2RGB", createOnCPU<LABToRGBCPU>},
+    {"ImageCPUInput", "ImageCPUInput", createOnAny<ImageCPUInput>},
+    {"SimpleBilateralCPU", "NRVN Simple Bilateral CPU", createOnCPU<SimpleBilateralFilterCPU>},
+};
+
+bool isRegistered(NodeLibrarian const& librarian, NodeType const& type) {
+    return std::any_of(librarian.begin(), librarian.end(), [&](NodeMetaData const* pMetaData) {
+        return pMetaData->vendor() == Library::norvaneVendor() &&
+               pMetaData->nameSpace() == Library::imageFlowNamespace() && pMetaData->name() == type.pName_ &&
+               pMetaData->version() == iNodeVersion;
+    });
+}
+
+void registerNodeTypes(NodeLibrarian& librarian) {
+    for (NodeType const& type : aNodeTypes) {
+        bool const bDuplicate = isRegistered(librarian, type);
+        ORVO_CHECK_PARAMETER(!bDuplicate);
+    }
+    try {
+        for (NodeType const& type : aNodeTypes) {
+            librarian.add(type.pCreate_,
+                          ORVO_NEW NodeMetaData(type.pName_, Library::imageFlowNamespace(),
+                                                Library::norvaneVendor(), iNodeVersion, "", type.pClientID_));
+        }
+    } catch (...) {
+        // Half a catalogue would refuse the next start as a duplicate.
+        librarian.clearAll();
+        throw;
+    }
+}
+
+void checkLowerLayers() {
+    ORVO_CHECK(Core::Library::isInitialized());
+    ORVO_CHECK(DataFlow::Library::isInitialized());
+    ORVO_CHECK(OGL::Library::isInitialized());
+}
+
+} // namespace
+
+void Library::initialize(bool /*checkGPU*/) {
+    ORVO_CHECK(!bInitialized, "ImageFlow already initialized");
+    checkLowerLayers();
+    // A driver is there to be checked only where the runtime was given a context.
+    ORVO_CHECK(cpuOnlyMode());
+    if (NodeLibrarian::exists()) {
+        registerNodeTypes(*NodeLibrarian::Instance());
+    }
+    bInitialized = true;
+}
+
+void Library::terminate() {
+    ORVO_CHECK(bInitialized, "ImageFlow is not initialized!");
+    checkLowerLayers();
+    NodeLibrarian::Instance()->clearAll();
+    bInitialized = false;
+}
+
+bool Library::isInitialized() { return bInitialized; }
+
+bool Library::cpuOnlyMode() {
+    ORVO_CHECK(ImageRuntime::Library::isInitialized());
+    return ImageRuntime::Library::initializationContextList().front() == nullptr;
+}
+
+std::string Library::norvaneVendor() { return "Norvane"; }
+
+std::string Library::imageFlowNamespace() { return "ImageFlow"; }
+
+std::string Library::motionLoftNamespace() { return "MotionLoft"; }
+
+AutoInitializer::AutoInitializer(bool checkGPU) : bActive_(true) {
+    if (!Library::isInitialized()) {
+        Library::initialize(checkGPU);
+    }
+}
+
+AutoInitializer::~AutoInitializer() {
+    if (!bActive_) {
+        return;
+    }
+    try {
+        Library::terminate();
+    } catch (...) { // A destructor never throws; the host may have terminated the layer itself.
+    }
+}
+
+void AutoInitializer::release() { bActive_ = false; }
+
+} // namespace ORVO::ImageFlow

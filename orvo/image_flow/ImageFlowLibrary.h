@@ -1,0 +1,63 @@
+#pragma once
+
+#include "orvo/core/Export.h"
+
+#include <string>
+
+namespace ORVO::ImageFlow {
+
+/// Start and stop of the image layer. Core, OGL, image runtime and data flow libraries must be up before it
+/// starts. Failures are `InternalException`s with the stated texts.
+///
+/// Threads: `initialize` and `terminate` by the thread that starts the layers; the others from any thread.
+class ORVO_API Library {
+public:
+    Library() = delete;
+
+    /// Registers the node types of the layer with the `DataFlow::NodeLibrarian`. `checkGPU` asks for the
+    /// check of the OpenGL driver, which takes place only where the image runtime was given a context. After
+    /// a failure the library is not initialized and may be started again.
+    ///
+    /// Throws "ImageFlow already initialized", "Core::Library::isInitialized()",
+    /// "DataFlow::Library::isInitialized()", "OGL::Library::isInitialized()" or
+    /// "ImageRuntime::Library::isInitialized()", and `ParameterException` "!bDuplicate" where a node type of
+    /// the same identity is registered already; the catalogue is then as it was.
+    static void initialize(bool checkGPU);
+    /// Removes every node type from the librarian, also those that others registered. Throws "ImageFlow is
+    /// not initialized!", "Core::Library::isInitialized()", "DataFlow::Library::isInitialized()" or
+    /// "OGL::Library::isInitialized()".
+    static void terminate();
+    static bool isInitialized();
+    /// Whether the image runtime was started without an OpenGL context. Throws
+    /// "ImageRuntime::Library::isInitialized()".
+    static bool cpuOnlyMode();
+
+    /// "Norvane".
+    static std::string norvaneVendor();
+    /// "ImageFlow".
+    static std::string imageFlowNamespace();
+    /// "MotionLoft".
+    static std::string motionLoftNamespace();
+};
+
+/// Keeps the image layer up in a scope.
+///
+/// Threads: the thread that starts the layers.
+class ORVO_API AutoInitializer {
+public:
+    /// Starts the library unless it is up. Throws as `Library::initialize`.
+    explicit AutoInitializer(bool checkGPU);
+    /// Terminates the library, unless released; failures are swallowed.
+    ~AutoInitializer();
+
+    AutoInitializer(AutoInitializer const&) = delete;
+    AutoInitializer& operator=(AutoInitializer const&) = delete;
+
+    /// Leaves the library up at the end of the scope.
+    void release();
+
+private:
+    bool bActive_;
+};
+
+} // namespace ORVO::ImageFlow

@@ -1,0 +1,90 @@
+#pragma once
+
+#include "orvo/core/Export.h"
+#include "orvo/core/spaces/PositionExtentInWorldSpace.h"
+#include "orvo/data_flow/controllers/Controller.h"
+
+#include <vector>
+
+namespace ORVO {
+
+class ImageFilter;
+class Visitor;
+
+/// The controller of image graphs: to the pull of `DataFlow::Controller` it adds the walks over the image
+/// nodes and the passes that fix the geometry, the dirty state and the formats of a frame. One frame takes
+/// these steps: `propagatePixelExtents` and `propagateDODs` (sources to sink), `propagateROIs` (sink to
+/// sources, then each node's compute region), `setNodeImageDescriptorInfo(true)` where the sink's output is
+/// bound, `setDirtyState`, then `process` or `processAsync`.
+///
+/// All walks keep their stack on the heap and are linear in nodes and connections, so graphs may be of any
+/// depth. Failures are `InternalException`s with the stated texts.
+///
+/// Threads: walks, wiring and `process` by one thread at a time, between frames.
+class ORVO_API ImageFlowController : public DataFlow::Controller {
+public:
+    ImageFlowController();
+    ~ImageFlowController() override;
+
+    /// `setNodeImageDescriptorInfo(false)`, then a synchronous frame.
+    void process() override;
+    /// `setNodeImageDescriptorInfo(false)`, then an asynchronous frame.
+    void processAsync() override;
+
+    /// Makes `sink` the node that walks and frames start from; it stays the caller's.
+    void setImageSink(ImageFilter& sink);
+    /// The sink; null if none is set or it is no image node.
+    ImageFilter* imageSink();
+    ImageFilter const* imageSink() const;
+
+    /// \name Passes of a frame
+    /// Each throws "Enforce imageSink() != NULL" without a sink, and "Enforce pOutput != NULL" or
+    /// "Enforce pSource != NULL" where an image input of a reached node is unconnected.
+    /// @{
+    void propagatePixelExtents();
+    void propagateDODs();
+    /// Asks the sink for `region` (world) and sets the ROI of every node that it reaches, then the compute
+    /// region of every image node of the graph: DOD intersected with ROI. Regions left by a failed pass are
+    /// forgotten first. Throws "Output region can't be infinite." at the first node whose compute region is
+    /// infinite; an undefined or empty one is not refused.
+    void propagateROIs(PositionExtentInWorldSpace const& region);
+    /// Pixel extents, DODs and ROIs, in this order.
+    void computeRegions(PositionExtentInWorldSpace const& region);
+    void setDirtyState();
+    /// @}
+
+    /// \name Walks
+    /// Nodes that the sink does not reach are not visited; a cycle ends at the first node met again.
+    /// @{
+
+    /// Pre-visit on entering a node, then its producers in input order, then post-visit. Afterwards the
+    /// colour of every reached node is 1.
+    void depthFirstSearch(Visitor& visitor);
+    /// Sink first, then level by level; each node gets its pre-visit, queues its producers and gets its
+    /// post-visit. Afterwards the colour of every reached node is 2.
+    void breadthFirstSearch(Visitor& visitor);
+    /// @}
+
+    /// True: every node, producers before consumers, takes its precision from the image on the sink's output.
+    /// False: unless the sink's output holds an image (the formats were fixed from it), every node takes its
+    /// format from its first input's image.
+    ///
+    /// Throws "Enforce pSink != NULL" without a sink, "iff!=0" where a node is no image node,
+    /// "(pSink->imageOutput()->hasData()) == true" where the sink's output holds no image, and "Not
+    /// implemented: ImageCPU Pixel format not supported" for BGR8, BGRA8, half and undefined formats of that
+    /// image.
+    void setNodeImageDescriptorInfo(bool fromSink);
+
+protected:
+    /// The depth-first walk from one node, with the visitor and the colours as they stand.
+    void depthFirstVisit(DataFlow::Node* node);
+
+private:
+    void determineComputeRegions();
+    void clearColors();
+    std::vector<ImageFilter*> filtersProducersFirst();
+
+    Visitor* pVisitor_;
+};
+
+} // namespace ORVO

@@ -1,0 +1,20 @@
+#pragma once
+
+#include "orvo/core/Export.h"
+#include "orvo/image_flow/graph/Visitor.h"
+
+namespace ORVO {
+
+/// Computes the domain of definition (world) of each node on leaving it, so that they flow from the sources
+/// to the sink. Throws `InternalException` "Enforce pImageFilter != NULL" for a node that is no image node,
+/// and what the operation of the node throws.
+///
+/// Threads: the walk's.
+class ORVO_API PropagateDODVisitor : public Visitor {
+public:
+    ~PropagateDODVisitor() override;
+    void preVisitImageNode(ImageFilter* pImageFilter) override;
+    void postVisitImageNode(ImageFilter* pImageFilter) override;
+};
+
+} // namespace ORVO

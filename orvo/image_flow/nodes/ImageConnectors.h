@@ -1,0 +1,25 @@
+#pragma once
+
+#include "orvo/core/Export.h"
+#include "orvo/data_flow/connectors/Inputs.h"
+#include "orvo/data_flow/connectors/Outputs.h"
+#include "orvo/data_flow/connectors/ParameterInput.h"
+#include "orvo/data_flow/data/ConstDataPointer.h"
+#include "orvo/data_flow/parameters/Parameter.h"
+#include "orvo/image_runtime/images/ImageCPU.h"
+
+/// The connectors of host-memory images and the parameters of their formats. They are instantiated once, in
+/// the library.
+namespace ORVO::DataFlow {
+
+extern template class ORVO_API ConstDataPointer<ImageCPU>;
+extern template class ORVO_API OutputTemplate<ImageCPU>;
+extern template class ORVO_API ConstOutput<ImageCPU>;
+extern template class ORVO_API Output<ImageCPU>;
+extern template class ORVO_API InputTemplate<ImageCPU>;
+extern template class ORVO_API ConstInput<ImageCPU>;
+extern template class ORVO_API Input<ImageCPU>;
+
+} // namespace ORVO::DataFlow
+
+ORVO_DECLARE_PARAMETER(ORVO::ImageCPU::tePixelFormat)
