@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <typeinfo>
 
 #include "orvo/core/exceptions/InternalException.h"
 #include "orvo/core/exceptions/ParameterException.h"

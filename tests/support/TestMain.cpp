@@ -4,7 +4,9 @@
 
 #include <array>
 #include <cstddef>
+#include <iostream>
 #include <sstream>
+#include <string>
 
 #include "orvo/core/memory/MemoryStatistics.h"
 
@@ -14,26 +16,36 @@ using ORVO::MEMORY_TYPE_IMAGE;
 using ORVO::MEMORY_TYPE_OBJECT;
 using ORVO::Core::MemoryStatistics;
 
+/// Blocks in use, by category.
+using Blocks = std::array<std::size_t, 2>;
+
+Blocks blocksInUse() {
+    return {MemoryStatistics::blocks(MEMORY_TYPE_OBJECT), MemoryStatistics::blocks(MEMORY_TYPE_IMAGE)};
+}
+
+/// What is left beyond the given blocks, in words; empty if nothing is.
+std::string leftBeyond(Blocks const& before) {
+    Blocks const after = blocksInUse();
+    std::ostringstream text;
+    if (after[1] > before[1])
+        text << after[1] - before[1] << " blocks of image storage are left\n";
+    if (after[0] > before[0]) {
+        text << after[0] - before[0] << " tracked objects are left; all in use:\n";
+        MemoryStatistics::writeObjects(text);
+    }
+    return text.str();
+}
+
 class LeakListener : public testing::EmptyTestEventListener {
     void OnTestStart(testing::TestInfo const&) override { aBefore_ = blocksInUse(); }
 
     void OnTestEnd(testing::TestInfo const&) override {
-        auto const after = blocksInUse();
-        if (after[1] > aBefore_[1])
-            ADD_FAILURE() << after[1] - aBefore_[1] << " blocks of image storage are left";
-        if (after[0] > aBefore_[0]) {
-            std::ostringstream sites;
-            MemoryStatistics::writeObjects(sites);
-            ADD_FAILURE() << after[0] - aBefore_[0] << " tracked objects are left; all in use:\n"
-                          << sites.str();
-        }
+        std::string const sLeft = leftBeyond(aBefore_);
+        if (!sLeft.empty())
+            ADD_FAILURE() << sLeft;
     }
 
-    static std::array<std::size_t, 2> blocksInUse() {
-        return {MemoryStatistics::blocks(MEMORY_TYPE_OBJECT), MemoryStatistics::blocks(MEMORY_TYPE_IMAGE)};
-    }
-
-    std::array<std::size_t, 2> aBefore_{};
+    Blocks aBefore_{};
 };
 
 } // namespace
@@ -45,5 +57,12 @@ int main(int argc, char** argv) {
     testing::TestEventListener* const pPrinter = listeners.Release(listeners.default_result_printer());
     listeners.Append(pPrinter);
     listeners.Append(new LeakListener);
-    return RUN_ALL_TESTS();
+
+    // What a whole suite shares is freed after its last test.
+    Blocks const before = blocksInUse();
+    int const result = RUN_ALL_TESTS();
+    std::string const sLeft = leftBeyond(before);
+    if (!sLeft.empty())
+        std::cerr << "At the end of the program:\n" << sLeft;
+    return sLeft.empty() ? result : 1;
 }

@@ -4,6 +4,8 @@
 #include <sys/resource.h>
 
 #include <cstring>
+#include <fstream>
+#include <new>
 #include <set>
 #include <thread>
 #include <vector>
@@ -221,6 +223,37 @@ TEST_F(ImageStorage, TakesNoPageFaultsForAFrameOfTheSameSizes) {
         frame();
     EXPECT_LE(minorFaults() - before,
               2); // 18 MiB a frame would be 4,600 pages, or 9 huge ones; two for the system
+}
+
+/// Lowers the address space of the process to what it uses and a bit more, for a scope.
+class AddressSpaceLimit {
+public:
+    explicit AddressSpaceLimit(std::size_t nMore) {
+        std::size_t nPages = 0;
+        std::ifstream("/proc/self/statm") >> nPages;
+        getrlimit(RLIMIT_AS, &oOld_);
+        rlimit lower = oOld_;
+        lower.rlim_cur = nPages * 4096 + nMore;
+        setrlimit(RLIMIT_AS, &lower);
+    }
+    ~AddressSpaceLimit() { setrlimit(RLIMIT_AS, &oOld_); }
+    AddressSpaceLimit(AddressSpaceLimit const&) = delete;
+    AddressSpaceLimit& operator=(AddressSpaceLimit const&) = delete;
+
+private:
+    rlimit oOld_{};
+};
+
+TEST_F(ImageStorage, GivesHeldBlocksBackBeforeMemoryIsSaidToBeOut) {
+    release(allocate(256 * nMiB));
+    AddressSpaceLimit const limit(64 * nMiB);
+    void* const pOther = allocate(200 * nMiB); // of another class: only the room of the held block serves it
+    EXPECT_EQ(0u, Core::heldImageStorage());
+    release(pOther);
+    EXPECT_THROW(allocate(1024 * nMiB), std::bad_alloc);
+    void* const pSmall = allocate(nMiB);
+    EXPECT_NE(nullptr, pSmall);
+    release(pSmall);
 }
 #endif
 
