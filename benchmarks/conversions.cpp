@@ -125,20 +125,30 @@ void fill(ImageCPU& image) {
     }
 }
 
+ImageCPU touchedBytes(std::size_t n) {
+    ImageCPU bytes(ImageCPU::PIXEL_FORMAT_LUMINANCE8,
+                   PositionExtentInPixelSpace(ExtentInPixelSpace(static_cast<int>(n), 1)),
+                   PixelExtentInWorldSpace(1, 1), ExtentInPixelSpace());
+    bytes.initializeToTransparentBlack();
+    return bytes;
+}
+
 /// Converts row ranges on a team, in turns with memcpy for as many bytes.
 void measure(benchmark::State& state, Setting const& setting,
              std::function<void(int, int)> const& convertRows) {
     Team team(setting.nThreads);
-    std::vector<unsigned char> aFrom(setting.bytes() / 2, 1);
-    std::vector<unsigned char> aTo(setting.bytes() / 2, 2);
+    // Storage of the same kind as that of the images.
+    std::size_t const nCopied = setting.bytes() / 2;
+    ImageCPU const from = touchedBytes(nCopied);
+    ImageCPU to = touchedBytes(nCopied);
     auto const convert = [&] {
         team.run(HEIGHT, [&](std::size_t begin, std::size_t end) {
             convertRows(static_cast<int>(begin), static_cast<int>(end));
         });
     };
     auto const copy = [&] {
-        team.run(aTo.size(), [&](std::size_t begin, std::size_t end) {
-            std::memcpy(aTo.data() + begin, aFrom.data() + begin, end - begin);
+        team.run(nCopied, [&](std::size_t begin, std::size_t end) {
+            std::memcpy(to.pixels() + begin, from.pixels() + begin, end - begin);
         });
     };
 
@@ -149,7 +159,7 @@ void measure(benchmark::State& state, Setting const& setting,
         aConversion.push_back(secondsOf(convert));
         state.PauseTiming();
         aCopy.push_back(secondsOf(copy));
-        benchmark::DoNotOptimize(aTo.data());
+        benchmark::DoNotOptimize(to.pixels());
         state.ResumeTiming();
     }
     ImageRuntime::setActiveInstructionSet(ImageRuntime::bestInstructionSet());

@@ -34,7 +34,7 @@ Library::DeviceObject createDeviceObject(OGL::Context const* pContext) {
 void Library::initialize(std::vector<OGL::Context const*> const& vpContext,
                          VideoMemory::Configuration const&) {
     enforceLowerLayers();
-    ORVO_CHECK(vpContext.size());
+    ORVO_CHECK(!vpContext.empty(), "vpContext.size()");
     ORVO_CHECK(!pvDeviceObject_);
     // Asked before any record is made, so that a refused list leaves nothing behind.
     ORVO_CHECK(vpContext.size() == 1 ||

@@ -58,7 +58,8 @@ ORVO_API RowKernels const& rowKernels();
 /// @throws ParameterException "isSupported(eInstructionSet)" if the processor lacks it.
 ORVO_API RowKernels const& rowKernels(InstructionSet eInstructionSet);
 
-/// STREAM if an output of so many bytes is better written past the caches, else CACHED.
+/// STREAM if an output of so many bytes is better written past the caches (from three quarters of the
+/// last-level cache on), else CACHED.
 ORVO_API StoreMode storeModeForOutput(std::uint64_t nBytes);
 
 } // namespace ORVO::ImageRuntime

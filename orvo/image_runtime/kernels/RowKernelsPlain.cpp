@@ -51,11 +51,11 @@ void groupsFloatFromUInt16(float* pOutput, std::uint16_t const* pInput, std::siz
 
 /// To the nearest integer, ties to even, whatever the rounding mode of the thread. For numbers from 0 to
 /// 32768.
-float roundedToNearest(float value) {
-    float const lower = std::floor(value);
-    float const fraction = value - lower;
-    bool const bUp = fraction > 0.5f || (fraction == 0.5f && std::fmod(lower, 2.0f) == 1.0f);
-    return bUp ? lower + 1.0f : lower;
+int roundedToNearest(float value) {
+    int const lower = static_cast<int>(value);
+    float const fraction = value - static_cast<float>(lower);
+    bool const bUp = fraction > 0.5f || (fraction == 0.5f && lower % 2 == 1);
+    return lower + bUp;
 }
 
 template <class Integer>
@@ -64,7 +64,7 @@ void groupsIntegerFromFloat(Integer* pOutput, float const* pInput, std::size_t n
         float const scaled = pInput[i] * white;
         // The comparisons are false for a NaN, which thus becomes 0.
         float const clamped = scaled > 0.0f ? std::min(scaled, white) : 0.0f;
-        pOutput[i] = saturatingCast<Integer>(roundedToNearest(clamped));
+        pOutput[i] = static_cast<Integer>(roundedToNearest(clamped));
     }
 }
 
