@@ -64,12 +64,17 @@ void ControllerImpl::forEachSlice(std::size_t nItems, std::size_t nGrain, std::s
         // around here: that may need the lock of the very node that is running.
         tbb::this_task_arena::isolate([&] { runParallel(nItems, nGrain, body); });
     } else {
-        if (!pArena_ || nArenaThreads_ != nThreads) {
-            pArena_ = std::make_unique<tbb::task_arena>(static_cast<int>(nThreads));
-            nArenaThreads_ = nThreads;
-        }
-        pArena_->execute([&] { runParallel(nItems, nGrain, body); });
+        arenaFor(nThreads)->execute([&] { runParallel(nItems, nGrain, body); });
     }
+}
+
+std::shared_ptr<tbb::task_arena> ControllerImpl::arenaFor(std::size_t nThreads) {
+    std::lock_guard const lock(oArenaLock_);
+    if (!spArena_ || nArenaThreads_ != nThreads) {
+        spArena_ = std::make_shared<tbb::task_arena>(static_cast<int>(nThreads));
+        nArenaThreads_ = nThreads;
+    }
+    return spArena_;
 }
 
 void ControllerImpl::runAlone(std::size_t nItems, std::size_t nGrain, processSliceHelper const& body) {

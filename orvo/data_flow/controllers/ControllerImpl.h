@@ -9,6 +9,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <mutex>
 
 namespace ORVO {
 class ExceptionBase;
@@ -67,12 +68,15 @@ public:
 private:
     friend struct TestAccess;
 
+    std::shared_ptr<tbb::task_arena> arenaFor(std::size_t nThreads);
     void runAlone(std::size_t nItems, std::size_t nGrain, processSliceHelper const& body);
     void runParallel(std::size_t nItems, std::size_t nGrain, processSliceHelper const& body);
 
     tbb::task_group_context oGroup_;
     std::unique_ptr<FrameLatch> pRoot_;
-    std::unique_ptr<tbb::task_arena> pArena_; // made when fewer threads are wanted than the machine has
+    // Made when fewer threads are wanted than the scheduler offers, and again when their number changes.
+    std::mutex oArenaLock_;
+    std::shared_ptr<tbb::task_arena> spArena_;
     std::size_t nArenaThreads_ = 0;
     std::shared_ptr<ExceptionBase> spReserveException_;
 };

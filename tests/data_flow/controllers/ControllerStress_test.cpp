@@ -1,3 +1,5 @@
+#include "orvo/core/exceptions/ExceptionBase.h"
+#include "orvo/core/memory/AllocationFailure.h"
 #include "orvo/data_flow/controllers/Controller.h"
 #include "orvo/data_flow/controllers/SchedulingHooks.h"
 
@@ -7,6 +9,8 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <cstdint>
+#include <new>
 #include <random>
 #include <thread>
 
@@ -170,6 +174,44 @@ TEST_F(ControllerStressTest, ControllersDieInTheMiddleOfTheirFrames) {
         Graph graph;
         graph.controller.processAsync();
         spin(std::chrono::nanoseconds(random() % 100000));
+    }
+}
+
+TEST_F(ControllerStressTest, EveryAllocationOfAFrameMayFailInTurn) {
+    Graph graph;
+    Controller& controller = graph.controller;
+    for (bool const bAsync : {false, true}) {
+        bool bFired = true;
+        int nFailed = 0;
+        for (std::uint64_t n = 1; bFired; ++n) {
+            bool bThrown = false;
+            {
+                Core::AllocationFailure const failure(n);
+                try {
+                    if (bAsync) {
+                        controller.processAsync();
+                        EXPECT_TRUE(controller.wait(60.0, 0.0));
+                        controller.checkException();
+                    } else {
+                        controller.process();
+                    }
+                } catch (std::bad_alloc const&) {
+                    bThrown = true;
+                } catch (ExceptionBase const&) {
+                    bThrown = true;
+                }
+                bFired = failure.hasFired();
+            }
+            EXPECT_EQ(bFired, bThrown) << "allocation " << n;
+            nFailed += bThrown ? 1 : 0;
+            ASSERT_EQ(0, static_cast<int>(controller.controllerStatus()));
+            ASSERT_TRUE(controller.flushGraph());
+            controller.process();
+            ASSERT_EQ(Graph::iExpected, graph.sink.result()) << "after the failure of allocation " << n;
+            ASSERT_TRUE(controller.flushGraph());
+        }
+        // The five numbers in the outputs, and the task of the asynchronous frame.
+        EXPECT_EQ(bAsync ? 6 : 5, nFailed);
     }
 }
 
