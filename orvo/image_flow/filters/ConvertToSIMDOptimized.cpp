@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <cstring>
 
 namespace ORVO {
 
@@ -40,7 +41,22 @@ void ConvertToSIMDOptimized::createOutputImage() {
             : pixelFormatFor(outputPrecisionHint(), getNumChannelsOutput());
     spOutputImage_.setDataWithReleasableOwnership(ImageRuntime::getBlankSIMDOptimized32FFormat(
         format, oOutputRegionInPixels_.extent(), outputPixelExtent(), oOutputRegionInPixels_.position()));
-    spOutputImage_->initializeToTransparentBlack();
+    if (pInput != nullptr && isInside(oOutputRegionInPixels_, pInput->positionExtent())) {
+        clearPadding();
+    } else {
+        spOutputImage_->initializeToTransparentBlack();
+    }
+}
+
+void ConvertToSIMDOptimized::clearPadding() {
+    ImageCPU& image = *spOutputImage_;
+    std::size_t const pixelBytes = pixelSizeBytes(image.pixelFormat());
+    std::size_t const usedBytes = static_cast<std::size_t>(image.extent().width()) * pixelBytes;
+    std::size_t const rowBytes = static_cast<std::size_t>(image.capacityExtent().width()) * pixelBytes;
+    for (int row = 0; row < image.extent().height(); ++row) {
+        std::memset(image.pixels() + static_cast<std::size_t>(row) * rowBytes + usedBytes, 0,
+                    rowBytes - usedBytes);
+    }
 }
 
 void ConvertToSIMDOptimized::processSlice(std::size_t begin, std::size_t end) {

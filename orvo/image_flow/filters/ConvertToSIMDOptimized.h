@@ -25,6 +25,8 @@ public:
 
 private:
     void createOutputImage();
+    /// Makes the storage beyond the pixels transparent black; the pixels will all be written.
+    void clearPadding();
 
     int nBeginX_;
     int nEndX_;

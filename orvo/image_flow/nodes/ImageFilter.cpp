@@ -32,20 +32,6 @@ PositionExtentInPixelSpace storedRegion(ImageCPU const& image) {
                                                  std::min(image.extent().height(), capacity.height()))};
 }
 
-bool isInside(PositionExtentInPixelSpace const& inner, PositionExtentInPixelSpace const& outer) {
-    if (!hasPixels(inner)) {
-        return true;
-    }
-    auto const begins = [](int a, int b) { return a >= b; };
-    auto const ends = [](int a, int aLength, int b, int bLength) {
-        return std::int64_t(a) + aLength <= std::int64_t(b) + bLength;
-    };
-    return hasPixels(outer) && begins(inner.position().x(), outer.position().x()) &&
-           begins(inner.position().y(), outer.position().y()) &&
-           ends(inner.position().x(), inner.extent().width(), outer.position().x(), outer.extent().width()) &&
-           ends(inner.position().y(), inner.extent().height(), outer.position().y(), outer.extent().height());
-}
-
 } // namespace
 
 ImageFilter::ImageFilter(char const* name, teOutputPrecisionHint hint)
@@ -149,6 +135,20 @@ bool ImageFilter::takeBoundOutputImage() {
                "Compute region lies outside the bound output image");
     spOutputImage_.setDataWithNoOwnership(pBoundImage);
     return true;
+}
+
+bool ImageFilter::isInside(PositionExtentInPixelSpace const& inner, PositionExtentInPixelSpace const& outer) {
+    if (!hasPixels(inner)) {
+        return true;
+    }
+    auto const begins = [](int a, int b) { return a >= b; };
+    auto const ends = [](int a, int aLength, int b, int bLength) {
+        return std::int64_t(a) + aLength <= std::int64_t(b) + bLength;
+    };
+    return hasPixels(outer) && begins(inner.position().x(), outer.position().x()) &&
+           begins(inner.position().y(), outer.position().y()) &&
+           ends(inner.position().x(), inner.extent().width(), outer.position().x(), outer.extent().width()) &&
+           ends(inner.position().y(), inner.extent().height(), outer.position().y(), outer.extent().height());
 }
 
 bool ImageFilter::hasOutputImage() const {

@@ -221,6 +221,8 @@ protected:
     PixelExtentInWorldSpace outputPixelExtent() const;
     /// The pixel format of a channel count and a precision hint. Throws as `allocateOutputImage`.
     static ImageCPU::tePixelFormat pixelFormatFor(teOutputPrecisionHint hint, std::size_t channels);
+    /// Whether all pixels of `inner` lie in `outer`; a rectangle without pixels lies everywhere.
+    static bool isInside(PositionExtentInPixelSpace const& inner, PositionExtentInPixelSpace const& outer);
     /// Sets `oOutputRegionInPixels_` to the compute region on the output's pixel grid.
     void updateOutputRegionInPixels();
     /// If the image output is bound: checks that `oOutputRegionInPixels_` lies in the bound image, makes

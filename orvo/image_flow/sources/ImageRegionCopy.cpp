@@ -96,19 +96,34 @@ Channel fromFloat(float value) {
     }
 }
 
+template <typename From, typename To>
+To convertChannel(From value) {
+    if constexpr (std::is_same_v<From, To>) {
+        return value;
+    } else {
+        return fromFloat<To>(toFloat(value));
+    }
+}
+
 /// Converts a row of `nPixels` pixels, exchanging the first and the third channel if asked to.
 template <typename From, typename To>
 void convertRow(unsigned char const* pFrom, unsigned char* pTo, std::size_t nPixels, std::size_t nChannels,
                 bool bSwap) {
     auto const* const aFrom = reinterpret_cast<From const*>(pFrom);
     auto* const aTo = reinterpret_cast<To*>(pTo);
-    for (std::size_t i = 0; i < nPixels * nChannels; ++i) {
-        std::size_t const iChannel = i % nChannels;
-        std::size_t const iFrom = bSwap && iChannel < 3 ? i - iChannel + (2 - iChannel) : i;
-        if constexpr (std::is_same_v<From, To>) {
-            aTo[i] = aFrom[iFrom];
-        } else {
-            aTo[i] = fromFloat<To>(toFloat(aFrom[iFrom]));
+    if (!bSwap) {
+        std::transform(aFrom, aFrom + nPixels * nChannels, aTo, convertChannel<From, To>);
+        return;
+    }
+    for (std::size_t i = 0; i < nPixels * nChannels; i += nChannels) {
+        // Read before they are written: a row may be converted onto itself.
+        From const first = aFrom[i];
+        From const third = aFrom[i + 2];
+        aTo[i + 1] = convertChannel<From, To>(aFrom[i + 1]);
+        aTo[i] = convertChannel<From, To>(third);
+        aTo[i + 2] = convertChannel<From, To>(first);
+        if (nChannels == 4) {
+            aTo[i + 3] = convertChannel<From, To>(aFrom[i + 3]);
         }
     }
 }
