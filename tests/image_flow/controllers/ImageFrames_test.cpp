@@ -2,11 +2,13 @@
 // fan-out.
 
 #include "orvo/core/exceptions/SharedException.h"
+#include "orvo/core/memory/AllocationFailure.h"
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
 
 #include <deque>
+#include <new>
 #include <random>
 #include <thread>
 
@@ -264,6 +266,52 @@ TEST_F(ImageFramesTest, onlyWhatChangedRunsAgain) {
     frame();
     EXPECT_EQ(nBlurRuns, graph.oBlur_.nRuns_);
     graph.expectRight();
+}
+
+TEST_F(ImageFramesTest, everyAllocationOfAFrameMayFail) {
+    int nFailures = 0;
+    for (std::uint64_t n = 1;; ++n) {
+        ASSERT_LT(n, 1000u);
+        Graph graph;
+        bool bFired = false;
+        {
+            Core::AllocationFailure failure(n);
+            try {
+                graph.prepare();
+                graph.oController_.process();
+                graph.prepare();
+                graph.oController_.process();
+            } catch (std::exception const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bFired = failure.hasFired();
+        }
+        if (!bFired) {
+            graph.expectRight();
+            break;
+        }
+        ++nFailures;
+        graph.oController_.flushGraph();
+        graph.prepare();
+        graph.oController_.process();
+        graph.expectRight();
+    }
+    EXPECT_GE(nFailures, 10); // four images of two blocks each, and the sink's copies
+}
+
+TEST_F(ImageFramesTest, aGraphThatCannotBeBuiltLeavesNothing) {
+    for (std::uint64_t n = 1;; ++n) {
+        ASSERT_LT(n, 1000u);
+        Core::AllocationFailure failure(n);
+        try {
+            Graph const graph;
+        } catch (std::bad_alloc const&) {
+            EXPECT_TRUE(failure.hasFired());
+        }
+        if (!failure.hasFired()) {
+            break;
+        }
+    }
 }
 
 TEST_F(ImageFramesTest, chainsOfThousandsOfFiltersRun) {

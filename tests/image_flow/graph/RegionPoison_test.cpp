@@ -3,6 +3,9 @@
 
 #include "orvo/image_flow/filters/ConvertFromSIMDOptimized.h"
 #include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
+#include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
+#include "orvo/image_flow/filters/LABToRGBCPU.h"
+#include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/ImageFlowLayers.h"
 
@@ -181,6 +184,30 @@ TEST_F(PoisonTest, throughTheSIMDConversions) {
         nodes.push_back(std::make_unique<ConvertFromSIMDOptimized>());
         feed(*nodes.back(), 0, blur);
     });
+}
+
+TEST_F(PoisonTest, throughTheFiltersOfTheLibrary) {
+    for (Builder const build :
+         std::initializer_list<Builder>{[](Nodes&nodes, ImageFilter&source) {
+                                            auto upFilter = std::make_unique<FastBilateralFilterCPUNode>();
+                                            upFilter->spatialSigma().setValue(float2(2.0f, 1.5f));
+                                            nodes.push_back(std::move(upFilter));
+                                            feed(*nodes.back(), 0, source);
+                                        },
+                                        [](Nodes&nodes, ImageFilter&source) {
+                                            auto upFilter = std::make_unique<FastBilateralFilterCPUNode>();
+                                            upFilter->colorize().setValue(true);
+                                            nodes.push_back(std::move(upFilter));
+                                            feed(*nodes.back(), 0, source);
+                                        },
+                                        [](Nodes&nodes, ImageFilter&source) {
+                                            nodes.push_back(std::make_unique<RGBToLABCPU>());
+                                            feed(*nodes.back(), 0, source);
+                                            nodes.push_back(std::make_unique<LABToRGBCPU>());
+                                            feed(*nodes.back(), 0, *nodes.front());
+                                        }}) {
+        check(build);
+    }
 }
 
 /// Reads one pixel more than it declares.
