@@ -379,7 +379,15 @@ void holdFrame() {
 } // namespace
 
 TEST_F(ControllerAsyncTest, FrameCancelledBeforeItStartsRunsNothingAndIsStillCompleted) {
-    Controller controller;
+    struct Counting : Controller {
+        ~Counting() override { cancelAndJoin(); }
+        void processFrameFunction() override {
+            ++nBodies;
+            Controller::processFrameFunction();
+        }
+        std::atomic<int> nBodies{0};
+    };
+    Counting controller;
     Chain chain(controller, 3);
     CallbackRecord record;
     record.registerWith(controller);
@@ -391,12 +399,14 @@ TEST_F(ControllerAsyncTest, FrameCancelledBeforeItStartsRunsNothingAndIsStillCom
     bHoldFrames = false;
     waitForEnd(controller);
     EXPECT_EQ(0, chain.runs());
+    EXPECT_EQ(0, controller.nBodies) << "it goes straight to its completion";
     EXPECT_EQ(1, record.nCalls);
     EXPECT_EQ(0, static_cast<int>(controller.controllerStatus()));
 
     controller.processAsync();
     waitForEnd(controller);
     EXPECT_EQ(3, chain.sink().result());
+    EXPECT_EQ(1, controller.nBodies);
     EXPECT_EQ(2, record.nCalls);
 }
 
@@ -603,27 +613,28 @@ TEST_F(ControllerAsyncTest, CallbackThatThrowsStillCompletesTheFrame) {
 }
 
 TEST_F(ControllerAsyncTest, CallbackMayLaunchTheNextFrame) {
+    constexpr int nFrames = 12;
     Controller controller;
     Chain chain(controller, 4);
+    // Long enough for the tail of the frame before, which must not end this one.
+    chain[1].onRun_ = [] { std::this_thread::sleep_for(std::chrono::milliseconds(2)); };
     CallbackRecord record;
     Signal allDone;
     record.onCall = [&] {
         EXPECT_EQ(4, chain.sink().result());
-        if (record.nCalls == 50) {
+        if (record.nCalls == nFrames) {
             allDone.raise();
             return;
         }
         EXPECT_TRUE(controller.flushGraph());
         controller.processAsync();
-        // The tail of this frame must not end the one that was just launched.
-        std::this_thread::sleep_for(std::chrono::microseconds(record.nCalls % 3 * 100));
     };
     record.registerWith(controller);
     controller.processAsync();
     allDone.await();
     waitForEnd(controller);
-    EXPECT_EQ(50, record.nCalls);
-    EXPECT_EQ(200, chain.runs());
+    EXPECT_EQ(nFrames, record.nCalls);
+    EXPECT_EQ(4 * nFrames, chain.runs());
 }
 
 TEST_F(ControllerAsyncTest, CallbackMayRunAFrameAtOnce) {
@@ -665,34 +676,33 @@ TEST_F(ControllerAsyncTest, CallbackOfACancelledFrameMayLaunchTheNext) {
 }
 
 TEST_F(ControllerAsyncTest, LaunchJoinsTheTailOfTheOldFrame) {
+    // The host launches as soon as it has seen the completion, while the old frame has still to call its last
+    // stop(). That stop falls into the middle of the new frame, unless the launch waits for it.
     Controller controller;
     Chain chain(controller, 3);
+    chain[1].onRun_ = [] { std::this_thread::sleep_for(std::chrono::milliseconds(2)); };
     CallbackRecord record;
     std::atomic<int> nSeen{0};
     record.onCall = [&] {
         ++nSeen;
-        // The host launches while this frame has still to call its last stop().
-        std::this_thread::sleep_for(std::chrono::microseconds(300));
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
     };
     record.registerWith(controller);
-    int nLaunches = 0;
-    for (int i = 0; i < 100; ++i) {
+    for (int i = 1; i <= 20; ++i) {
         controller.processAsync();
-        ++nLaunches;
-        while (nSeen < nLaunches) {
+        while (nSeen < i) {
             std::this_thread::yield();
         }
-        // Completion was seen, the tail is on its way.
-        if (i % 2 == 0) {
-            chain.sink().flushOutputs();
-            controller.process();
-            ASSERT_EQ(3, chain.sink().result()) << "frame " << i << " was stopped by the tail of another";
-        }
+        ASSERT_EQ(3, chain.sink().result()) << "frame " << i << " was stopped by the tail of another";
         chain.sink().flushOutputs();
+        if (i % 2 == 0) {
+            controller.process();
+            ASSERT_EQ(3, chain.sink().result()) << "the frame after " << i << " was stopped by its tail";
+            chain.sink().flushOutputs();
+        }
     }
     waitForEnd(controller);
-    EXPECT_EQ(100, record.nCalls);
-    EXPECT_EQ(450, chain.runs());
+    EXPECT_EQ(20, record.nCalls);
 }
 
 TEST_F(ControllerAsyncTest, CallbackSetAfterTheEndIsNotCalledForTheOldFrame) {

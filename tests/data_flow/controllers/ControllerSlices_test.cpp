@@ -10,6 +10,7 @@
 #include <gtest/gtest.h>
 #include <tbb/global_control.h>
 #include <tbb/parallel_for.h>
+#include <tbb/partitioner.h>
 #include <tbb/task_arena.h>
 
 #include <algorithm>
@@ -268,29 +269,48 @@ TEST_F(ControllerSlicesTest, SingleThreadModeRunsAllItemsInOneCall) {
 
 TEST_F(ControllerSlicesTest, WaitingForSlicesTakesUpNoWorkOfTheHost) {
     // A host runs frames inside a loop of its own. While one of its iterations waits for the last slices of
-    // its frame, it must not begin another iteration: that would find the host's lock taken by its own
-    // thread.
-    std::mutex oHostLock;
-    std::atomic<int> nFrames{0};
-    thread_local bool bInside = false;
-    node.setSlices(64);
-    node.onSlice_ = [](std::size_t, std::size_t) {
-        std::this_thread::sleep_for(std::chrono::microseconds(20));
+    // its frame, it must not begin another iteration: that could need a lock which its own thread holds
+    // further out.
+    struct Graph {
+        Controller controller;
+        SumNode node{"sliced", 0};
     };
-    tbb::parallel_for(0, 40, [&](int) {
-        EXPECT_FALSE(bInside);
-        if (bInside) {
-            return;
-        }
+    SettingsScope const settings;
+    Controller::setNumberOfThreads(64);
+    tbb::global_control const workers(tbb::global_control::max_allowed_parallelism, 4);
+    tbb::task_arena arena(4);
+    std::vector<std::unique_ptr<Graph>> apGraphs;
+    for (int i = 0; i < 96; ++i) {
+        apGraphs.push_back(std::make_unique<Graph>());
+        Graph& graph = *apGraphs.back();
+        graph.controller.addNode(&graph.node);
+        graph.controller.setSinkNode(graph.node);
+        graph.node.setSlices(8);
+        graph.node.onSlice_ = [](std::size_t begin, std::size_t) {
+            std::this_thread::sleep_for(std::chrono::microseconds(begin % 3 * 200));
+        };
+    }
+    static thread_local bool bInside = false;
+    std::atomic<int> nNested{0};
+    auto const iteration = [&](std::size_t i) {
+        nNested += bInside ? 1 : 0;
         bInside = true;
-        {
-            std::lock_guard const lock(oHostLock);
-            frame();
-            ++nFrames;
-        }
+        apGraphs[i]->controller.process();
         bInside = false;
-    });
-    EXPECT_EQ(40, nFrames);
+    };
+    constexpr int nRounds = 5;
+    for (int iRound = 0; iRound < nRounds; ++iRound) {
+        arena.execute([&] {
+            tbb::parallel_for(std::size_t(0), apGraphs.size(), iteration, tbb::simple_partitioner());
+        });
+        for (auto const& pGraph : apGraphs) {
+            EXPECT_TRUE(pGraph->controller.flushGraph());
+        }
+    }
+    EXPECT_EQ(0, nNested);
+    for (auto const& pGraph : apGraphs) {
+        EXPECT_EQ(8 * nRounds, pGraph->node.nItemsDone_);
+    }
 }
 
 // Failures
