@@ -373,7 +373,8 @@ void FastBilateralCPUFilter::applyBruteForceFilter(Call& call) const {
 void FastBilateralCPUFilter::writeImage(Call& call, bool bSlice) const {
     WorkingImage& working = call.working;
     BandRunner& runner = call.target.isConcurrent() ? call.runner : call.serialRunner;
-    bool const bStream = call.target.prefersStreaming();
+    // Other targets clamp by themselves, or want their pixels as they are.
+    StoreStyle const style = {call.target.isDirect(), call.target.prefersStreaming()};
     auto const write = [&](std::size_t first, std::size_t last) {
         std::vector<float> aBuffer(4 * working.width());
         std::vector<float> aBlended(bSlice ? call.dividedPitch() : 0);
@@ -385,10 +386,10 @@ void FastBilateralCPUFilter::writeImage(Call& call, bool bSlice) const {
             if (bColorize_) {
                 std::array<float const*, 4> const apPlanes = {working.row(0, row), working.row(1, row),
                                                               working.row(2, row), working.row(3, row)};
-                call.kernels.rgbaFromLab(apPlanes.data(), pRow, working.width(), bStream);
+                call.kernels.rgbaFromLab(apPlanes.data(), pRow, working.width(), style);
             } else {
                 call.kernels.greyFromLuminance(working.row(0, row), working.row(1, row), pRow,
-                                               working.width(), bStream);
+                                               working.width(), style);
             }
             call.target.finishRow(row, pRow);
         }

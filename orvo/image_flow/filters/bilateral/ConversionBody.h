@@ -130,27 +130,32 @@ Vector::Floats unpremultiply(Vector::Floats v, Vector::Floats alpha) {
 
 /// Stores pixels made by a function of the column, which gives four channels.
 template <class Pixels>
-void storeRow(float* pRGBA, std::size_t n, bool bStream, Pixels const& pixelsAt) {
-    Vector::Floats r;
-    Vector::Floats g;
-    Vector::Floats b;
-    Vector::Floats a;
+void storeRow(float* pRGBA, std::size_t n, StoreStyle style, Pixels const& pixelsAt) {
+    Vector::Floats c[4];
+    auto const makePixels = [&](std::size_t x, std::size_t count) {
+        pixelsAt(x, static_cast<int>(count), c);
+        if (style.bClamp) {
+            for (Vector::Floats& channel : c) {
+                channel = clampToUnit(channel);
+            }
+        }
+    };
     std::size_t x = 0;
-    if (bStream && reinterpret_cast<std::uintptr_t>(pRGBA) % 64 == 0) {
+    if (style.bStream && reinterpret_cast<std::uintptr_t>(pRGBA) % 64 == 0) {
         for (; x + kLanes <= n; x += kLanes) {
-            pixelsAt(x, static_cast<int>(kLanes), r, g, b, a);
-            Vector::streamPixels(pRGBA + 4 * x, r, g, b, a);
+            makePixels(x, kLanes);
+            Vector::streamPixels(pRGBA + 4 * x, c[0], c[1], c[2], c[3]);
         }
         Vector::finishStreaming();
     }
     for (; x + kLanes <= n; x += kLanes) {
-        pixelsAt(x, static_cast<int>(kLanes), r, g, b, a);
-        Vector::storePixels(pRGBA + 4 * x, r, g, b, a);
+        makePixels(x, kLanes);
+        Vector::storePixels(pRGBA + 4 * x, c[0], c[1], c[2], c[3]);
     }
     if (x < n) {
         float block[4 * kLanes];
-        pixelsAt(x, static_cast<int>(n - x), r, g, b, a);
-        Vector::storePixels(block, r, g, b, a);
+        makePixels(x, n - x);
+        Vector::storePixels(block, c[0], c[1], c[2], c[3]);
         for (std::size_t i = 0; i < 4 * (n - x); ++i) {
             pRGBA[4 * x + i] = block[i];
         }
@@ -162,32 +167,25 @@ Vector::Floats loadPixelsOf(float const* p, int n) {
 }
 
 void greyFromLuminance(float const* pLuminance, float const* pAlpha, float* pRGBA, std::size_t n,
-                       bool bStream) {
-    storeRow(pRGBA, n, bStream,
-             [&](std::size_t x, int count, Vector::Floats& r, Vector::Floats& g, Vector::Floats& b,
-                 Vector::Floats& a) {
-                 Vector::Floats const alpha = loadPixelsOf(pAlpha + x, count);
-                 r = clampToUnit(unpremultiply(loadPixelsOf(pLuminance + x, count), alpha));
-                 g = r;
-                 b = r;
-                 a = clampToUnit(alpha);
-             });
+                       StoreStyle style) {
+    storeRow(pRGBA, n, style, [&](std::size_t x, int count, Vector::Floats(&c)[4]) {
+        c[3] = loadPixelsOf(pAlpha + x, count);
+        c[0] = unpremultiply(loadPixelsOf(pLuminance + x, count), c[3]);
+        c[1] = c[0];
+        c[2] = c[0];
+    });
 }
 
-void rgbaFromLab(float const* const* apPlanes, float* pRGBA, std::size_t n, bool bStream) {
-    storeRow(pRGBA, n, bStream,
-             [&](std::size_t x, int count, Vector::Floats& r, Vector::Floats& g, Vector::Floats& b,
-                 Vector::Floats& a) {
-                 r = loadPixelsOf(apPlanes[0] + x, count);
-                 g = loadPixelsOf(apPlanes[1] + x, count);
-                 b = loadPixelsOf(apPlanes[2] + x, count);
-                 Vector::Floats const alpha = loadPixelsOf(apPlanes[3] + x, count);
-                 LabVector::toRGB(r, g, b);
-                 r = clampToUnit(unpremultiply(r, alpha));
-                 g = clampToUnit(unpremultiply(g, alpha));
-                 b = clampToUnit(unpremultiply(b, alpha));
-                 a = clampToUnit(alpha);
-             });
+void rgbaFromLab(float const* const* apPlanes, float* pRGBA, std::size_t n, StoreStyle style) {
+    storeRow(pRGBA, n, style, [&](std::size_t x, int count, Vector::Floats(&c)[4]) {
+        for (int channel = 0; channel < 4; ++channel) {
+            c[channel] = loadPixelsOf(apPlanes[channel] + x, count);
+        }
+        LabVector::toRGB(c[0], c[1], c[2]);
+        for (int channel = 0; channel < 3; ++channel) {
+            c[channel] = unpremultiply(c[channel], c[3]);
+        }
+    });
 }
 
 } // namespace

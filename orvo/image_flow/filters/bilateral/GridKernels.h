@@ -122,6 +122,12 @@ struct ValueBounds {
     float fHighest;
 };
 
+/// How pixels are stored. Streaming bypasses the caches, where the row is aligned to 64 bytes.
+struct StoreStyle {
+    bool bClamp; ///< to 0..1; NaN stays
+    bool bStream;
+};
+
 /// The kernels of one instruction set.
 ///
 /// Threads: free of state; any thread.
@@ -137,12 +143,11 @@ struct GridKernels {
     void (*divide)(DivideJob const& job);
     void (*slice)(SliceJob const& job);
     void (*direct)(DirectJob const& job);
-    /// Luminance, divided by alpha where that is not 0, to grey RGBA pixels clamped to 0..1 (NaN stays).
-    /// Streaming bypasses the caches, where the row is aligned to 64 bytes.
+    /// Luminance, divided by alpha where that is not 0, to grey RGBA pixels.
     void (*greyFromLuminance)(float const* pLuminance, float const* pAlpha, float* pRGBA, std::size_t n,
-                              bool bStream);
+                              StoreStyle style);
     /// The same for L, a, b and alpha.
-    void (*rgbaFromLab)(float const* const* apPlanes, float* pRGBA, std::size_t n, bool bStream);
+    void (*rgbaFromLab)(float const* const* apPlanes, float* pRGBA, std::size_t n, StoreStyle style);
 };
 
 /// The kernels of a set other than PLAIN, for which PlainBilateralFilter stands.

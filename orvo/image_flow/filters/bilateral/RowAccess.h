@@ -53,11 +53,13 @@ public:
     explicit RowTarget(ImageWriteAccessor& destination);
 
     bool isConcurrent() const { return pImage_ != nullptr; }
-    /// Whether rows are better written past the caches.
+    /// Whether rowBuffer() gives rows of the image itself, into which pixels go clamped to 0..1.
+    bool isDirect() const { return bDirect_; }
+    /// Whether such rows are better written past the caches.
     bool prefersStreaming() const { return bStream_; }
     /// Where to put a row: into the image itself, or into the given buffer of four floats a pixel.
     float* rowBuffer(std::size_t row, float* pBuffer) const;
-    /// Hands on a row that was put, clamped to 0..1, where rowBuffer() said.
+    /// Hands on a row that was put where rowBuffer() said.
     void finishRow(std::size_t row, float const* pRow) const;
 
 private:

@@ -8,10 +8,11 @@
 namespace ORVO::ImageFlow::lab {
 
 /// Kernels over a row of n pixels of four interleaved floats, made for one instruction set. The plain kernels
-/// are LabTransform pixel by pixel. The others use polynomials for the powers: for sRGB components of
-/// magnitude up to 4, and Lab components of magnitude up to 2, each component differs from the plain one by
-/// at most 4e-6 times max(1, its magnitude). Signs, infinities and NaN are treated alike. Input and output
-/// may be the same row, else they must not overlap. Pointers need the alignment of a float only.
+/// are LabTransform pixel by pixel. The others use polynomials for the powers: each component differs from
+/// the plain one by at most 1e-5 times max(1, its magnitude) for sRGB components in 0..1 and the Lab of such
+/// colours, and by 1e-4 times that for components of magnitude up to 4 (Lab: 2), where terms of different
+/// signs cancel. Signs, infinities and NaN are treated alike. Input and output may be the same row, else they
+/// must not overlap. Pointers need the alignment of a float only.
 ///
 /// Threads: free of state; any thread.
 struct LabKernels {

@@ -13,12 +13,17 @@ struct LabVector {
                               Vector::mulAdd(y, Vector::set(b), Vector::mul(x, Vector::set(a))));
     }
 
+    /// A zero that is negative counts as positive.
+    static Floats withSignOf(Floats magnitude, Floats original) {
+        return Vector::negateWhere(Vector::less(original, Vector::zero()), magnitude);
+    }
+
     static Floats linearFromEncoded(Floats value) {
         Floats const c = Vector::abs(value);
         Floats const base = Vector::mul(Vector::add(c, Vector::set(0.055F)), Vector::set(1.0F / 1.055F));
         Floats const curve = VectorMath::power(base, 2.375F, 0.0250000953674F);
         Floats const line = Vector::mul(c, Vector::set(1.0F / 12.92F));
-        return Vector::withSignOf(Vector::select(Vector::less(Vector::set(0.04045F), c), curve, line), value);
+        return withSignOf(Vector::select(Vector::less(Vector::set(0.04045F), c), curve, line), value);
     }
 
     static Floats encodedFromLinear(Floats value) {
@@ -26,16 +31,14 @@ struct LabVector {
         Floats const power = VectorMath::power(c, 0.40625F, 0.0104199945927F);
         Floats const curve = Vector::mulAdd(power, Vector::set(1.055F), Vector::set(-0.055F));
         Floats const line = Vector::mul(c, Vector::set(12.92F));
-        return Vector::withSignOf(Vector::select(Vector::less(Vector::set(0.0031308F), c), curve, line),
-                                  value);
+        return withSignOf(Vector::select(Vector::less(Vector::set(0.0031308F), c), curve, line), value);
     }
 
     static Floats lightnessCurve(Floats value, float white) {
         Floats const t = Vector::mul(Vector::abs(value), Vector::set(1.0F / white));
         Floats const curve = VectorMath::power(t, 0.328125F, 0.00520837306976F);
         Floats const line = Vector::mulAdd(t, Vector::set(7.787F), Vector::set(0.13793103F));
-        return Vector::withSignOf(Vector::select(Vector::less(Vector::set(0.008856F), t), curve, line),
-                                  value);
+        return withSignOf(Vector::select(Vector::less(Vector::set(0.008856F), t), curve, line), value);
     }
 
     static Floats inverseLightnessCurve(Floats value, float white) {
@@ -44,9 +47,7 @@ struct LabVector {
         Floats const line = Vector::mul(Vector::sub(f, Vector::set(0.13793103F)), Vector::set(1.0F / 7.787F));
         // 0.008856F is above 0.008856: less than the float is at most the double. NaN takes the cube.
         Floats const inverse = Vector::select(Vector::less(cube, Vector::set(0.008856F)), line, cube);
-        // The line is negative below its zero, so the sign is a factor here.
-        Floats const sign = Vector::withSignOf(Vector::set(1.0F), value);
-        return Vector::mul(Vector::mul(inverse, sign), Vector::set(white));
+        return Vector::mul(withSignOf(inverse, value), Vector::set(white));
     }
 
     /// sRGB to L, a, b in place.

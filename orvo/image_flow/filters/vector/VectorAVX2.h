@@ -42,10 +42,7 @@ struct Vector {
     static Floats select(Mask m, Floats yes, Floats no) { return _mm256_blendv_ps(no, yes, m); }
     static Floats addWhere(Floats sum, Mask m, Floats v) { return add(sum, _mm256_and_ps(m, v)); }
     static Floats abs(Floats v) { return _mm256_andnot_ps(set(-0.0F), v); }
-    /// The magnitude, which has no sign, with the sign bit of the other.
-    static Floats withSignOf(Floats magnitude, Floats other) {
-        return _mm256_or_ps(magnitude, _mm256_and_ps(set(-0.0F), other));
-    }
+    static Floats negateWhere(Mask m, Floats v) { return _mm256_xor_ps(v, _mm256_and_ps(m, set(-0.0F))); }
     static Floats floor(Floats v) { return _mm256_floor_ps(v); }
     /// To the nearest; for magnitudes below 2^31.
     static Floats round(Floats v) {

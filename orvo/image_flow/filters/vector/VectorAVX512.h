@@ -41,10 +41,7 @@ struct Vector {
     static Floats select(Mask m, Floats yes, Floats no) { return _mm512_mask_blend_ps(m, no, yes); }
     static Floats addWhere(Floats sum, Mask m, Floats v) { return _mm512_mask_add_ps(sum, m, sum, v); }
     static Floats abs(Floats v) { return _mm512_abs_ps(v); }
-    /// The magnitude, which has no sign, with the sign bit of the other.
-    static Floats withSignOf(Floats magnitude, Floats other) {
-        return _mm512_or_ps(magnitude, _mm512_and_ps(set(-0.0F), other));
-    }
+    static Floats negateWhere(Mask m, Floats v) { return _mm512_mask_sub_ps(v, m, zero(), v); }
     static Floats floor(Floats v) {
         return _mm512_roundscale_ps(v, _MM_FROUND_TO_NEG_INF | _MM_FROUND_NO_EXC);
     }

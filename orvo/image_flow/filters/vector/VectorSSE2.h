@@ -53,10 +53,7 @@ struct Vector {
     }
     static Floats addWhere(Floats sum, Mask m, Floats v) { return add(sum, _mm_and_ps(m, v)); }
     static Floats abs(Floats v) { return _mm_andnot_ps(set(-0.0F), v); }
-    /// The magnitude, which has no sign, with the sign bit of the other.
-    static Floats withSignOf(Floats magnitude, Floats other) {
-        return _mm_or_ps(magnitude, _mm_and_ps(set(-0.0F), other));
-    }
+    static Floats negateWhere(Mask m, Floats v) { return _mm_xor_ps(v, _mm_and_ps(m, set(-0.0F))); }
     static Floats floor(Floats v) {
         Floats const truncated = _mm_cvtepi32_ps(_mm_cvttps_epi32(v));
         Floats const lower = sub(truncated, _mm_and_ps(_mm_cmpgt_ps(truncated, v), set(1.0F)));
