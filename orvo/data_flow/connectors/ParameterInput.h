@@ -18,7 +18,7 @@ template <typename T>
 class ORVO_API ParameterInput : public ConstInput<T> {
 public:
     /// An empty, unconnected input named `sName` of `pNode` for `pParameter`. Neither is owned; the parameter
-    /// must outlive the input and must not be null.
+    /// is not null, and lives whenever the input fetches.
     ParameterInput(std::string const& sName, Node* pNode, Parameter<T>* pParameter)
         : ConstInput<T>(sName, pNode), pParameter_(pParameter) {
         ORVO_ENFORCE(pParameter);

@@ -176,8 +176,8 @@ public:
     ParameterSet const& parameters() const { return oParameters_; }
 
     /// Turns a parameter into an input of its name, from which it takes a new value at every run. The input
-    /// belongs to the caller, who disconnects it and frees it with `ORVODeleter<InputConnector>` after the
-    /// node's last use. Throws `InternalException` "Enforce pParameter != NULL".
+    /// belongs to the caller, who keeps it for as long as the node lives, and frees it then with
+    /// `ORVODeleter<InputConnector>`. Throws `InternalException` "Enforce pParameter != NULL".
     InputConnector* convertToConnector(ParameterBase* pParameter);
 
     /// Whether the plain dirty flag of any parameter is set; clears that flag of all of them.

@@ -37,7 +37,11 @@ void Node::debugAddNode(Node const* pNode, std::string const& sName) {
     ++nextNumber;
 }
 
-void Node::debugRemoveNode(Node const* pNode) { pIndexMap_->erase(indexEntry(pNode)); }
+void Node::debugRemoveNode(Node const* pNode) {
+    // Found first: without the maps there is nothing to erase from.
+    auto const it = indexEntry(pNode);
+    pIndexMap_->erase(it);
+}
 
 void Node::debugRenumberNode(Node const* pNode, std::string const& sName) {
     auto const it = indexEntry(pNode);

@@ -36,8 +36,8 @@ public:
     virtual bool isInterval() const;
 
     /// A new input named after the parameter, for `pNode`, that sets the parameter whenever it fetches.
-    /// Belongs to the caller, who frees it with `ORVODeleter<InputConnector>`; it must not outlive the
-    /// parameter.
+    /// Belongs to the caller, who frees it with `ORVODeleter<InputConnector>`; it fetches only while the
+    /// parameter lives.
     virtual InputConnector* createProxyConnector(Node* pNode) = 0;
 
     /// Writes name, " ", description, " ", value.
