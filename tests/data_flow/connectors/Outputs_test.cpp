@@ -151,13 +151,13 @@ TEST_F(OutputsTest, FetchingDropsWhatTheInputHeld) {
 }
 
 template <typename AnyEdge>
-class BoundOutputTest : public OutputsTest {};
+class EveryEdgeTest : public OutputsTest {};
 
 using AllEdges = testing::Types<Edge<ConstOutput, ConstInput>, Edge<ConstOutput, Input>,
                                 Edge<Output, ConstInput>, Edge<Output, Input>>;
-TYPED_TEST_SUITE(BoundOutputTest, AllEdges);
+TYPED_TEST_SUITE(EveryEdgeTest, AllEdges);
 
-TYPED_TEST(BoundOutputTest, CannotBeMovedFrom) {
+TYPED_TEST(EveryEdgeTest, CannotBeMovedFrom) {
     for (bool const bKeepCache : {false, true}) {
         Payload oClients(3);
         TypeParam oEdge(bKeepCache);
@@ -168,7 +168,7 @@ TYPED_TEST(BoundOutputTest, CannotBeMovedFrom) {
     }
 }
 
-TYPED_TEST(BoundOutputTest, ABoundInputTakesNeitherShareNorCopy) {
+TYPED_TEST(EveryEdgeTest, ABoundInputTakesNeitherShareNorCopy) {
     Payload const oClients(3);
     TypeParam oEdge(true);
     oEdge.oInput_.setBoundData(&oClients);
@@ -179,7 +179,16 @@ TYPED_TEST(BoundOutputTest, ABoundInputTakesNeitherShareNorCopy) {
     EXPECT_EQ(0, Payload::nCopies);
 }
 
-TYPED_TEST(BoundOutputTest, AnEmptyOutputGivesNothingOrIsRefused) {
+TYPED_TEST(EveryEdgeTest, ABoundInputTakesWhatIsGivenAway) {
+    Payload const oClients(3);
+    TypeParam oEdge(false);
+    oEdge.oInput_.setBoundData(&oClients);
+    oEdge.oInput_.fetchInput();
+    this->expectHolds(oEdge.oInput_, oEdge.pPayload_);
+    this->expectHolds(oEdge.oOutput_, nullptr);
+}
+
+TYPED_TEST(EveryEdgeTest, AnEmptyOutputGivesNothingOrIsRefused) {
     TypeParam oEdge(false);
     oEdge.oOutput_.flushOutput();
     oEdge.oInput_.setData(ORVO_NEW Payload(9));
@@ -197,7 +206,7 @@ TYPED_TEST(BoundOutputTest, AnEmptyOutputGivesNothingOrIsRefused) {
     this->expectHolds(oEdge.oInput_, nullptr);
 }
 
-TYPED_TEST(BoundOutputTest, AFailedCopyLeavesBothEndsAsTheyWere) {
+TYPED_TEST(EveryEdgeTest, AFailedCopyLeavesBothEndsAsTheyWere) {
     TypeParam oEdge(true);
     oEdge.oInput_.setData(ORVO_NEW Payload(9));
     Payload const* const pHeld = oEdge.oInput_.get();

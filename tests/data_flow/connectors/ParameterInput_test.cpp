@@ -28,7 +28,15 @@ protected:
     }
 
     ORVO::Test::DataFlowLayers oLayers_;
+    /// Makes the parameter an input of the node.
+    InputConnector& convert() {
+        spInput_.reset(oNode_.convertToConnector(&oRadius_));
+        return *spInput_;
+    }
+
     Parameter<float> oRadius_{1.0f, "radius"};
+    // Lives longer than the node that lists it.
+    OwnedInput spInput_;
     TestNode oNode_{"blur"};
     TestNode oProducer_{"lfo"};
     ConstOutput<float>& oOutput_ = oProducer_.addConstOutput<float>("value");
@@ -37,33 +45,31 @@ protected:
 
 TEST_F(ParameterInputTest, ConvertingAppendsAnInputOfTheParametersNameAndType) {
     oNode_.addConstInput("image");
-    OwnedInput const spInput(oNode_.convertToConnector(&oRadius_));
-    ASSERT_NE(nullptr, spInput);
+    InputConnector& oInput = convert();
     EXPECT_EQ(2u, oNode_.numberOfInputs());
-    EXPECT_EQ(spInput.get(), oNode_.input(1));
-    EXPECT_EQ(spInput.get(), oNode_.input("radius"));
-    EXPECT_EQ(&oNode_, spInput->node());
-    EXPECT_TRUE(spInput->datatype() == typeid(float));
+    EXPECT_EQ(&oInput, oNode_.input(1));
+    EXPECT_EQ(&oInput, oNode_.input("radius"));
+    EXPECT_EQ(&oNode_, oInput.node());
+    EXPECT_TRUE(oInput.datatype() == typeid(float));
     EXPECT_EQ(1u, oNode_.numberOfParameters());
 }
 
 TEST_F(ParameterInputTest, EveryRunSetsTheParameter) {
-    OwnedInput const spInput(oNode_.convertToConnector(&oRadius_));
-    Connect(*spInput, oOutput_);
+    InputConnector& oInput = convert();
+    Connect(oInput, oOutput_);
     for (float const fValue : {5.0f, 7.0f}) {
         fNext_ = fValue;
         oProducer_.process();
         oNode_.process();
         EXPECT_EQ(fValue, oRadius_.value());
-        EXPECT_FALSE(spInput->hasData());
+        EXPECT_FALSE(oInput.hasData());
         EXPECT_FALSE(oOutput_.hasData());
     }
-    spInput->disconnect();
 }
 
 TEST_F(ParameterInputTest, AnUnchangedValueTouchesNoFlag) {
-    OwnedInput const spInput(oNode_.convertToConnector(&oRadius_));
-    Connect(*spInput, oOutput_);
+    InputConnector& oInput = convert();
+    Connect(oInput, oOutput_);
     oRadius_.setClean();
     oRadius_.setCleanSimpleCaching();
     oRadius_.setCleanGlyphcast();
@@ -75,37 +81,34 @@ TEST_F(ParameterInputTest, AnUnchangedValueTouchesNoFlag) {
     oProducer_.process();
     oNode_.process();
     EXPECT_TRUE(oRadius_.isDirty() && oRadius_.isDirtySimpleCaching() && oRadius_.isDirtyGlyphcast());
-    spInput->disconnect();
 }
 
 TEST_F(ParameterInputTest, AKeptValueIsShared) {
-    OwnedInput const spInput(oNode_.convertToConnector(&oRadius_));
-    Connect(*spInput, oOutput_);
+    InputConnector& oInput = convert();
+    Connect(oInput, oOutput_);
     oOutput_.keepCache(true);
     oProducer_.process();
     oNode_.process();
     EXPECT_EQ(5.0f, oRadius_.value());
     EXPECT_TRUE(oOutput_.hasData());
-    spInput->disconnect();
 }
 
 TEST_F(ParameterInputTest, AMutableOutputFeedsItToo) {
     Output<float> oMutable("value", nullptr);
-    OwnedInput const spInput(oNode_.convertToConnector(&oRadius_));
-    Connect(*spInput, oMutable);
+    InputConnector& oInput = convert();
+    Connect(oInput, oMutable);
     oMutable.setData(ORVO_NEW float(8.0f));
-    spInput->fetchInput();
+    oInput.fetchInput();
     EXPECT_EQ(8.0f, oRadius_.value());
-    spInput->disconnect();
+    oInput.disconnect();
 }
 
 TEST_F(ParameterInputTest, FetchingNeedsAPartnerAndAValue) {
-    OwnedInput const spInput(oNode_.convertToConnector(&oRadius_));
-    ORVO_EXPECT_INTERNAL(spInput->fetchInput(), "Enforce pConnectedOutput_ != NULL");
-    Connect(*spInput, oOutput_);
-    ORVO_EXPECT_INTERNAL(spInput->fetchInput(), "Enforce spData_.get() != NULL");
+    InputConnector& oInput = convert();
+    ORVO_EXPECT_INTERNAL(oInput.fetchInput(), "Enforce pConnectedOutput_ != NULL");
+    Connect(oInput, oOutput_);
+    ORVO_EXPECT_INTERNAL(oInput.fetchInput(), "Enforce spData_.get() != NULL");
     EXPECT_EQ(1.0f, oRadius_.value());
-    spInput->disconnect();
 }
 
 TEST_F(ParameterInputTest, NullParametersAreRefused) {

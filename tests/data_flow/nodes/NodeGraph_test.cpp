@@ -215,6 +215,8 @@ TEST_F(NodeGraphTest, RandomGraphsGiveTheSameAsTheirDefinition) {
 }
 
 TEST_F(NodeGraphTest, AParameterFedByANodeTakesItsValueInTheFrame) {
+    // The input that is made below lives longer than the node that lists it.
+    std::unique_ptr<InputConnector, ORVO::ORVODeleter<InputConnector>> spInput;
     Graph oGraph;
     TestNode oCurve("curve");
     Number iNext = 5;
@@ -222,8 +224,7 @@ TEST_F(NodeGraphTest, AParameterFedByANodeTakesItsValueInTheFrame) {
     oCurve.pfnWork_ = [&] { oCurveOutput.setData(ORVO_NEW Number(iNext)); };
     SumNode& oSource = oGraph.add(1);
     SumNode& oSink = oGraph.add(2);
-    std::unique_ptr<InputConnector, ORVO::ORVODeleter<InputConnector>> const spInput(
-        oSource.convertToConnector(&oSource.oValue_));
+    spInput.reset(oSource.convertToConnector(&oSource.oValue_));
     Connect(*spInput, oCurveOutput);
     oSink.feedFrom(oSource, true, true);
     oGraph.finish();

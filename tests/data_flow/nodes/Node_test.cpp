@@ -10,9 +10,11 @@
 
 #include <gtest/gtest.h>
 
+#include <memory>
 #include <sstream>
 #include <stdexcept>
 #include <string>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -271,6 +273,21 @@ TEST_F(NodeTest, DisconnectClearsBothEndsOfAllConnectors) {
         EXPECT_EQ(nullptr, pInput->connectedOutput());
     }
     oNode.disconnect();
+}
+
+TEST_F(NodeTest, WhoeverPollsTheEndOfARunSeesWhatItWrote) {
+    TestNode oNode("n");
+    int iWritten = 0;
+    oNode.setProcessing(true);
+    std::thread oThread([&] {
+        iWritten = 7;
+        oNode.setProcessing(false);
+    });
+    while (oNode.isProcessing()) {
+        std::this_thread::yield();
+    }
+    EXPECT_EQ(7, iWritten);
+    oThread.join();
 }
 
 TEST_F(NodeTest, NeighboursMayDieInAnyOrderOnceDisconnected) {
