@@ -335,6 +335,10 @@ void RandomGraph::change() {
     }
 }
 
+void RandomGraph::changeParameter() {
+    randomiseParameters(*aNodes_[static_cast<std::size_t>(random(0, static_cast<int>(aNodes_.size()) - 1))]);
+}
+
 void RandomGraph::reconnect() {
     std::vector<Node*> aConsumers;
     for (auto const& pNode : aNodes_) {

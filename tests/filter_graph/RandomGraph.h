@@ -63,6 +63,9 @@ public:
     /// Makes between one and four changes: parameters, pixels, images, regions, connections.
     void change();
 
+    /// Gives one filter other parameters.
+    void changeParameter();
+
     /// Fills the bound output image with a value that no frame computes.
     void spoilOutput();
 
