@@ -452,6 +452,7 @@ TEST(ConvertSIMDOptimized, MayRunOnDisjointRowsAtOnce) {
         convertImageFromSIMDOptimized32FFormat(*floats, &back, 0, 61, beginY, endY);
     };
     std::vector<std::thread> threads;
+    threads.reserve(4);
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back(convertRows, 16 * i, 16 * i + 16);
     }

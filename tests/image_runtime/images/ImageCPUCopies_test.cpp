@@ -7,7 +7,8 @@
 
 #include <gtest/gtest.h>
 
-#include <cstring>
+#include <algorithm>
+#include <memory>
 #include <numeric>
 #include <vector>
 
@@ -58,9 +59,9 @@ TEST(ImageCPUCopy, OwnsItsStorageAlsoIfItsSourceDoesNot) {
     {
         ImageCPU const source(ImageCPU::PIXEL_FORMAT_RGBA8, aPixels.data(), rectangle(-4, 9, 5, 2),
                               PixelExtentInWorldSpace(0.5f, 0.25f), ExtentInPixelSpace(8, 3));
-        ImageCPU const copy(source);
+        auto const pCopy = std::make_unique<ImageCPU>(source);
         std::fill(aPixels.begin(), aPixels.end(), static_cast<unsigned char>(0));
-        expectNumbered(copy);
+        expectNumbered(*pCopy);
         EXPECT_EQ(nBlocks + 1, MemoryStatistics::blocks(MEMORY_TYPE_IMAGE));
     }
     EXPECT_EQ(nBlocks, MemoryStatistics::blocks(MEMORY_TYPE_IMAGE));
@@ -68,9 +69,9 @@ TEST(ImageCPUCopy, OwnsItsStorageAlsoIfItsSourceDoesNot) {
 
 TEST(ImageCPUCopy, OfAnImageWithoutPixelsHasNoneToShow) {
     ImageCPU const empty;
-    ImageCPU const copy(empty);
-    EXPECT_EQ(ImageCPU::PIXEL_FORMAT_UNDEFINED, copy.pixelFormat());
-    EXPECT_FALSE(copy.capacityExtent().isDefined());
+    auto const pCopy = std::make_unique<ImageCPU>(empty);
+    EXPECT_EQ(ImageCPU::PIXEL_FORMAT_UNDEFINED, pCopy->pixelFormat());
+    EXPECT_FALSE(pCopy->capacityExtent().isDefined());
     ImageCPU assigned = numbered();
     assigned = empty;
     EXPECT_EQ(ImageCPU::PIXEL_FORMAT_UNDEFINED, assigned.pixelFormat());

@@ -131,7 +131,8 @@ std::vector<float> awkwardFloats() {
 
 template <class Channel>
 bool sameBits(Channel const* pLeft, Channel const* pRight, std::size_t n) {
-    return n == 0 || std::memcmp(pLeft, pRight, n * sizeof(Channel)) == 0;
+    return n == 0 || std::memcmp(static_cast<void const*>(pLeft), static_cast<void const*>(pRight),
+                                 n * sizeof(Channel)) == 0;
 }
 
 class RowKernelsOf : public testing::TestWithParam<InstructionSet> {
