@@ -48,7 +48,7 @@ public:
     void processSlice(std::size_t begin, std::size_t end) override;
 
 protected:
-    /// @throws InternalException "Enforce ptr != NULL" without an input image, "Enforce pOutput != NULL"
+    /// @throws InternalException "Enforce spData_.get() != NULL" without an input image, "Enforce pOutput != NULL"
     /// without an output image, and what FastBilateralCPUFilter::applyFilter() throws.
     void internalProcess() override;
 
