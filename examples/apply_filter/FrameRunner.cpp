@@ -6,6 +6,7 @@
 
 #include <chrono>
 #include <cstdio>
+#include <vector>
 
 #include <unistd.h>
 
@@ -37,20 +38,36 @@ FG::ImageCPU imageOf(Picture const& picture) {
     return {descriptorOf(picture), rectangle, picture.pixels.data(), 0};
 }
 
-// Filters compute in 8-bit or float: 16-bit images pass through the engine's converters on both sides.
-void connect(std::shared_ptr<FG::IInputAdapter> const& input, std::shared_ptr<FG::IFilter> const& filter,
-             std::shared_ptr<FG::IOutputAdapter> const& output, bool convert) {
-    if (!convert) {
-        FG::Connect(input, filter);
-        FG::Connect(filter, output);
-        return;
+// A graph of one chain with its images. Connections do not own: the filters are held here.
+struct Graph {
+    std::shared_ptr<FG::IInputAdapter> input = FG::createInputAdapter(FG::IAdapter::REGION_SYNC_FROM_IMAGE);
+    std::vector<std::shared_ptr<FG::IFilter>> chain;
+    std::shared_ptr<FG::IOutputAdapter> output =
+        FG::createOutputAdapter(FG::IAdapter::REGION_SYNC_FROM_IMAGE);
+    FG::ImageCPU sourceImage;
+    FG::ImageCPU resultImage;
+
+    Graph(Picture const& source, std::vector<std::shared_ptr<FG::IFilter>> filters, Picture& result)
+        : chain(std::move(filters)), sourceImage(imageOf(source)), resultImage(imageOf(result)) {
+        if (chain.empty()) {
+            FG::Connect(input, output);
+        } else {
+            FG::Connect(input, chain.front());
+            for (std::size_t i = 1; i < chain.size(); ++i)
+                FG::Connect(chain[i - 1], chain[i]);
+            FG::Connect(chain.back(), output);
+        }
+        input->setImage(&sourceImage);
+        output->setImage(&resultImage);
     }
-    auto const toFloat = createFilterNamed("ConvertToSIMDOptimized");
-    auto const fromFloat = createFilterNamed("ConvertFromSIMDOptimized");
-    FG::Connect(input, toFloat);
-    FG::Connect(toFloat, filter);
-    FG::Connect(filter, fromFloat);
-    FG::Connect(fromFloat, output);
+    Graph(Graph const&) = delete;
+    Graph& operator=(Graph const&) = delete;
+};
+
+OptimizationOptions onCPU() {
+    OptimizationOptions options;
+    options.setProcessingMode(OptimizationOptions::CPU_PROCESSING);
+    return options;
 }
 
 // Polls the running frame until it ends. An interrupt cancels it; the frame is waited for in any case.
@@ -73,33 +90,38 @@ bool pollToEnd(FG::IProcessor& processor, int frame, Clock::time_point start) {
     return !cancelled;
 }
 
-} // namespace
-
-bool runFrames(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, Picture& result, int repeat,
-               bool async) {
-    FG::ImageCPU sourceImage = imageOf(source);
-    FG::ImageCPU resultImage = imageOf(result);
-    auto const input = FG::createInputAdapter(FG::IAdapter::REGION_SYNC_FROM_IMAGE);
-    auto const output = FG::createOutputAdapter(FG::IAdapter::REGION_SYNC_FROM_IMAGE);
-    connect(input, filter, output, source.depth == Depth::uint15_1);
-    input->setImage(&sourceImage);
-    output->setImage(&resultImage);
-
-    auto const processor = FG::createProcessor(output, nullptr);
-    OptimizationOptions options;
-    options.setProcessingMode(OptimizationOptions::CPU_PROCESSING);
+bool runGraph(Graph const& graph, int repeat, bool async) {
+    auto const processor = FG::createProcessor(graph.output, nullptr);
     Interrupt const interrupt;
     for (int frame = 1; frame <= repeat; ++frame) {
         auto const start = Clock::now();
         if (async)
-            processor->asyncProcessFrame(options);
+            processor->asyncProcessFrame(onCPU());
         else
-            processor->processFrame(options);
+            processor->processFrame(onCPU());
         if ((async && !pollToEnd(*processor, frame, start)) || Interrupt::requested())
             return false;
         if (repeat > 1)
             std::printf("frame %d: %.2f ms\n", frame, millisecondsSince(start));
     }
+    return true;
+}
+
+} // namespace
+
+bool runFrames(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, Picture& result, int repeat,
+               bool async) {
+    if (source.depth != Depth::uint15_1)
+        return runGraph(Graph(source, {filter}, result), repeat, async);
+
+    // Filters compute in 8-bit or float, in the precision of the image that the graph ends in: 16-bit images
+    // go into a float graph through the engine's converter, and an empty graph brings the result back to 16
+    // bits.
+    Picture floats(result.width, result.height, result.channels, Depth::float32);
+    if (!runGraph(Graph(source, {createFilterNamed("ConvertToSIMDOptimized"), filter}, floats), repeat,
+                  async))
+        return false;
+    FG::createProcessor(Graph(floats, {}, result).output, nullptr)->processFrame(onCPU());
     return true;
 }
 
