@@ -8,6 +8,18 @@ target_include_directories(orvo_test_support PUBLIC "${PROJECT_SOURCE_DIR}")
 target_precompile_headers(orvo_test_support PRIVATE
     <gtest/gtest.h> <algorithm> <cmath> <cstdint> <functional> <map> <memory> <sstream> <string> <vector>)
 
+# What tests in a context share: hosts' contexts, replaced entry points, snapshots of state.
+find_package(X11 REQUIRED)
+add_library(orvo_gl_test_support STATIC
+    ${PROJECT_SOURCE_DIR}/tests/support/gl/EGLHostContext.cpp
+    ${PROJECT_SOURCE_DIR}/tests/support/gl/GLHooks.cpp
+    ${PROJECT_SOURCE_DIR}/tests/support/gl/GLState.cpp
+    ${PROJECT_SOURCE_DIR}/tests/support/gl/GLTest.cpp
+    ${PROJECT_SOURCE_DIR}/tests/support/gl/GLXHostContext.cpp
+    ${PROJECT_SOURCE_DIR}/tests/support/gl/HostContext.cpp
+    ${PROJECT_SOURCE_DIR}/tests/support/gl/XServer.cpp)
+target_link_libraries(orvo_gl_test_support PUBLIC orvo_test_support PkgConfig::EPOXY X11::X11)
+
 function(orvo_add_tests name)
     set(target "orvo_${name}_tests")
     add_executable(${target} ${ARGN})
@@ -15,4 +27,10 @@ function(orvo_add_tests name)
     target_precompile_headers(${target} REUSE_FROM orvo_test_support)
     add_test(NAME ${name} COMMAND ${target})
     set_tests_properties(${name} PROPERTIES TIMEOUT 900)
+endfunction()
+
+# orvo_add_gl_tests(<name> <source>...): the same for tests in a context.
+function(orvo_add_gl_tests name)
+    orvo_add_tests(${name} ${ARGN})
+    target_link_libraries(orvo_${name}_tests PRIVATE orvo_gl_test_support)
 endfunction()

@@ -4,6 +4,7 @@
 
 #include "orvo/core/Check.h"
 #include "orvo/core/CoreLibrary.h"
+#include "orvo/ogl/internal/Failure.h"
 
 namespace ORVO::OGL {
 
@@ -14,12 +15,14 @@ std::atomic<bool> bInitialized{false};
 void Library::initialize() {
     ORVO_CHECK(Core::Library::isInitialized());
     ORVO_CHECK(!isInitialized());
+    Internal::installResolverFailureHandler();
     bInitialized.store(true, std::memory_order_release);
 }
 
 void Library::terminate() {
     ORVO_CHECK(Core::Library::isInitialized());
     ORVO_CHECK(isInitialized());
+    Internal::removeResolverFailureHandler();
     bInitialized.store(false, std::memory_order_release);
 }
 

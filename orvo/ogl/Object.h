@@ -1,0 +1,39 @@
+#pragma once
+
+#include "orvo/core/Export.h"
+
+namespace ORVO::OGL {
+
+/// Base of objects that OpenGL knows by a name: a target to bind to, and what is bound there.
+///
+/// Objects are made in the calling thread's current context and are destroyed while a context of the same
+/// share group is current; without one, destruction leaves the name to the group's end. Every operation that
+/// speaks to OpenGL throws ExceptionOGL "No OpenGL context is current" if there is none.
+///
+/// Threads: any thread with a context of the share group current, one thread at a time for one object.
+class ORVO_API Object {
+public:
+    Object(Object const&) = delete;
+    Object& operator=(Object const&) = delete;
+    virtual ~Object();
+
+    /// The OpenGL name.
+    virtual unsigned objectID() const;
+    /// The OpenGL target that the object binds to.
+    unsigned target() const noexcept { return nTarget_; }
+    /// The name that is bound to target() now, for textures on the active unit.
+    virtual unsigned getBoundID() const = 0;
+    /// Whether this object is bound to its target now.
+    bool isBound() const;
+
+protected:
+    explicit Object(unsigned nTarget) noexcept;
+
+    void setObjectID(unsigned nName) noexcept { nName_ = nName; }
+
+private:
+    unsigned nTarget_;
+    unsigned nName_ = 0;
+};
+
+} // namespace ORVO::OGL
