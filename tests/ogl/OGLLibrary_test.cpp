@@ -1,7 +1,11 @@
 #include "orvo/ogl/OGLLibrary.h"
 
+#include <epoxy/gl.h>
+
+#include "orvo/ogl/Texture2D.h"
 #include "tests/support/CoreLayer.h"
-#include "tests/support/Expect.h"
+#include "tests/support/gl/ExpectOGL.h"
+#include "tests/support/gl/GLTest.h"
 
 namespace {
 
@@ -62,6 +66,30 @@ TEST(OGLAutoInitializer, SwallowsAFailureToStop) {
 
 TEST(OGLAutoInitializer, PassesAFailureToStartOn) {
     ORVO_EXPECT_INTERNAL(OGL::AutoInitializer(), "Core::Library::isInitialized()");
+}
+
+class AbsentEntryPoint : public ORVO::Test::GLTest {};
+
+TEST_F(AbsentEntryPoint, DoesNothingAndIsReportedByTheNextCheck) {
+    ASSERT_FALSE(epoxy_has_gl_extension("GL_APPLE_fence"));
+    glFinishObjectAPPLE(GL_TEXTURE, 1);
+    ORVO_EXPECT_OGL(OGL::Texture2D(OGL::Texture::INTERNAL_FORMAT_RGBA8, 1, 1, false, nullptr),
+                    "The texture could not be allocated (no entry point glFinishObjectAPPLE)");
+    OGL::Texture2D const texture(OGL::Texture::INTERNAL_FORMAT_RGBA8, 1, 1, false, nullptr);
+    EXPECT_NE(0U, texture.objectID());
+}
+
+epoxy_resolver_failure_handler_t ownHandler() {
+    return [](char const*) -> void (*)() { return nullptr; };
+}
+
+TEST(OGLLibrary, GivesTheLoadersFailureHandlerBack) {
+    ORVO::Test::CoreLayer const core;
+    auto const handler = ownHandler();
+    auto const former = epoxy_set_resolver_failure_handler(handler);
+    OGL::Library::initialize();
+    OGL::Library::terminate();
+    EXPECT_EQ(handler, epoxy_set_resolver_failure_handler(former));
 }
 
 } // namespace

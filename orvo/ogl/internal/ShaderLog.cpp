@@ -1,7 +1,7 @@
 #include "orvo/ogl/internal/ShaderLog.h"
 
-#include <algorithm>
-#include <regex>
+#include <cctype>
+#include <string_view>
 
 namespace ORVO::OGL::Internal {
 
@@ -19,8 +19,68 @@ std::string lineOf(std::string const& sText, std::size_t nLine) {
     return nLine == 0 ? std::string() : sText.substr(nBegin, sText.find('\n', nBegin) - nBegin);
 }
 
-/// A number of at most nine digits.
-std::size_t numberOf(std::ssub_match const& digits) { return std::stoul(digits.str()); }
+bool isDigit(char c) noexcept { return std::isdigit(static_cast<unsigned char>(c)) != 0; }
+
+/// Reads a log from a position on. Every step forward is taken only if it fits.
+class LogReader {
+public:
+    LogReader(std::string const& sLog, std::size_t nPosition) noexcept : sLog_(sLog), n_(nPosition) {}
+
+    bool take(char c) noexcept {
+        if (n_ >= sLog_.size() || sLog_[n_] != c)
+            return false;
+        ++n_;
+        return true;
+    }
+
+    /// A number of at most nine digits.
+    bool take(std::size_t& number) noexcept {
+        std::size_t nEnd = n_;
+        while (nEnd < sLog_.size() && isDigit(sLog_[nEnd]))
+            ++nEnd;
+        if (nEnd == n_ || nEnd - n_ > 9)
+            return false;
+        number = 0;
+        for (; n_ < nEnd; ++n_)
+            number = number * 10 + static_cast<std::size_t>(sLog_[n_] - '0');
+        return true;
+    }
+
+    void skipSpaces() noexcept {
+        while (take(' ')) {
+        }
+    }
+
+private:
+    std::string const& sLog_;
+    std::size_t n_;
+};
+
+/// "<string>:<line>(<column>):"
+bool readWithColumn(LogReader reader, LogPlace& place) noexcept {
+    std::size_t nColumn = 0;
+    return reader.take(place.nString_) && reader.take(':') && reader.take(place.nLine_) && reader.take('(') &&
+           reader.take(nColumn) && reader.take(')') && reader.take(':');
+}
+
+/// "<string>(<line>) :"
+bool readInParentheses(LogReader reader, LogPlace& place) noexcept {
+    if (!reader.take(place.nString_) || !reader.take('(') || !reader.take(place.nLine_) || !reader.take(')'))
+        return false;
+    reader.skipSpaces();
+    return reader.take(':');
+}
+
+/// "<string>:<line>:", which is only a place after "ERROR: " or "WARNING: ".
+bool readAfterSeverity(std::string const& sLog, std::size_t nPosition, LogPlace& place) noexcept {
+    std::string_view const sBefore(sLog.data(), nPosition);
+    auto const follows = [sBefore](std::string_view sText) {
+        return sBefore.size() >= sText.size() && sBefore.substr(sBefore.size() - sText.size()) == sText;
+    };
+    LogReader reader(sLog, nPosition);
+    return (follows("ERROR: ") || follows("WARNING: ")) && reader.take(place.nString_) && reader.take(':') &&
+           reader.take(place.nLine_) && reader.take(':');
+}
 
 std::string withoutTrailingNewlines(std::string sText) {
     while (!sText.empty() && (sText.back() == '\n' || sText.back() == '\0'))
@@ -53,15 +113,16 @@ std::string ShaderSource::line(std::size_t nString, std::size_t nLine) const {
 }
 
 LogPlace firstPlace(std::string const& sLog) {
-    // In one pass over the log, so that the earliest place counts whatever its form.
-    static std::regex const oPattern(R"((\d{1,9}):(\d{1,9})\(\d{1,9}\):|(\d{1,9})\((\d{1,9})\)\s*:|)"
-                                     R"((?:ERROR|WARNING):\s*(\d{1,9}):(\d{1,9}):)");
-    std::smatch match;
-    if (!std::regex_search(sLog, match, oPattern))
-        return {};
-    for (std::size_t i = 1; i < match.size(); i += 2)
-        if (match[i].matched)
-            return {true, numberOf(match[i]), numberOf(match[i + 1])};
+    for (std::size_t i = 0; i < sLog.size(); ++i) {
+        if (!isDigit(sLog[i]) || (i > 0 && isDigit(sLog[i - 1])))
+            continue;
+        LogPlace place;
+        LogReader const reader(sLog, i);
+        place.bFound_ = readWithColumn(reader, place) || readInParentheses(reader, place) ||
+                        readAfterSeverity(sLog, i, place);
+        if (place.bFound_)
+            return place;
+    }
     return {};
 }
 
