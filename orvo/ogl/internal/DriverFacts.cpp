@@ -102,7 +102,7 @@ DriverFacts const& DriverFacts::current() {
     DriverFacts const* const pCandidate = pLast.load(std::memory_order_acquire);
     if (NativeContext::currentHandle() == nullptr) {
         if (pCandidate == nullptr)
-            ORVO_OGL_REQUIRE_CONTEXT();
+            ORVO_OGL_FAIL("No OpenGL context is current", 0);
         return *pCandidate;
     }
     if (pCandidate != nullptr && isCurrentDriver(*pCandidate))

@@ -103,7 +103,7 @@ EGLDisplay headlessDisplay() {
         return display;
     if (dlopen("libEGL.so.1", RTLD_LAZY | RTLD_LOCAL) == nullptr)
         return EGL_NO_DISPLAY;
-    for (EGLDisplay const candidate : headlessDisplays())
+    for (EGLDisplay candidate : headlessDisplays())
         if (candidate != EGL_NO_DISPLAY && eglInitialize(candidate, nullptr, nullptr) == EGL_TRUE &&
             eglBindAPI(EGL_OPENGL_API) == EGL_TRUE) {
             display = candidate;
@@ -153,7 +153,7 @@ NativeContext create(EGLDisplay display, EGLConfig config, EGLContext share) {
     if (displayHas(display, "EGL_KHR_surfaceless_context"))
         return record;
     static constexpr EGLint aSize[] = {EGL_WIDTH, 1, EGL_HEIGHT, 1, EGL_NONE};
-    EGLSurface const surface = eglCreatePbufferSurface(display, config, aSize);
+    EGLSurface surface = eglCreatePbufferSurface(display, config, aSize);
     if (surface == EGL_NO_SURFACE) {
         PlatformFailure const failure = lastFailure();
         eglDestroyContext(display, record.pContext_);
@@ -169,7 +169,7 @@ NativeContext current() noexcept {
     NativeContext record;
     if (!isLoaded())
         return record;
-    EGLContext const context = eglGetCurrentContext();
+    EGLContext context = eglGetCurrentContext();
     if (context == EGL_NO_CONTEXT)
         return record;
     record.eAPI_ = ContextAPI::egl;
@@ -202,7 +202,7 @@ NativeContext createSharing(NativeContext const& shareWith) {
 }
 
 NativeContext createHeadless() {
-    EGLDisplay const display = headlessDisplay();
+    EGLDisplay display = headlessDisplay();
     if (display == EGL_NO_DISPLAY)
         throwPlatform(__FILE__, __LINE__, "No OpenGL driver is available", {});
     return create(display, headlessConfig(display), EGL_NO_CONTEXT);

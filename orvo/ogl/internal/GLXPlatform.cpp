@@ -135,7 +135,7 @@ NativeContext current() noexcept {
     NativeContext record;
     if (!isLoaded())
         return record;
-    GLXContext const context = glXGetCurrentContext();
+    GLXContext context = glXGetCurrentContext();
     if (context == nullptr)
         return record;
     record.eAPI_ = ContextAPI::glx;
@@ -161,7 +161,7 @@ NativeContext createSharing(NativeContext const& shareWith) {
     PlatformFailure failure;
     {
         ErrorTrap const trap(pDisplay);
-        if (GLXFBConfig const config = configOf(pDisplay, contextOf(shareWith))) {
+        if (GLXFBConfig config = configOf(pDisplay, contextOf(shareWith))) {
             context = glXCreateNewContext(pDisplay, config, GLX_RGBA_TYPE, contextOf(shareWith), True);
             int const aSize[] = {GLX_PBUFFER_WIDTH, 1, GLX_PBUFFER_HEIGHT, 1, None};
             surface = context != nullptr ? glXCreatePbuffer(pDisplay, config, aSize) : 0;

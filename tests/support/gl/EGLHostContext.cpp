@@ -17,7 +17,7 @@ void require(bool bDone, char const* pWhat) {
 /// One display for the process, never ended: the driver keeps memory for each that is opened. The host has
 /// its driver's surfaceless display, on a machine without that the default one.
 EGLDisplay hostDisplay() {
-    static EGLDisplay const display = [] {
+    static EGLDisplay display = [] {
         EGLDisplay opened = eglGetPlatformDisplayEXT(EGL_PLATFORM_SURFACELESS_MESA,
                                                      reinterpret_cast<void*>(EGL_DEFAULT_DISPLAY), nullptr);
         if (opened == EGL_NO_DISPLAY || eglInitialize(opened, nullptr, nullptr) == EGL_FALSE) {

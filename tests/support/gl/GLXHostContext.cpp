@@ -25,7 +25,7 @@ Display* hostDisplay() {
 }
 
 GLXFBConfig hostConfig() {
-    static GLXFBConfig const config = [] {
+    static GLXFBConfig config = [] {
         int const aAttributes[] = {GLX_DRAWABLE_TYPE,
                                    GLX_WINDOW_BIT | GLX_PBUFFER_BIT,
                                    GLX_RENDER_TYPE,
@@ -37,7 +37,7 @@ GLXFBConfig hostConfig() {
         GLXFBConfig* const pConfigs =
             glXChooseFBConfig(hostDisplay(), DefaultScreen(hostDisplay()), aAttributes, &nConfigs);
         require(pConfigs != nullptr && nConfigs > 0, "no GLX configuration");
-        GLXFBConfig const chosen = pConfigs[0];
+        GLXFBConfig chosen = pConfigs[0];
         XFree(pConfigs);
         return chosen;
     }();
