@@ -4,7 +4,6 @@
 #include <string>
 
 #include "orvo/core/Check.h"
-#include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/internal/Scopes.h"
 #include "orvo/ogl/internal/TokenTable.h"
 
@@ -27,7 +26,7 @@ Buffer::Buffer(long long size, Type type, Usage usage, void const* pData)
     : Object(Type2GL(type)), nSize_(size) {
     ORVO_CHECK_PARAMETER(size >= 0);
     unsigned const nUsage = Usage2GL(usage);
-    ORVO_OGL_REQUIRE_CONTEXT();
+    joinShareGroup();
     GLuint nName = 0;
     epoxy_glGenBuffers(1, &nName);
     if (nName == 0)
@@ -45,7 +44,7 @@ Buffer::Buffer(long long size, Type type, Usage usage, void const* pData)
 
 Buffer::~Buffer() {
     GLuint const nName = Buffer::objectID();
-    if (NativeContext::currentHandle() != nullptr)
+    if (isShareGroupCurrent())
         epoxy_glDeleteBuffers(1, &nName);
 }
 

@@ -1,8 +1,14 @@
 #include "orvo/ogl/GLSLObject.h"
 
+#include "orvo/ogl/internal/ShareGroup.h"
+
 namespace ORVO::OGL {
 
 GLSLObject::GLSLObject() noexcept = default;
 GLSLObject::~GLSLObject() = default;
+
+void GLSLObject::joinShareGroup() { spGroup_ = Internal::ShareGroup::current(); }
+
+bool GLSLObject::isShareGroupCurrent() const noexcept { return spGroup_ != nullptr && spGroup_->isCurrent(); }
 
 } // namespace ORVO::OGL

@@ -1,10 +1,17 @@
 #pragma once
 
+#include <memory>
+
 #include "orvo/core/Export.h"
 
 namespace ORVO::OGL {
 
-/// Base of the objects of the shading language: a name, which is no texture's or buffer's.
+namespace Internal {
+class ShareGroup;
+}
+
+/// Base of the objects of the shading language: a name, which is no texture's or buffer's. Made and destroyed
+/// as Object is.
 ///
 /// Threads: any thread with a context of the share group current, one thread at a time for one object.
 class ORVO_API GLSLObject {
@@ -19,9 +26,14 @@ public:
 protected:
     GLSLObject() noexcept;
     void setObjectID(unsigned nName) noexcept { nName_ = nName; }
+    /// Remembers the current context's share group. Throws ExceptionOGL.
+    void joinShareGroup();
+    /// Whether a context of that group is current: only then is the name to be deleted.
+    bool isShareGroupCurrent() const noexcept;
 
 private:
     unsigned nName_ = 0;
+    std::shared_ptr<Internal::ShareGroup const> spGroup_;
 };
 
 } // namespace ORVO::OGL

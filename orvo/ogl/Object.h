@@ -1,14 +1,21 @@
 #pragma once
 
+#include <memory>
+
 #include "orvo/core/Export.h"
 
 namespace ORVO::OGL {
 
+namespace Internal {
+class ShareGroup;
+}
+
 /// Base of objects that OpenGL knows by a name: a target to bind to, and what is bound there.
 ///
 /// Objects are made in the calling thread's current context and are destroyed while a context of the same
-/// share group is current; without one, destruction leaves the name to the group's end. Every operation that
-/// speaks to OpenGL throws ExceptionOGL "No OpenGL context is current" if there is none.
+/// share group is current; without one, or with a foreign one, destruction leaves the name to the group's
+/// end. Every operation that speaks to OpenGL throws ExceptionOGL "No OpenGL context is current" if there is
+/// none.
 ///
 /// Threads: any thread with a context of the share group current, one thread at a time for one object.
 class ORVO_API Object {
@@ -30,10 +37,15 @@ protected:
     explicit Object(unsigned nTarget) noexcept;
 
     void setObjectID(unsigned nName) noexcept { nName_ = nName; }
+    /// Remembers the current context's share group. Throws ExceptionOGL.
+    void joinShareGroup();
+    /// Whether a context of that group is current: only then is the name to be deleted.
+    bool isShareGroupCurrent() const noexcept;
 
 private:
     unsigned nTarget_;
     unsigned nName_ = 0;
+    std::shared_ptr<Internal::ShareGroup const> spGroup_;
 };
 
 } // namespace ORVO::OGL

@@ -7,7 +7,6 @@
 
 #include "orvo/core/Check.h"
 #include "orvo/ogl/ExtensionManager.h"
-#include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/Scopes.h"
 #include "orvo/ogl/internal/ShaderLog.h"
@@ -65,7 +64,7 @@ struct Program::Details {
 };
 
 Program::Program() : pDetails_(std::make_unique<Details>()) {
-    ORVO_OGL_REQUIRE_CONTEXT();
+    joinShareGroup();
     unsigned const nName = glCreateProgram();
     if (nName == 0)
         ORVO_OGL_FAIL("The program could not be created", GL_OUT_OF_MEMORY);
@@ -73,7 +72,7 @@ Program::Program() : pDetails_(std::make_unique<Details>()) {
 }
 
 Program::~Program() {
-    if (NativeContext::currentHandle() == nullptr)
+    if (!isShareGroupCurrent())
         return;
     releaseShaders();
     glDeleteProgram(objectID());

@@ -22,8 +22,8 @@ class ORVO_API Program : public GLSLObject {
 public:
     /// An empty program. Throws ExceptionOGL.
     Program();
-    /// Deletes the program and shaders that were not linked, if a context is current. A program that is
-    /// enabled lives until it is disabled.
+    /// Deletes the program and shaders that were kept, if a context of its share group is current. A program
+    /// that is enabled lives until it is disabled.
     ~Program() override;
 
     /// Compile one stage from count strings, which the driver reads as one text; a null array of lengths, or

@@ -6,7 +6,6 @@
 #include <string>
 
 #include "orvo/core/Check.h"
-#include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/Scopes.h"
 
@@ -36,7 +35,7 @@ Texture::Texture(unsigned nTarget, InternalFormat format, Extent const& extent, 
                          "Texture size is too large");
     if (bMipmaps)
         nLevels_ = levelsDownToOne(nLargest);
-    ORVO_OGL_REQUIRE_CONTEXT();
+    joinShareGroup();
     GLuint nName = 0;
     glGenTextures(1, &nName);
     if (nName == 0)
@@ -46,7 +45,7 @@ Texture::Texture(unsigned nTarget, InternalFormat format, Extent const& extent, 
 
 Texture::~Texture() {
     GLuint const nName = Texture::objectID();
-    if (nName != 0 && NativeContext::currentHandle() != nullptr)
+    if (isShareGroupCurrent())
         glDeleteTextures(1, &nName);
 }
 

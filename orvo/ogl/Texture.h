@@ -135,7 +135,7 @@ public:
 
     enum Target : int { TARGET_1D = 0, TARGET_2D = 1, TARGET_3D = 2, TARGET_RECTANGLE = 3 };
 
-    /// Deletes the texture, if a context is current.
+    /// Deletes the texture, if a context of its share group is current.
     ~Texture() override;
 
     unsigned getBoundID() const override;

@@ -123,8 +123,24 @@ TEST_F(BufferTest, LeavesNothingWhereACallFails) {
         Buffer::bindDefaultUnpackBuffer();
     };
     auto const aFailed = ORVO::Test::failEveryCall(use, cleanUp);
-    EXPECT_EQ((std::set<std::string>{"glGenBuffers", "glBufferData", "glMapBuffer", "glUnmapBuffer"}),
+    EXPECT_EQ((std::set<std::string>{"glFenceSync", "glGenBuffers", "glBufferData", "glMapBuffer",
+                                     "glUnmapBuffer"}),
               aFailed);
+}
+
+TEST_F(BufferTest, LeavesForeignBuffersAloneWhereItDiesInAForeignContext) {
+    auto pBuffer = std::make_unique<Buffer>(4, Buffer::TYPE_ARRAY, Buffer::USAGE_STATIC_DRAW, nullptr);
+    auto const pForeign = host().another(false);
+    pForeign->makeCurrent();
+    auto pOther = std::make_unique<Buffer>(4, Buffer::TYPE_ARRAY, Buffer::USAGE_STATIC_DRAW, nullptr);
+    pOther->bind();
+    EXPECT_EQ(pBuffer->objectID(), pOther->objectID());
+    pBuffer.reset();
+    EXPECT_EQ(GL_TRUE, glIsBuffer(pOther->objectID()));
+    pOther.reset();
+    pForeign->destroyContext();
+    loseHost();
+    ORVO::Test::GLHooks::forgetObjects();
 }
 
 TEST_F(BufferTest, NeedsAContext) {

@@ -10,6 +10,7 @@
 #include <type_traits>
 
 #include "orvo/ogl/ExtensionManager.h"
+#include "orvo/ogl/NativeContext.h"
 #include "tests/support/gl/ExpectOGL.h"
 #include "tests/support/gl/FailEveryCall.h"
 #include "tests/support/gl/GLTest.h"
@@ -58,7 +59,8 @@ std::string failureOf(std::function<void()> const& code) {
 class ProgramTest : public ORVO::Test::GLTest {
 protected:
     void TearDown() override {
-        glUseProgram(0);
+        if (OGL::NativeContext::currentHandle() != nullptr)
+            glUseProgram(0);
         GLTest::TearDown();
     }
 
@@ -389,9 +391,9 @@ TEST_F(ProgramTest, LeavesNothingWhereACallFails) {
         program.disable();
     };
     auto const aFailed = ORVO::Test::failEveryCall(build, &drainErrors);
-    EXPECT_EQ(
-        (std::set<std::string>{"glCreateProgram", "glCreateShader", "glCompileShader", "glLinkProgram"}),
-        aFailed);
+    EXPECT_EQ((std::set<std::string>{"glFenceSync", "glCreateProgram", "glCreateShader", "glCompileShader",
+                                     "glLinkProgram"}),
+              aFailed);
 }
 
 TEST_F(ProgramTest, NeedsAContext) {
@@ -411,6 +413,21 @@ TEST_F(ProgramTest, NeedsAContext) {
     ORVO_EXPECT_OGL(program.setUniform_Unsafe("a", 1.0F), pNone);
     EXPECT_LE(0, program.getUniformLocation("a"));
     host().makeCurrent();
+}
+
+TEST_F(ProgramTest, LeavesForeignProgramsAloneWhereItDiesInAForeignContext) {
+    auto pProgram = std::make_unique<Program>();
+    auto const pForeign = host().another(false);
+    pForeign->makeCurrent();
+    {
+        Program const other;
+        EXPECT_EQ(pProgram->objectID(), other.objectID());
+        pProgram.reset();
+        EXPECT_EQ(GL_TRUE, glIsProgram(other.objectID()));
+    }
+    pForeign->destroyContext();
+    loseHost();
+    ORVO::Test::GLHooks::forgetObjects();
 }
 
 TEST_F(ProgramTest, IsNotSupportedWithoutShaderObjects) {

@@ -5,6 +5,7 @@
 #include <array>
 #include <climits>
 #include <cstdint>
+#include <memory>
 #include <vector>
 
 #include "orvo/ogl/Buffer.h"
@@ -160,7 +161,8 @@ TEST_F(TextureTest, LeavesNothingWhereACallFails) {
         OGL::TextureRECT const rectangle(eRGBA8, 2, 2, nullptr);
     };
     auto const aFailed = ORVO::Test::failEveryCall(make, &drainErrors);
-    EXPECT_EQ((std::set<std::string>{"glGenTextures", "glTexImage1D", "glTexImage2D", "glTexImage3D"}),
+    EXPECT_EQ((std::set<std::string>{"glFenceSync", "glGenTextures", "glTexImage1D", "glTexImage2D",
+                                     "glTexImage3D"}),
               aFailed);
 }
 
@@ -295,7 +297,40 @@ TEST_F(TextureTest, IsLeftToItsGroupWhereNoContextIsCurrent) {
     pTexture.reset();
     host().makeCurrent();
     EXPECT_EQ(GL_TRUE, glIsTexture(nName));
-    glDeleteTextures(1, &nName);
+    loseHost();
+    ORVO::Test::GLHooks::forgetObjects();
+}
+
+TEST_F(TextureTest, LeavesForeignTexturesAloneWhereItDiesInAForeignContext) {
+    auto pTexture = std::make_unique<OGL::Texture2D>(eRGBA8, 1, 1, false, nullptr);
+    GLuint const nName = pTexture->objectID();
+    auto const pForeign = host().another(false);
+    pForeign->makeCurrent();
+    {
+        OGL::Texture2D const foreign(eRGBA8, 1, 1, false, nullptr);
+        EXPECT_EQ(nName, foreign.objectID());
+        pTexture.reset();
+        EXPECT_EQ(GL_TRUE, glIsTexture(foreign.objectID()));
+    }
+    host().makeCurrent();
+    EXPECT_EQ(GL_TRUE, glIsTexture(nName));
+    pForeign->destroyContext();
+    loseHost();
+    ORVO::Test::GLHooks::forgetObjects();
+}
+
+TEST_F(TextureTest, DiesInAnotherContextOfItsGroup) {
+    auto pTexture = std::make_unique<OGL::Texture2D>(eRGBA8, 1, 1, false, nullptr);
+    auto const pSharing = host().another(true);
+    pSharing->makeCurrent();
+    pTexture.reset();
+    EXPECT_EQ(0, ORVO::Test::GLHooks::objects()["texture"]);
+}
+
+TEST_F(TextureTest, HasOneSyncObjectForTheWholeGroup) {
+    OGL::Texture2D const first(eRGBA8, 1, 1, false, nullptr);
+    OGL::Texture2D const second(eRGBA8, 1, 1, false, nullptr);
+    EXPECT_EQ(1, ORVO::Test::GLHooks::objects()["sync"]);
 }
 
 TEST_F(TextureTest, RectangleTakesItsClientMemory) {

@@ -1,0 +1,62 @@
+#include "orvo/ogl/internal/ShareGroup.h"
+
+#include <algorithm>
+#include <mutex>
+#include <vector>
+
+#include "orvo/ogl/NativeContext.h"
+#include "orvo/ogl/internal/Failure.h"
+#include "orvo/ogl/internal/Sentinel.h"
+
+namespace ORVO::OGL::Internal {
+
+namespace {
+
+struct KnownGroups {
+    std::mutex oLock_;
+    std::vector<std::weak_ptr<ShareGroup const>> aGroups_;
+};
+
+/// Never destroyed: objects of a host's static storage may be made and die late.
+KnownGroups& knownGroups() {
+    static auto* const pKnown = new KnownGroups;
+    return *pKnown;
+}
+
+} // namespace
+
+std::shared_ptr<ShareGroup const> ShareGroup::current() {
+    ORVO_OGL_REQUIRE_CONTEXT();
+    KnownGroups& known = knownGroups();
+    // A group that ends here does so after the lock is given back.
+    std::vector<std::shared_ptr<ShareGroup const>> aAlive;
+    std::lock_guard const guard(known.oLock_);
+    auto const isGone = [](std::weak_ptr<ShareGroup const> const& wp) { return wp.expired(); };
+    known.aGroups_.erase(std::remove_if(known.aGroups_.begin(), known.aGroups_.end(), isGone),
+                         known.aGroups_.end());
+    for (auto const& wpGroup : known.aGroups_) {
+        auto spGroup = wpGroup.lock();
+        if (spGroup != nullptr && spGroup->isCurrent())
+            return spGroup;
+        aAlive.push_back(std::move(spGroup));
+    }
+    known.aGroups_.reserve(known.aGroups_.size() + 1);
+    auto pSync = std::unique_ptr<void, void (*)(void*)>(Sentinel::create(), &Sentinel::destroy);
+    auto const spGroup = std::make_shared<ShareGroup const>(pSync.get());
+    pSync.release();
+    known.aGroups_.push_back(spGroup);
+    return spGroup;
+}
+
+ShareGroup::ShareGroup(void* pSync) noexcept : pSync_(pSync) {}
+
+ShareGroup::~ShareGroup() {
+    if (isCurrent())
+        Sentinel::destroy(pSync_);
+}
+
+bool ShareGroup::isCurrent() const noexcept {
+    return NativeContext::currentHandle() != nullptr && (pSync_ == nullptr || Sentinel::isAlive(pSync_));
+}
+
+} // namespace ORVO::OGL::Internal
