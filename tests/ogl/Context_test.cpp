@@ -118,6 +118,26 @@ TEST_P(AdoptedContext, SurvivesTheEndOfTheHostsContext) {
 
 ORVO_INSTANTIATE_ON_EACH_INTERFACE(AdoptedContext);
 
+class EGLContext : public ORVO::Test::GLTest {};
+
+TEST_F(EGLContext, IsRefusedWithEGLsReasonOnceItHasDied) {
+    auto const pOther = host().another(false);
+    pOther->makeCurrent();
+    auto pContext = OGL::Context::adoptCurrent();
+    pOther->destroyContext();
+    host().makeCurrent();
+    ORVO_EXPECT_OGL(pContext->makeCurrent(),
+                    "The OpenGL context could not be made current (EGL_BAD_CONTEXT)");
+    EXPECT_EQ(host().handle(), OGL::NativeContext::currentHandle());
+    ORVO_EXPECT_OGL(OGL::ContextOffscreen(pContext.get()),
+                    "The OpenGL context could not be created (EGL_BAD_CONTEXT)");
+    EXPECT_EQ(host().handle(), OGL::NativeContext::currentHandle());
+    // Its sync object died with it.
+    pContext.reset();
+    loseHost();
+    ORVO::Test::GLHooks::forgetObjects();
+}
+
 class BothInterfaces : public ORVO::Test::GLTest {
 protected:
     void SetUp() override {

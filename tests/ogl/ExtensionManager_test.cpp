@@ -229,7 +229,7 @@ TEST_F(Vendor, IsToldByTheDriversTexts) {
         ExtensionManager::teVendor eVendor;
     };
     constexpr Row aRows[] = {
-        {{"NVIDIA Corporation", "NVIDIA H200/PCIe/SSE2"}, ExtensionManager::VENDOR_NVIDIA},
+        {{"NVIDIA Corporation", "GeForce/PCIe/SSE2"}, ExtensionManager::VENDOR_NVIDIA},
         {{"ATI Technologies Inc.", "Radeon"}, ExtensionManager::VENDOR_ATI},
         {{"AMD", "AMD Radeon (radeonsi)"}, ExtensionManager::VENDOR_ATI},
         {{"Intel", "Mesa Intel(R) Graphics"}, ExtensionManager::VENDOR_INTEL},
