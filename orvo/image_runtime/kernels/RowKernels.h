@@ -41,7 +41,7 @@ struct RowKernels {
 
     /// value / 255.0f.
     void (*unitFromUInt8)(float* pOutput, std::uint8_t const* pInput, std::size_t n);
-    /// Halves given as bit patterns, to float, exactly.
+    /// Halves given as bit patterns, to float, exactly. A signalling NaN becomes a quiet one.
     void (*floatFromHalf)(float* pOutput, std::uint16_t const* pInput, std::size_t n);
     /// Clamped to 0..1; a NaN stays as it is.
     void (*clampedToUnit)(float* pOutput, float const* pInput, std::size_t n);
