@@ -142,9 +142,15 @@ TEST_F(ControllerSlicesTest, NullNodeIsRefused) {
 }
 
 TEST_F(ControllerSlicesTest, NodeThatReportsItemsMustOverrideProcessSlice) {
-    struct Careless : SumNode {
-        Careless() : SumNode("careless", 0) { setSlices(4); }
-        void processSlice(std::size_t begin, std::size_t end) override { Node::processSlice(begin, end); }
+    struct Careless : DataFlow::Node {
+        Careless() : Node("careless") {}
+        BlockedRange rangeToProcess() override {
+            BlockedRange range;
+            range.items = 4;
+            range.unitsPerItem = 1;
+            return range;
+        }
+        void internalProcess() override { controller()->processSlices(this); }
     };
     Careless careless;
     controller.addNode(&careless);
