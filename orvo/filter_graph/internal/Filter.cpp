@@ -68,8 +68,28 @@ void Filter::initialize() const {
     // Filters are never constant objects: constant is only the view of a prototype that the factory hands
     // out.
     auto* pSelf = const_cast<Filter*>(this);
-    pSelf->finishLazyInitialization();
+    Sizes const sizesBefore = {ownedInputs_.size(), ownedParameters_.size(), ownedMetadata_.size()};
+    try {
+        pSelf->finishLazyInitialization();
+    } catch (...) {
+        // Half a set-up would stand in the way of the next try.
+        pSelf->shrinkTo(sizesBefore);
+        throw;
+    }
     pSelf->initialized = true;
+}
+
+void Filter::shrinkTo(Sizes const& sizes) noexcept {
+    for (; ownedInputs_.size() > sizes.nInputs; ownedInputs_.pop_back())
+        if (pInputSet_)
+            pInputSet_->remove(ownedInputs_.back().get());
+    for (; ownedParameters_.size() > sizes.nParameters; ownedParameters_.pop_back())
+        if (pParameterSet_)
+            pParameterSet_->remove(ownedParameters_.back().get());
+    if (ownedMetadata_.size() > sizes.nMetadata) {
+        ownedMetadata_.resize(sizes.nMetadata);
+        metadata_.resize(sizes.nMetadata);
+    }
 }
 
 void Filter::assign(Filter const& other) {

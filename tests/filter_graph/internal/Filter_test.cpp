@@ -160,6 +160,42 @@ TEST(FilterTest, FinishesItsSetUpOnce) {
     EXPECT_TRUE(plain.isInitialized());
 }
 
+/// Adds one of everything and fails at the end of its first set-up.
+class StumblingFilter : public PlainFilter {
+public:
+    bool bStumbles = true;
+
+protected:
+    void finishLazyInitialization() override {
+        addInput("late", 0);
+        addParameter(owned<int>("late", 1));
+        addMetadataItem(item<int>("late", 1));
+        if (bStumbles)
+            throw std::bad_alloc();
+        PlainFilter::finishLazyInitialization();
+    }
+};
+
+TEST(FilterTest, TakesBackASetUpThatFailed) {
+    StumblingFilter filter;
+    filter.addInput("early", 0);
+    filter.addParameter(owned<int>("early", 1));
+    filter.addMetadataItem(item<int>("early", 1));
+    EXPECT_THROW(filter.initialize(), std::bad_alloc);
+    EXPECT_FALSE(filter.isInitialized());
+    EXPECT_EQ(filter.getNumberOfInputs(), 1u);
+    EXPECT_EQ(filter.getNumberOfParameters(), 1u);
+    EXPECT_EQ(filter.getNumberOfMetadataItems(), 1u);
+    EXPECT_EQ(filter.input("late"), nullptr);
+    EXPECT_EQ(filter.parameter("late"), nullptr);
+    EXPECT_EQ(filter.metadataItem("late"), nullptr);
+    filter.bStumbles = false;
+    filter.initialize();
+    EXPECT_TRUE(filter.isInitialized());
+    EXPECT_TRUE(filter.input("late"));
+    EXPECT_EQ(filter.getNumberOfInputs(), 2u);
+}
+
 TEST(FilterTest, CarriesTheFinishedSetUpIntoAClone) {
     LazyFilter filter("lazy");
     filter.initialize();
