@@ -128,7 +128,8 @@ private:
         }
     }
 
-    Plane evaluate(std::size_t iMember) const {
+    /// One member's picture, out of those of its producers.
+    Plane evaluate(std::size_t iMember, std::vector<Plane> const& aPlanes) const {
         Member const& member = aMembers_[iMember];
         Plane result;
         if (member.upSource_) {
@@ -145,7 +146,7 @@ private:
         std::vector<Plane> aInputs;
         PositionExtentInWorldSpace domain;
         for (std::size_t iProducer : member.aProducers_) {
-            aInputs.push_back(evaluate(iProducer));
+            aInputs.push_back(aPlanes[iProducer]);
             PositionExtentInWorldSpace region = boundsOf(aInputs.back());
             region.outset(float2(float(member.upFilter_->iRadius_)));
             domain.include(region);
@@ -184,7 +185,11 @@ private:
     }
 
     void compare(PositionExtentInPixelSpace const& asked) const {
-        Plane const expected = evaluate(aMembers_.size() - 1);
+        std::vector<Plane> aPlanes;
+        for (std::size_t i = 0; i < aMembers_.size(); ++i) {
+            aPlanes.push_back(evaluate(i, aPlanes));
+        }
+        Plane const& expected = aPlanes.back();
         ImageCPU const* const pResult = oSink_.getImageCPU();
         ASSERT_NE(nullptr, pResult);
         std::size_t nPixels = 0;
