@@ -219,7 +219,7 @@ private:
 TEST(RandomImageGraphsTest, everyFrameEqualsThePlainEvaluation) {
     ORVO::Test::ImageFlowLayers layers;
     std::size_t const nThreads = Controller::getNumberOfThreads();
-    for (unsigned seed = 0; seed < 250; ++seed) {
+    for (unsigned seed = 0; seed < 150; ++seed) {
         SCOPED_TRACE(testing::Message() << "seed " << seed);
         Controller::setNumberOfThreads(seed % 3 == 0 ? 1 : seed % 3 == 1 ? 2 : 8);
         Controller::setMinimumGrainSize(seed % 5 * 7);
