@@ -247,6 +247,21 @@ TEST_P(Conversions, RefuseToHaveNoOutput) {
     ORVO_EXPECT_INTERNAL(GetParam().convert(from, nullptr, 0, 4, 0, 4), "Enforce pOutputImage != NULL");
 }
 
+TEST(ConvertSIMDOptimized, RefusesToHaveNoOutputForAWholeImage) {
+    ImageCPU const from(ImageCPU::PIXEL_FORMAT_RGBA32F, rectangle(0, 0, 4, 4), oUnit, ExtentInPixelSpace());
+    ImageCPU* const pNone = nullptr;
+    ORVO_EXPECT_INTERNAL(convertImageToSIMDOptimized32FFormat(from, pNone), "Enforce pOutputImage != NULL");
+    ORVO_EXPECT_INTERNAL(convertImageFromSIMDOptimized32FFormat(from, pNone), "Enforce pOutputImage != NULL");
+}
+
+TEST(ConvertSIMDOptimized, AsksForTheChannelBitsFirstOfAllPropertiesOfTheFormats) {
+    ImageCPU undefined;
+    ImageCPU floats(ImageCPU::PIXEL_FORMAT_RGBA32F, rectangle(0, 0, 0, 0), oUnit, ExtentInPixelSpace());
+    char const* const sText = "Not implemented: ePixelFormat in channelSizeBits().";
+    ORVO_EXPECT_INTERNAL(convertImageToSIMDOptimized32FFormat(undefined, &floats), sText);
+    ORVO_EXPECT_INTERNAL(convertImageFromSIMDOptimized32FFormat(floats, &undefined), sText);
+}
+
 TEST_P(Conversions, RefuseImagesOfDifferentChannels) {
     ImageCPU const from = input(rectangle(0, 0, 4, 4));
     for (Format const eFormat : FLOATS) {
