@@ -1,6 +1,7 @@
 #include "orvo/image_runtime/images/ImageCPU.h"
 
 #include "orvo/image_runtime/images/PixelStructures.h"
+#include "tests/support/Expect.h"
 
 #include <gtest/gtest.h>
 
@@ -103,6 +104,12 @@ TEST(ImageCPUDump, AddsThreeLinesToThoseOfTheBase) {
     std::ostringstream stream;
     made.doWrite(stream);
     EXPECT_EQ(expected.str(), stream.str());
+}
+
+TEST(ImageCPUDump, IsRefusedForAnImageOfUndefinedFormat) {
+    std::ostringstream stream;
+    ORVO_EXPECT_INTERNAL(ImageCPU().doWrite(stream), "Not implemented: ePixelFormat in channelSizeBits().");
+    ORVO_EXPECT_INTERNAL(ImageCPU().writeFull(stream), "Not implemented: ePixelFormat in channelSizeBits().");
 }
 
 template <class Channel>
