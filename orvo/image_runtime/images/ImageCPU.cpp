@@ -113,7 +113,7 @@ ImageCPU::ImageCPU(tePixelFormat ePixelFormat, PositionExtentInPixelSpace const&
       bOwnsPixels_(false),
       nSizeBytes_(0) {
     eTargetPlatform_ = ORVO_TARGET_CPU;
-    initStride(capacity);
+    init_stride(capacity);
     pPixels_ = allocatePixels(nSizeBytes_, FRESH_ALIGNMENT);
     bOwnsPixels_ = true;
 }
@@ -128,7 +128,7 @@ ImageCPU::ImageCPU(tePixelFormat ePixelFormat, unsigned char const* pPixels,
       bOwnsPixels_(false),
       nSizeBytes_(0) {
     eTargetPlatform_ = ORVO_TARGET_CPU;
-    initStride(capacity);
+    init_stride(capacity);
 }
 
 ImageCPU::ImageCPU(ImageCPU const& other)
@@ -164,7 +164,7 @@ ImageCPU::~ImageCPU() {
     }
 }
 
-void ImageCPU::initStride(ExtentInPixelSpace const& capacity) {
+void ImageCPU::init_stride(ExtentInPixelSpace const& capacity) {
     ExtentInPixelSpace const stride = !capacity.isDefined() || capacity.width() == 0 ? extent() : capacity;
     nSizeBytes_ = checkedSize(extent(), stride, pixelSizeBytes(ePixelFormat_));
     oCapacity_ = stride;
