@@ -8,6 +8,7 @@
 #include "orvo/filter_graph/impl/Input.h"
 #include "orvo/filter_graph/impl/Output.h"
 #include "orvo/filter_graph/internal/Connect.h"
+#include "tests/filter_graph/support/ForeignFilter.h"
 #include "tests/filter_graph/support/PlainFilter.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ExpectFilterGraph.h"
@@ -163,6 +164,16 @@ TEST(ConnectTest, RefusesNull) {
     ORVO_EXPECT_INTERNAL(Internal::Connect(filter.get(), static_cast<Internal::Filter*>(nullptr)),
                          noDestinationText);
     EXPECT_EQ(filter->getTimeStamp(), 0);
+}
+
+TEST(ConnectTest, RefusesFiltersThatAreNoneOfTheLibrarys) {
+    std::shared_ptr<IFilter> const foreign = std::make_shared<ORVO::Test::ForeignFilter>();
+    PlainPtr const filter = makePlain("filter", {"src"});
+    ORVO_EXPECT_INTERNAL(Connect(foreign, filter), "Enforce pSourceFilter != NULL");
+    ORVO_EXPECT_INTERNAL(Connect(foreign, filter->input("src")), "Enforce pSourceFilter != NULL");
+    ORVO_EXPECT_INTERNAL(Connect(filter, foreign), "Enforce pDestinationFilter != NULL");
+    EXPECT_EQ(filter->getTimeStamp(), 0);
+    DisconnectAll(foreign.get());
 }
 
 TEST(ConnectTest, TakesAdaptersOnBothEnds) {
