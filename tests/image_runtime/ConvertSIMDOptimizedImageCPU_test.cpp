@@ -436,6 +436,22 @@ TEST(ConvertFromSIMDOptimized, TruncatesAndWrapsBesideTheGroups) {
     }
 }
 
+TEST(ConvertSIMDOptimized, TakesMemoryOfTheCallerAtAnyAddress) {
+    std::uint16_t const words[] = {0, 32768, 16384, 8192, 1, 24576, 4096};
+    unsigned char aInput[sizeof(words) + 1] = {};
+    std::memcpy(aInput + 1, words, sizeof(words));
+    ImageCPU const odd(ImageCPU::PIXEL_FORMAT_LUMINANCE16, aInput + 1, rectangle(0, 0, 7, 1), oUnit,
+                       ExtentInPixelSpace());
+    Owned const floats(convertImageToSIMDOptimized32FFormat(odd));
+    EXPECT_EQ(0.25f, floatAt(*floats, 3, 0, 0));
+
+    unsigned char aOutput[sizeof(words) + 1] = {};
+    ImageCPU back(ImageCPU::PIXEL_FORMAT_LUMINANCE16, aOutput + 1, rectangle(0, 0, 7, 1), oUnit,
+                  ExtentInPixelSpace());
+    convertImageFromSIMDOptimized32FFormat(*floats, &back);
+    EXPECT_EQ(0, std::memcmp(words, aOutput + 1, sizeof(words)));
+}
+
 TEST(ConvertFromSIMDOptimized, RefusesInputsThatAreNoFloats) {
     ImageCPU const bytes(ImageCPU::PIXEL_FORMAT_RGBA8, rectangle(0, 0, 4, 4), oUnit, ExtentInPixelSpace());
     ORVO_EXPECT_INTERNAL(convertImageFromSIMDOptimized32FFormat(bytes, ImageCPU::PIXEL_FORMAT_RGBA8),

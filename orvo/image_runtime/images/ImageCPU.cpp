@@ -85,13 +85,17 @@ std::uint64_t checkedSize(ExtentInPixelSpace const& extent, ExtentInPixelSpace c
     return nPixels * nPixelBytes;
 }
 
+/// Copies each channel out, since memory of the caller may lie anywhere.
 template <class Channel>
-void writeRow(std::ostream& stream, Channel const* pRow, int width, std::size_t nChannels,
+void writeRow(std::ostream& stream, unsigned char const* pRow, int width, std::size_t nChannels,
               char const* sBehindPixel) {
     for (int x = 0; x < width; ++x) {
         for (std::size_t c = 0; c < nChannels; ++c) {
+            Channel value;
+            std::memcpy(&value, pRow, sizeof(value));
+            pRow += sizeof(value);
             // The unary plus makes a number of a byte.
-            stream << +*pRow++ << " ";
+            stream << +value << " ";
         }
         stream << sBehindPixel;
     }
@@ -219,9 +223,9 @@ void ImageCPU::writeImageData(std::ostream& stream, int maxWidth, int maxHeight)
                                     pixelSizeBytes(ePixelFormat_);
         unsigned char const* pRow = pixels() + nOffset;
         if (bBytes) {
-            writeRow(stream, pRow, width, nPixelChannels, sBehindPixel);
+            writeRow<unsigned char>(stream, pRow, width, nPixelChannels, sBehindPixel);
         } else {
-            writeRow(stream, reinterpret_cast<float const*>(pRow), width, nPixelChannels, sBehindPixel);
+            writeRow<float>(stream, pRow, width, nPixelChannels, sBehindPixel);
         }
     }
 }

@@ -44,7 +44,8 @@ struct RowKernelBody {
         constexpr std::size_t BLOCK_BYTES = BLOCK * sizeof(Output);
         std::size_t const nBytesToBoundary = -reinterpret_cast<std::uintptr_t>(pOutput) & (BLOCK_BYTES - 1);
         std::size_t i = nBytesToBoundary / sizeof(Output);
-        if (i >= n) {
+        // No channel begins on a boundary where the row lies between those of its channels.
+        if (i >= n || nBytesToBoundary % sizeof(Output) != 0) {
             runBlocks<Operation>(pOutput, pInput, n);
             return;
         }

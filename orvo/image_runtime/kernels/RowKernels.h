@@ -14,7 +14,7 @@ namespace ORVO::ImageRuntime {
 enum class StoreMode : std::int32_t { CACHED = 0, STREAM = 1 };
 
 /// Kernels over one row of `n` channel values, made for one instruction set. The channel order passes
-/// through. The two rows of a call must not overlap. Pointers need the alignment of their element only.
+/// through. The two rows of a call must not overlap. Pointers need no alignment, not even of their element.
 ///
 /// The first five work on the SIMD-optimised layout, in three stretches: a scalar head that brings the float
 /// pointer to 16 bytes (((16 - (address & 15)) >> 2) & 3 values at most), groups of four, and a scalar tail.
