@@ -36,6 +36,14 @@ struct FailingHeap {
         return pBlock;
     }
 
+    static void* tryAllocate(std::size_t bytes, std::size_t alignment) noexcept {
+        try {
+            return allocate(bytes, alignment);
+        } catch (std::bad_alloc const&) {
+            return nullptr;
+        }
+    }
+
     static void free(void* pBlock) noexcept {
         if (pBlock) {
             --nLive;
@@ -58,6 +66,22 @@ void* operator new[](std::size_t bytes, std::align_val_t alignment) {
     return FailingHeap::allocate(bytes, static_cast<std::size_t>(alignment));
 }
 
+void* operator new(std::size_t bytes, std::nothrow_t const&) noexcept {
+    return FailingHeap::tryAllocate(bytes, 0);
+}
+
+void* operator new[](std::size_t bytes, std::nothrow_t const&) noexcept {
+    return FailingHeap::tryAllocate(bytes, 0);
+}
+
+void* operator new(std::size_t bytes, std::align_val_t alignment, std::nothrow_t const&) noexcept {
+    return FailingHeap::tryAllocate(bytes, static_cast<std::size_t>(alignment));
+}
+
+void* operator new[](std::size_t bytes, std::align_val_t alignment, std::nothrow_t const&) noexcept {
+    return FailingHeap::tryAllocate(bytes, static_cast<std::size_t>(alignment));
+}
+
 void operator delete(void* pBlock) noexcept { FailingHeap::free(pBlock); }
 
 void operator delete[](void* pBlock) noexcept { FailingHeap::free(pBlock); }
@@ -73,6 +97,18 @@ void operator delete[](void* pBlock, std::align_val_t) noexcept { FailingHeap::f
 void operator delete(void* pBlock, std::size_t, std::align_val_t) noexcept { FailingHeap::free(pBlock); }
 
 void operator delete[](void* pBlock, std::size_t, std::align_val_t) noexcept { FailingHeap::free(pBlock); }
+
+void operator delete(void* pBlock, std::nothrow_t const&) noexcept { FailingHeap::free(pBlock); }
+
+void operator delete[](void* pBlock, std::nothrow_t const&) noexcept { FailingHeap::free(pBlock); }
+
+void operator delete(void* pBlock, std::align_val_t, std::nothrow_t const&) noexcept {
+    FailingHeap::free(pBlock);
+}
+
+void operator delete[](void* pBlock, std::align_val_t, std::nothrow_t const&) noexcept {
+    FailingHeap::free(pBlock);
+}
 
 namespace ORVO::FilterGraph {
 namespace {

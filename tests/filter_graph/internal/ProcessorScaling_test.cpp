@@ -90,10 +90,13 @@ protected:
 
     void bind(std::size_t nInput, ImageDescriptor::eChannelType input, std::size_t nOutput,
               ImageDescriptor::eChannelType output) {
-        spInput_ = image(nInput, input);
-        spOutput_ = image(nOutput, output);
-        spSource_->setImage(spInput_.get());
-        spSink_->setImage(spOutput_.get());
+        // The old images live until the adapters have let go of them.
+        auto const spNewInput = image(nInput, input);
+        auto const spNewOutput = image(nOutput, output);
+        spSource_->setImage(spNewInput.get());
+        spSink_->setImage(spNewOutput.get());
+        spInput_ = spNewInput;
+        spOutput_ = spNewOutput;
     }
 
     /// The intermediate graph's probes, sorted.
