@@ -17,8 +17,10 @@ namespace ORVO::FilterGraph {
 /// - "ConvertToSIMDOptimized": 8-bit or 16-bit integers to 32-bit float,
 /// - "ConvertFromSIMDOptimized": 32-bit float to the depth of the output image.
 ///
-/// All have version 1. The two converters serve hosts that bind 16-bit integer images to filters that read
-/// 8-bit and float images alone, which is all bilateral and Lab filters.
+/// All have version 1. The bilateral and Lab filters read and write 8-bit and float images alone, and every
+/// filter works in the depth of the image that its graph ends in. A host with 16-bit images puts
+/// "ConvertToSIMDOptimized" in front of them, ends the graph in a float image, and brings that back to 16
+/// bits with a graph that has no filter between input and output.
 ///
 /// Library::initialize does not call this.
 /// @throws Exception if one of them is registered already, InternalException "isInitialized()" while the
