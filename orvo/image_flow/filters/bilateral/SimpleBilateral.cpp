@@ -124,8 +124,9 @@ float4 SimpleBilateral::resultAt(PixelWindow const& window, int x) const {
                 sample = float4(grey, grey, grey, sample.w);
             }
             float const range = std::exp(distance * distance * -1.0F / (fRangeSigma_ * 2.0F * fRangeSigma_));
-            float const weight =
-                range * aSpatialWeights_[static_cast<std::size_t>(std::abs(i) * (nHalf_ + 1) + std::abs(j))];
+            std::size_t const nRow =
+                static_cast<std::size_t>(std::abs(i)) * (static_cast<std::size_t>(nHalf_) + 1);
+            float const weight = range * aSpatialWeights_[nRow + static_cast<std::size_t>(std::abs(j))];
             sum += weight * sample;
             total += weight;
         }
