@@ -191,6 +191,13 @@ TEST_F(ControllerSlicesTest, GrainIsGivenInWorkUnits) {
             EXPECT_GE(slice.end - slice.begin, std::max<std::size_t>(1, row.nGrain / 2))
                 << row.nMinimum << " over " << row.nUnits;
         }
+        // A range of one grain is not cut, one item more is.
+        node.setSlices(row.nGrain, row.nUnits);
+        frame();
+        EXPECT_EQ(1u, record.take().size()) << row.nMinimum << " over " << row.nUnits;
+        node.setSlices(row.nGrain + 1, row.nUnits);
+        frame();
+        EXPECT_EQ(2u, record.take().size()) << row.nMinimum << " over " << row.nUnits;
     }
 }
 
