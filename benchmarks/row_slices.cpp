@@ -91,7 +91,9 @@ void computeAsynchronous(benchmark::State& state, std::size_t nThreads) {
     state.SetItemsProcessed(static_cast<std::int64_t>(state.iterations() * nWidth * nHeight));
 }
 
-BENCHMARK_CAPTURE(computeSynchronous, single, 1, true)->Name("row_slices_compute/single_thread_mode")->UseRealTime();
+BENCHMARK_CAPTURE(computeSynchronous, single, 1, true)
+    ->Name("row_slices_compute/single_thread_mode")
+    ->UseRealTime();
 BENCHMARK_CAPTURE(computeSynchronous, one, 1, false)->Name("row_slices_compute/threads_1")->UseRealTime();
 BENCHMARK_CAPTURE(computeSynchronous, two, 2, false)->Name("row_slices_compute/threads_2")->UseRealTime();
 BENCHMARK_CAPTURE(computeAsynchronous, two, 2)->Name("row_slices_compute/threads_2_async")->UseRealTime();

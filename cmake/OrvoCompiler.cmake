@@ -30,7 +30,7 @@ set(ORVO_AVX2_OPTIONS -mavx2 -mf16c)
 set(ORVO_AVX512_OPTIONS -mavx512f -mavx512bw -mavx512dq -mavx512vl -mf16c)
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
     # GCC 12 warns of uninitialised values inside its own intrinsics (its bug 105593).
-    list(APPEND ORVO_AVX512_OPTIONS -Wno-maybe-uninitialized)
+    list(APPEND ORVO_AVX512_OPTIONS -Wno-uninitialized -Wno-maybe-uninitialized)
 endif()
 
 if(ORVO_SANITIZE STREQUAL "address")

@@ -17,6 +17,8 @@ function(orvo_add_layer name)
     set_target_properties(${target} PROPERTIES
         POSITION_INDEPENDENT_CODE ON
         CXX_VISIBILITY_PRESET hidden
+        UNITY_BUILD "${ORVO_UNITY_BUILD}"
+        UNITY_BUILD_BATCH_SIZE 12
         VISIBILITY_INLINES_HIDDEN ON)
     target_compile_definitions(${target} PRIVATE orvo_EXPORTS)
     target_include_directories(${target} PUBLIC

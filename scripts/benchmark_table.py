@@ -8,9 +8,11 @@ Medians, where a benchmark was repeated. Columns:
   per item   the same divided by the items of one run (pixels, rows, nodes: as the program counts them)
   GB/s       bytes read plus bytes written, in 10^9 bytes a second
   memcpy     time, as a multiple of what memcpy takes for the same bytes in the same program run: the benchmarks
-             named "memcpy/<bytes>", of which the one nearest in size is taken
+             named "memcpy/<bytes>", of which the one nearest in size is taken; or the counter "to_memcpy" of a
+             program that measured the two by turns
   plain      how many times faster than the plain version: the benchmark whose name differs in one part alone, which
              is "plain" or, where there is none, "threads_1"; per item, where items are counted
+  notes      label and counters of the program
 """
 
 import json
@@ -19,6 +21,12 @@ import sys
 
 TIME_UNITS = {"ns": 1e-9, "us": 1e-6, "ms": 1e-3, "s": 1.0}
 BASELINES = ("plain", "threads_1")
+
+# What Google Benchmark writes of its own; every other number of an entry is a counter of the program.
+OWN_NUMBERS = {
+    "family_index", "per_family_instance_index", "repetitions", "repetition_index", "threads", "iterations",
+    "real_time", "cpu_time", "bytes_per_second", "items_per_second", "to_memcpy",
+}
 
 
 class Row:
@@ -29,7 +37,10 @@ class Row:
         self.seconds = entry["real_time"] * TIME_UNITS[entry["time_unit"]]
         self.bytes_per_second = entry.get("bytes_per_second")
         self.items_per_second = entry.get("items_per_second")
-        self.label = entry.get("label", "")
+        self.to_memcpy = entry.get("to_memcpy")
+        counters = [f"{key} {value:.4g}" for key, value in entry.items()
+                    if isinstance(value, (int, float)) and not isinstance(value, bool) and key not in OWN_NUMBERS]
+        self.notes = ", ".join(filter(None, [entry.get("label", ""), *counters]))
         self.failure = entry.get("error_message", "skipped") if entry.get("error_occurred") else None
 
     @property
@@ -56,6 +67,8 @@ def read_rows(path):
 
 def memcpy_ratio(row, rows):
     """Time of the row as a multiple of memcpy's for the same bytes; None where there is nothing to compare."""
+    if row.to_memcpy:
+        return row.to_memcpy
     copies = [other for other in rows if other.name.startswith("memcpy/") and other.bytes]
     if not row.bytes or not copies or row in copies:
         return None
@@ -66,15 +79,13 @@ def memcpy_ratio(row, rows):
 def find_baseline(row, rows):
     """The plain version of the row: equal in all parts of the name but one, which is the baseline's mark."""
     parts = row.name.split("/")
-    if any(mark in parts for mark in BASELINES):
-        return None
     for mark in BASELINES:
         for other in rows:
             other_parts = other.name.split("/")
             if len(other_parts) != len(parts) or mark not in other_parts:
                 continue
             differing = [i for i, part in enumerate(parts) if part != other_parts[i]]
-            if len(differing) == 1 and other_parts[differing[0]] == mark:
+            if len(differing) == 1 and other_parts[differing[0]] == mark and parts[differing[0]] not in BASELINES:
                 return other
     return None
 
@@ -99,7 +110,7 @@ def format_seconds(seconds):
 def cells(row, rows):
     """The texts of the row's columns."""
     if row.failure:
-        return [row.name, row.failure, "", "", "", "", row.label]
+        return [row.name, row.failure, "", "", "", "", row.notes]
     memcpy, plain = memcpy_ratio(row, rows), plain_ratio(row, rows)
     return [
         row.name,
@@ -108,12 +119,12 @@ def cells(row, rows):
         f"{row.bytes_per_second / 1e9:.1f}" if row.bytes_per_second else "",
         f"{memcpy:.2f} x" if memcpy else "",
         f"{plain:.2f} x" if plain else "",
-        row.label,
+        row.notes,
     ]
 
 
 def print_table(lines):
-    header = ["benchmark", "time", "per item", "GB/s", "memcpy", "plain", ""]
+    header = ["benchmark", "time", "per item", "GB/s", "memcpy", "plain", "notes"]
     widths = [max(len(line[i]) for line in [header, *lines]) for i in range(len(header))]
 
     def print_line(line):

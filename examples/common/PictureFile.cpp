@@ -108,8 +108,7 @@ std::unique_ptr<OIIO::ImageOutput> outputFor(std::string const& path) {
     return output;
 }
 
-fs::path temporaryBeside(std::string const& path)
-{
+fs::path temporaryBeside(std::string const& path) {
     fs::path const target(path);
     std::string name(1, '.');
     name += target.stem().string();

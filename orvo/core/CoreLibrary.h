@@ -39,6 +39,8 @@ public:
 };
 
 /// Starts the base library in its constructor and stops it in its destructor, unless it was released.
+///
+/// Threads: as Library::initialize and Library::terminate.
 class ORVO_API AutoInitializer {
 public:
     /// Library::initialize(), with its failures.

@@ -9,12 +9,11 @@ namespace ORVO::ImageRuntime {
 /// Its capacity is at least the width rounded up to four pixels, so that a vector loop may run over a whole
 /// group of four past the last pixel. The pixels are not cleared. The caller owns the image and frees it with
 /// ORVODeleter<ImageCPU>.
-/// @param channels 1 gives luminance, 2 luminance and alpha, 3 RGB, 4 RGBA; any other count throws
-/// InternalException
-///        "false".
+/// @param channels 1 gives luminance, 2 luminance and alpha, 3 RGB, 4 RGBA.
 /// @param extent width and height in pixels.
 /// @param pixelExtent the world size of one pixel.
 /// @param position the top-left pixel, in pixel space.
+/// @throws InternalException "false" for any other number of channels.
 /// @throws as the constructor of ImageCPU: ParameterException for negative and for too large extents.
 /// Threads: may be called from any thread.
 ORVO_API ImageCPU* getBlankSIMDOptimized32FFormat(int channels, ExtentInPixelSpace const& extent,

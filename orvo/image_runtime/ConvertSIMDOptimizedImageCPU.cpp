@@ -106,8 +106,11 @@ void convertRows(ImageCPU const& input, ImageCPU& output, Range const& range,
 }
 
 void convertToFloats(ImageCPU const& input, ImageCPU& output, Range const& range) {
+    std::size_t const nInputBits = channelSizeBits(input.pixelFormat());
+    enforceFloats(output, "channelSizeBits( pOutputImage->pixelFormat() ) == 32");
+    enforceSameChannels(input, output);
     RowKernels const& kernels = rowKernels();
-    switch (channelSizeBits(input.pixelFormat())) {
+    switch (nInputBits) {
     case 8:
         return convertRows(input, output, range, kernels.floatFromUInt8);
     case 16:
@@ -120,8 +123,11 @@ void convertToFloats(ImageCPU const& input, ImageCPU& output, Range const& range
 }
 
 void convertFromFloats(ImageCPU const& input, ImageCPU& output, Range const& range) {
+    std::size_t const nOutputBits = channelSizeBits(output.pixelFormat());
+    enforceFloats(input, "channelSizeBits( inputImage.pixelFormat() ) == 32");
+    enforceSameChannels(input, output);
     RowKernels const& kernels = rowKernels();
-    switch (channelSizeBits(output.pixelFormat())) {
+    switch (nOutputBits) {
     case 8:
         return convertRows(input, output, range, kernels.uInt8FromFloat);
     case 16:
@@ -158,8 +164,6 @@ void convertImageToSIMDOptimized32FFormat(ImageCPU const& inputImage, ImageCPU* 
                "int( pOutputImage->capacityExtent().width() ) >= incrementToBoundary( int( "
                "pOutputImage->extent().width() ), 4 )");
     ORVO_CHECK(isAligned(pOutputImage->pixels(), 16), "isAligned( pOutputImage->pixels(), 16 )");
-    enforceFloats(*pOutputImage, "channelSizeBits( pOutputImage->pixelFormat() ) == 32");
-    enforceSameChannels(inputImage, *pOutputImage);
     convertToFloats(inputImage, *pOutputImage, range);
 }
 
@@ -183,8 +187,6 @@ void convertImageFromSIMDOptimized32FFormat(ImageCPU const& inputImage, ImageCPU
     ORVO_ENFORCE(pOutputImage);
     Range const range{beginX, endX, beginY, endY};
     enforceRangeInImages(range, inputImage, *pOutputImage);
-    enforceFloats(inputImage, "channelSizeBits( inputImage.pixelFormat() ) == 32");
-    enforceSameChannels(inputImage, *pOutputImage);
     convertFromFloats(inputImage, *pOutputImage, range);
 }
 

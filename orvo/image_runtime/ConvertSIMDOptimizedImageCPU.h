@@ -25,19 +25,17 @@ ORVO_API void convertImageToSIMDOptimized32FFormat(ImageCPU const& inputImage, I
 
 /// Converts a rectangle.
 /// @param inputImage 8-bit or 16-bit integers or 32-bit floats.
-/// @param pOutputImage 32-bit floats of the same number of channels, its storage on a 16-byte boundary and
-/// its capacity
-///        at least its width rounded up to four. Not owned.
-/// @throws InternalException with the text of the check, if the rectangle leaves either image or the output
-/// is not of
-///         that kind.
+/// @param pOutputImage 32-bit floats of the same number of channels, with storage on a 16-byte boundary and a
+///        capacity of at least the width rounded up to four. Not owned.
+/// @throws InternalException with the text of the check, if the rectangle leaves either image, or the output
+///         is not of that kind.
 ORVO_API void convertImageToSIMDOptimized32FFormat(ImageCPU const& inputImage, ImageCPU* pOutputImage,
                                                    int beginX, int endX, int beginY, int endY);
 
 /// A new image of the given format with the rectangle, pixel extent and capacity of the input. The caller
 /// owns it and frees it with ORVODeleter<ImageCPU>.
-/// @throws InternalException as nChannels() and channelSizeBits() do, and if the channels differ. @throws
-/// std::bad_alloc.
+/// @throws InternalException as nChannels() and channelSizeBits() do, and if the channels differ.
+/// @throws std::bad_alloc.
 ORVO_API ImageCPU* convertImageFromSIMDOptimized32FFormat(ImageCPU const& inputImage,
                                                           ImageCPU::tePixelFormat ePixelFormat);
 
@@ -47,8 +45,8 @@ ORVO_API void convertImageFromSIMDOptimized32FFormat(ImageCPU const& inputImage,
 /// Converts a rectangle.
 /// @param inputImage 32-bit floats; neither capacity nor alignment is checked.
 /// @param pOutputImage 8-bit or 16-bit integers or 32-bit floats, of the same number of channels. Not owned.
-/// @throws InternalException with the text of the check, if the rectangle leaves either image or the images
-/// do not fit.
+/// @throws InternalException with the text of the check, if the rectangle leaves either image, or the images
+///         do not fit.
 ORVO_API void convertImageFromSIMDOptimized32FFormat(ImageCPU const& inputImage, ImageCPU* pOutputImage,
                                                      int beginX, int endX, int beginY, int endY);
 

@@ -15,4 +15,6 @@
 #include "orvo/image_runtime/images/ImageReadAccessor.h"
 #include "orvo/image_runtime/images/ImageWriteAccessor.h"
 #include "orvo/image_runtime/images/PixelStructures.h"
+#include "orvo/image_runtime/kernels/InstructionSet.h"
+#include "orvo/image_runtime/kernels/RowKernels.h"
 #include "orvo/image_runtime/kernels/Rows.h"

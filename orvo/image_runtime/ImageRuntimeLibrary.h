@@ -37,12 +37,11 @@ public:
     /// Starts the library.
     /// @param vpContext the contexts, at least one; a null context only as the single one. Not owned.
     /// @param configuration what the texture pools are made with.
-    /// @throws InternalException "Core::Library::isInitialized()", "OGL::Library::isInitialized()",
-    /// "vpContext.size()"
-    ///         (an empty list), "!pvDeviceObject_" (started already) or "vpContext.size() == 1" (a null
-    ///         context beside others), in this order; the library stays as it was.
+    /// @throws InternalException, in this order, "Core::Library::isInitialized()",
+    ///         "OGL::Library::isInitialized()", "vpContext.size()" (an empty list), "!pvDeviceObject_"
+    ///         (started already), "vpContext.size() == 1" (a null context beside others).
     /// @throws ResourceException "OpenGL contexts are not supported by this version." for any context that is
-    /// not null.
+    ///         not null. Whatever is thrown, the library stays as it was.
     static void initialize(std::vector<OGL::Context const*> const& vpContext,
                            VideoMemory::Configuration const& configuration);
     /// The same with a list of one.
@@ -52,6 +51,7 @@ public:
     /// @throws InternalException "Core::Library::isInitialized()" or "OGL::Library::isInitialized()".
     static void terminate();
 
+    /// Whether the library is started.
     static bool isInitialized();
 
     /// The contexts that the library was started with, in order, null included.
@@ -68,6 +68,7 @@ public:
     /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started.
     static ShaderManagerOGL* shaderManager();
 
+    /// Kept for hosts that know them: the library neither reads nor writes them.
     static bool bNativeIntrinsicsRegistered_;
     static bool bInterpretedIntrinsicsRegistered_;
 

@@ -21,14 +21,14 @@ std::size_t bytesOf(ImageDescriptor::eChannelType type) {
 }
 
 /// The smallest rectangle around both; an empty one adds nothing.
-Picture around(Picture const& a, Picture const& b) {
+RasterValues around(RasterValues const& a, RasterValues const& b) {
     if (a.width == 0 || a.height == 0) {
         return b;
     }
     if (b.width == 0 || b.height == 0) {
         return a;
     }
-    Picture result = a;
+    RasterValues result = a;
     result.x = std::min(a.x, b.x);
     result.y = std::min(a.y, b.y);
     result.width = std::max(a.x + a.width, b.x + b.width) - result.x;
@@ -36,7 +36,7 @@ Picture around(Picture const& a, Picture const& b) {
     return result;
 }
 
-PositionExtentInWorldSpace worldOf(Picture const& rect, float pixelSize) {
+PositionExtentInWorldSpace worldOf(RasterValues const& rect, float pixelSize) {
     return {
         PositionInWorldSpace(static_cast<float>(rect.x) * pixelSize, static_cast<float>(rect.y) * pixelSize),
         ExtentInWorldSpace(static_cast<float>(rect.width) * pixelSize,
@@ -45,20 +45,20 @@ PositionExtentInWorldSpace worldOf(Picture const& rect, float pixelSize) {
 
 } // namespace
 
-std::size_t Picture::index(int px, int py, std::size_t channel) const {
+std::size_t RasterValues::index(int px, int py, std::size_t channel) const {
     return (static_cast<std::size_t>(py - y) * static_cast<std::size_t>(width) +
             static_cast<std::size_t>(px - x)) *
                channels +
            channel;
 }
 
-float Picture::at(int px, int py, std::size_t channel) const {
+float RasterValues::at(int px, int py, std::size_t channel) const {
     return contains(px, py) ? values[index(px, py, channel)] : 0.0f;
 }
 
 // ---- Images
 
-AnyImage::AnyImage(ImageDescriptor::eChannelType type, float pixelSize, Picture const& picture)
+AnyImage::AnyImage(ImageDescriptor::eChannelType type, float pixelSize, RasterValues const& picture)
     : eType_(type),
       oRect_(picture),
       aBytes_(static_cast<std::size_t>(picture.width) * static_cast<std::size_t>(picture.height) *
@@ -72,7 +72,7 @@ AnyImage::AnyImage(ImageDescriptor::eChannelType type, float pixelSize, Picture 
     store(picture);
 }
 
-void AnyImage::store(Picture const& picture) {
+void AnyImage::store(RasterValues const& picture) {
     for (std::size_t i = 0; i < picture.values.size(); ++i) {
         unsigned char* const pChannel = aBytes_.data() + i * bytesOf(eType_);
         float const value = picture.values[i];
@@ -87,8 +87,8 @@ void AnyImage::store(Picture const& picture) {
     }
 }
 
-Picture AnyImage::load() const {
-    Picture picture = oRect_;
+RasterValues AnyImage::load() const {
+    RasterValues picture = oRect_;
     picture.values.resize(aBytes_.size() / bytesOf(eType_));
     for (std::size_t i = 0; i < picture.values.size(); ++i) {
         unsigned char const* const pChannel = aBytes_.data() + i * bytesOf(eType_);
@@ -137,8 +137,8 @@ float RandomGraph::randomValue() {
     return 0.25f * static_cast<float>(random(0, 40));
 }
 
-Picture RandomGraph::randomRect() {
-    Picture rect;
+RasterValues RandomGraph::randomRect() {
+    RasterValues rect;
     rect.x = random(-4, 4);
     rect.y = random(-4, 4);
     rect.width = random(1, 9);
@@ -256,7 +256,7 @@ void RandomGraph::bindNewImage(Node& node) {
 }
 
 void RandomGraph::repaint(Node& node) {
-    Picture picture = node.spImage->rect();
+    RasterValues picture = node.spImage->rect();
     picture.values.resize(static_cast<std::size_t>(picture.width) * static_cast<std::size_t>(picture.height) *
                           picture.channels);
     for (float& value : picture.values) {
@@ -271,7 +271,7 @@ void RandomGraph::bindNewOutput() {
     if (spOutput_) {
         aOldImages_.push_back(spOutput_);
     }
-    Picture const rect = randomRect();
+    RasterValues const rect = randomRect();
     spOutput_ = std::make_shared<AnyImage>(eType_, fPixelSize_, rect);
     spSink_->setImage(spOutput_->handle());
     oRequested_ = rect;
@@ -390,16 +390,16 @@ float RandomGraph::quantised(float value) const {
                : std::min(std::max(std::nearbyint(value), 0.0f), highest);
 }
 
-Picture RandomGraph::evaluateDomain(Node const& node, std::vector<Picture> const& inputs) const {
-    Picture domain;
+RasterValues RandomGraph::evaluateDomain(Node const& node, std::vector<RasterValues> const& inputs) const {
+    RasterValues domain;
     if (node.kind == SOURCE) {
         domain = node.spImage->rect();
     } else if (node.kind == GENERATOR) {
         domain.width = static_cast<int>(node.width);
         domain.height = static_cast<int>(node.height);
     } else {
-        for (Picture const& input : inputs) {
-            Picture grown = input;
+        for (RasterValues const& input : inputs) {
+            RasterValues grown = input;
             int const margin = node.kind == BLUR ? node.count : 0;
             grown.x -= margin;
             grown.y -= margin;
@@ -413,7 +413,7 @@ Picture RandomGraph::evaluateDomain(Node const& node, std::vector<Picture> const
     return domain;
 }
 
-float RandomGraph::evaluatePixel(Node const& node, std::vector<Picture> const& inputs, int x, int y,
+float RandomGraph::evaluatePixel(Node const& node, std::vector<RasterValues> const& inputs, int x, int y,
                                  std::size_t channel) const {
     switch (node.kind) {
     case GENERATOR:
@@ -443,16 +443,16 @@ float RandomGraph::evaluatePixel(Node const& node, std::vector<Picture> const& i
     return 0.0f;
 }
 
-Picture RandomGraph::evaluate(Node const& node, std::map<Node const*, Picture>& known) {
+RasterValues RandomGraph::evaluate(Node const& node, std::map<Node const*, RasterValues>& known) {
     auto const iKnown = known.find(&node);
     if (iKnown != known.end()) {
         return iKnown->second;
     }
-    std::vector<Picture> inputs;
+    std::vector<RasterValues> inputs;
     for (Node const* const pInput : node.aInputs) {
         inputs.push_back(evaluate(*pInput, known));
     }
-    Picture result = evaluateDomain(node, inputs);
+    RasterValues result = evaluateDomain(node, inputs);
     if (node.kind == SOURCE) {
         result = node.spImage->load();
     } else {
@@ -468,15 +468,15 @@ Picture RandomGraph::evaluate(Node const& node, std::map<Node const*, Picture>& 
 }
 
 void RandomGraph::spoilOutput() {
-    Picture spoiled = spOutput_->load();
+    RasterValues spoiled = spOutput_->load();
     std::fill(spoiled.values.begin(), spoiled.values.end(), kSpoiled);
     spOutput_->store(spoiled);
 }
 
-Picture RandomGraph::expectedOutput() {
-    std::map<Node const*, Picture> known;
-    Picture const result = evaluate(*pTop_, known);
-    Picture expected = spOutput_->load();
+RasterValues RandomGraph::expectedOutput() {
+    std::map<Node const*, RasterValues> known;
+    RasterValues const result = evaluate(*pTop_, known);
+    RasterValues expected = spOutput_->load();
     for (int y = expected.y; y < expected.y + expected.height; ++y) {
         for (int x = expected.x; x < expected.x + expected.width; ++x) {
             for (std::size_t channel = 0; channel < nChannels_; ++channel) {
@@ -497,8 +497,8 @@ bool RandomGraph::isOutputRight() {
 
 std::string RandomGraph::describeDifference() {
     static char const* const kNames[] = {"source", "generator", "add", "gain", "blur", "mix", "simd gain"};
-    Picture const expected = expectedOutput();
-    Picture const computed = spOutput_->load();
+    RasterValues const expected = expectedOutput();
+    RasterValues const computed = spOutput_->load();
     std::ostringstream text;
     for (std::size_t i = 0; i < expected.values.size(); ++i) {
         if (std::memcmp(&expected.values[i], &computed.values[i], sizeof(float)) != 0) {

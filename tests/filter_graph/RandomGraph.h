@@ -12,7 +12,7 @@
 namespace ORVO::Test {
 
 /// A rectangle of pixels with its values, as the reference computes them.
-struct Picture {
+struct RasterValues {
     int x = 0;
     int y = 0;
     int width = 0;
@@ -30,17 +30,17 @@ struct Picture {
 /// A client image of one of the channel types, with pixels of its own.
 class AnyImage {
 public:
-    AnyImage(FilterGraph::ImageDescriptor::eChannelType type, float pixelSize, Picture const& picture);
+    AnyImage(FilterGraph::ImageDescriptor::eChannelType type, float pixelSize, RasterValues const& picture);
 
     FilterGraph::ImageCPU* handle() { return &oHandle_; }
-    Picture const& rect() const { return oRect_; }
+    RasterValues const& rect() const { return oRect_; }
 
-    void store(Picture const& picture);
-    Picture load() const;
+    void store(RasterValues const& picture);
+    RasterValues load() const;
 
 private:
     FilterGraph::ImageDescriptor::eChannelType eType_;
-    Picture oRect_; // without values
+    RasterValues oRect_; // without values
     std::vector<unsigned char> aBytes_;
     FilterGraph::ImageCPU oHandle_;
 };
@@ -95,7 +95,7 @@ private:
     int random(int low, int high);
     bool chance(int percent) { return random(1, 100) <= percent; }
     float randomValue();
-    Picture randomRect();
+    RasterValues randomRect();
 
     Node* makeNode(int rank);
     eKind randomKind();
@@ -109,12 +109,12 @@ private:
     void reconnect();
     void removeUnreachable();
 
-    Picture evaluate(Node const& node, std::map<Node const*, Picture>& known);
-    Picture evaluateDomain(Node const& node, std::vector<Picture> const& inputs) const;
-    float evaluatePixel(Node const& node, std::vector<Picture> const& inputs, int x, int y,
+    RasterValues evaluate(Node const& node, std::map<Node const*, RasterValues>& known);
+    RasterValues evaluateDomain(Node const& node, std::vector<RasterValues> const& inputs) const;
+    float evaluatePixel(Node const& node, std::vector<RasterValues> const& inputs, int x, int y,
                         std::size_t channel) const;
     float quantised(float value) const;
-    Picture expectedOutput();
+    RasterValues expectedOutput();
 
     std::minstd_rand oRandom_;
     IAdapter::eRegionSyncMode eMode_;
@@ -130,7 +130,7 @@ private:
     Node* pTop_ = nullptr; // what feeds the sink
     SinkPtr spSink_;
     std::shared_ptr<AnyImage> spOutput_;
-    Picture oRequested_; // what the sink is asked for, without values
+    RasterValues oRequested_; // what the sink is asked for, without values
     std::vector<std::shared_ptr<AnyImage>> aOldImages_;
 };
 

@@ -103,7 +103,12 @@ private:
         std::this_thread::sleep_for(std::chrono::microseconds(pick(100)));
         processor().cancelFrame();
         if (pick(2) == 0) {
-            processor().waitForFrame(60.0, 0.0001);
+            // The launch has to join the cancelled frame.
+            launch();
+            processor().cancelFrame();
+        }
+        // The images belong to the frame until it has ended.
+        while (processor().waitForFrame(1.0, 0.0001) != IProcessorBase::FRAME_COMPLETE) {
         }
     }
 

@@ -247,6 +247,21 @@ TEST_P(Conversions, RefuseToHaveNoOutput) {
     ORVO_EXPECT_INTERNAL(GetParam().convert(from, nullptr, 0, 4, 0, 4), "Enforce pOutputImage != NULL");
 }
 
+TEST(ConvertSIMDOptimized, RefusesToHaveNoOutputForAWholeImage) {
+    ImageCPU const from(ImageCPU::PIXEL_FORMAT_RGBA32F, rectangle(0, 0, 4, 4), oUnit, ExtentInPixelSpace());
+    ImageCPU* const pNone = nullptr;
+    ORVO_EXPECT_INTERNAL(convertImageToSIMDOptimized32FFormat(from, pNone), "Enforce pOutputImage != NULL");
+    ORVO_EXPECT_INTERNAL(convertImageFromSIMDOptimized32FFormat(from, pNone), "Enforce pOutputImage != NULL");
+}
+
+TEST(ConvertSIMDOptimized, AsksForTheChannelBitsFirstOfAllPropertiesOfTheFormats) {
+    ImageCPU undefined;
+    ImageCPU floats(ImageCPU::PIXEL_FORMAT_RGBA32F, rectangle(0, 0, 0, 0), oUnit, ExtentInPixelSpace());
+    char const* const sText = "Not implemented: ePixelFormat in channelSizeBits().";
+    ORVO_EXPECT_INTERNAL(convertImageToSIMDOptimized32FFormat(undefined, &floats), sText);
+    ORVO_EXPECT_INTERNAL(convertImageFromSIMDOptimized32FFormat(floats, &undefined), sText);
+}
+
 TEST_P(Conversions, RefuseImagesOfDifferentChannels) {
     ImageCPU const from = input(rectangle(0, 0, 4, 4));
     for (Format const eFormat : FLOATS) {
@@ -419,6 +434,22 @@ TEST(ConvertFromSIMDOptimized, TruncatesAndWrapsBesideTheGroups) {
     for (int i = 0; i < 8; ++i) {
         EXPECT_EQ(expected[i], bytes->pixels()[i]) << i;
     }
+}
+
+TEST(ConvertSIMDOptimized, TakesMemoryOfTheCallerAtAnyAddress) {
+    std::uint16_t const words[] = {0, 32768, 16384, 8192, 1, 24576, 4096};
+    unsigned char aInput[sizeof(words) + 1] = {};
+    std::memcpy(aInput + 1, words, sizeof(words));
+    ImageCPU const odd(ImageCPU::PIXEL_FORMAT_LUMINANCE16, aInput + 1, rectangle(0, 0, 7, 1), oUnit,
+                       ExtentInPixelSpace());
+    Owned const floats(convertImageToSIMDOptimized32FFormat(odd));
+    EXPECT_EQ(0.25f, floatAt(*floats, 3, 0, 0));
+
+    unsigned char aOutput[sizeof(words) + 1] = {};
+    ImageCPU back(ImageCPU::PIXEL_FORMAT_LUMINANCE16, aOutput + 1, rectangle(0, 0, 7, 1), oUnit,
+                  ExtentInPixelSpace());
+    convertImageFromSIMDOptimized32FFormat(*floats, &back);
+    EXPECT_EQ(0, std::memcmp(words, aOutput + 1, sizeof(words)));
 }
 
 TEST(ConvertFromSIMDOptimized, RefusesInputsThatAreNoFloats) {

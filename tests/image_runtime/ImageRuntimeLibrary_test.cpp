@@ -37,6 +37,8 @@ TEST(ImageRuntimeLibrary, StartsOnTheCPUAlone) {
     EXPECT_EQ(nullptr, Library::texturePool());
     EXPECT_EQ(nullptr, Library::shaderManager());
     EXPECT_EQ(Contexts(1, nullptr), Library::initializationContextList());
+    EXPECT_FALSE(Library::bNativeIntrinsicsRegistered_);
+    EXPECT_FALSE(Library::bInterpretedIntrinsicsRegistered_);
     Library::terminate();
     EXPECT_FALSE(Library::isInitialized());
 }

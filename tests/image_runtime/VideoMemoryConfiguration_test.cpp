@@ -1,5 +1,7 @@
 #include "orvo/image_runtime/VideoMemoryConfiguration.h"
 
+#include "tests/support/Slots.h"
+
 #include <gtest/gtest.h>
 
 namespace ORVO::VideoMemory {
@@ -35,6 +37,13 @@ TEST(VideoMemoryConfiguration, KeepsWhatIsSet) {
     EXPECT_EQ(42u, copy.maximumTexturePoolSize());
     EXPECT_EQ(&listener, copy.videoMemoryListener());
     EXPECT_TRUE(copy.prohibitReuseLargerTextures());
+}
+
+TEST(VideoMemoryListener, HasItsOperationsInOrder) {
+    // The destructor stands first.
+    EXPECT_EQ(2, ORVO::Test::slotOf(&VideoMemoryListener::impendingMemoryAllcation));
+    EXPECT_EQ(3, ORVO::Test::slotOf(&VideoMemoryListener::memoryFreed));
+    EXPECT_EQ(4, ORVO::Test::slotOf(&VideoMemoryListener::memoryAllocated));
 }
 
 TEST(VideoMemoryListener, MayBeOverridden) {

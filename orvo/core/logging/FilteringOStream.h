@@ -14,7 +14,7 @@ namespace ORVO::Logging {
 ///         indented << child; // each line of it stands two blanks further right
 ///     }
 ///
-/// Takes over the other stream's number formats. The other stream must outlive it.
+/// Takes over the other stream's number formats and locale. The other stream must outlive it.
 ///
 /// Threads: one at a time.
 template <typename Inserter>
@@ -25,6 +25,7 @@ public:
         flags(stream.flags());
         precision(stream.precision());
         fill(stream.fill());
+        imbue(stream.getloc());
     }
 
     /// On a stream of this very class: nests, rather than copies.

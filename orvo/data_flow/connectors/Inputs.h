@@ -79,13 +79,13 @@ public:
     }
 
 protected:
-    /// The connected output as what it is for this data type. Throws `InternalException`
-    /// "Enforce pConnectedOutput_ != NULL" when unconnected.
-    OutputTemplate<T>& typedOutput() const {
+    /// The connected output as what it is for this data type, never null. Not owned. Throws
+    /// `InternalException` "Enforce pConnectedOutput_ != NULL" when unconnected.
+    OutputTemplate<T>* typedOutput() const {
         OutputConnector* const pOutput = this->connectedOutput();
         ORVO_ENFORCE(pOutput, "pConnectedOutput_");
         // The types were compared when the two were connected.
-        return static_cast<OutputTemplate<T>&>(*pOutput);
+        return static_cast<OutputTemplate<T>*>(pOutput);
     }
 
     /// Stores in `oDestination` what this input holds, and leaves the input empty.
@@ -116,7 +116,7 @@ public:
     using InputTemplate<T>::InputTemplate;
 
     /// Takes the object over from the connected output, or shares or copies it: `OutputTemplate<T>::moveTo`.
-    void fetchInput() override { this->typedOutput().moveTo(*this); }
+    void fetchInput() override { this->typedOutput()->moveTo(*this); }
 
     /// Shares the object of `oOutput`. Throws `InternalException` "!this->bound()" for a bound input.
     ConstInput& operator=(ConstOutput<T> const& oOutput) {
@@ -153,7 +153,7 @@ public:
     using InputTemplate<T>::operator*;
 
     /// Takes the object over from the connected output, or copies it: `OutputTemplate<T>::moveTo`.
-    void fetchInput() override { this->typedOutput().moveTo(*this); }
+    void fetchInput() override { this->typedOutput()->moveTo(*this); }
 
     /// The object, or null. Ownership stays here.
     T* get() { return this->spData_.get(); }

@@ -18,8 +18,7 @@ namespace ORVO::DataFlow {
 /// share it.
 ///
 /// Constness is passed on: a const pointer gives a const object. T needs a copy constructor where copies are
-/// made
-/// (`moveToMutable`); it may be incomplete where the pointer is only held.
+/// made (`moveToMutable`); it may be incomplete where the pointer is only held.
 ///
 /// Threads: the reference count is atomic, so copies may be held and dropped on any thread; one pointer
 /// object is used by one thread at a time.

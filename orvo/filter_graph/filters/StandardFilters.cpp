@@ -1,6 +1,8 @@
 #include "orvo/filter_graph/filters/StandardFilters.h"
 
+#include "orvo/core/Check.h"
 #include "orvo/filter_graph/filters/Bilateral.h"
+#include "orvo/filter_graph/impl/FilterEquality.h"
 #include "orvo/filter_graph/impl/FilterFactory.h"
 #include "orvo/filter_graph/internal/ImageFlowFilter.h"
 #include "orvo/filter_graph/internal/ImageFlowFilterWrapper.h"
@@ -8,6 +10,7 @@
 #include "orvo/image_flow/filters/ConvertFromSIMDOptimized.h"
 #include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
 
+#include <algorithm>
 #include <memory>
 #include <vector>
 
@@ -50,7 +53,15 @@ void insertStandardFilters() {
 
 void removeStandardFilters() {
     FilterFactory& factory = *FilterFactory::Instance();
-    for (auto const& prototype : standardPrototypes())
+    auto const prototypes = standardPrototypes();
+    // The first that is missing is refused, as by the factory itself, before anything is removed.
+    for (auto const& prototype : prototypes) {
+        auto const registered = static_cast<FilterFactory const&>(factory).prototypes();
+        bool const isRegistered =
+            std::any_of(registered.begin(), registered.end(), FilterEquality(prototype->identifier()));
+        ORVO_CHECK(isRegistered, "iter != aFilters_.end()");
+    }
+    for (auto const& prototype : prototypes)
         factory.remove(prototype->identifier());
 }
 

@@ -7,26 +7,34 @@ namespace ORVO::FilterGraph {
 /// Registers the filters that come with the library with FilterFactory::Instance(), so that a host creates
 /// them by name:
 ///
-/// | name | namespace, vendor | what it does |
-/// |---|---|---|
-/// | "FastBilateralBlur" | "Motion Loft", "Norvane Works" | the bilateral filter that suits the processing
-/// mode | | "FastBilateralFilter" | "ImageFlow", "Norvane" | the bilateral grid node by itself | |
-/// "SimpleBilateralCPU" | "ImageFlow", "Norvane" | the direct bilateral filter | | "RGBToLABCPU",
-/// "LABToRGBCPU" | "ImageFlow", "Norvane" | conversion of sRGB to scaled Lab and back | |
-/// "ConvertToSIMDOptimized" | "ImageFlow", "Norvane" | 8-bit or 16-bit integers to 32-bit float | |
-/// "ConvertFromSIMDOptimized" | "ImageFlow", "Norvane" | 32-bit float to the depth of the output image |
+/// name space and vendor "Motion Loft", "Norvane Works":
+/// - "FastBilateralBlur": the bilateral filter that suits the processing mode.
 ///
-/// All have version 1. The two converters serve hosts that bind 16-bit integer images to filters that read
-/// 8-bit and float images alone, which is all bilateral and Lab filters.
+/// name space and vendor "ImageFlow", "Norvane":
+/// - "FastBilateralFilter": the bilateral grid node by itself,
+/// - "SimpleBilateralCPU": the direct bilateral filter,
+/// - "RGBToLABCPU", "LABToRGBCPU": conversion of sRGB to scaled Lab and back,
+/// - "ConvertToSIMDOptimized": 8-bit or 16-bit integers to 32-bit float,
+/// - "ConvertFromSIMDOptimized": 32-bit float to the depth of the output image.
 ///
-/// Library::initialize does not call this. Throws Exception if one of them is registered already, and
-/// InternalException while the library is down; the factory is then as it was.
+/// All have version 1. The bilateral and Lab filters read and write 8-bit and float images alone, and every
+/// filter works in the depth of the image that its graph ends in. A host with 16-bit images puts
+/// "ConvertToSIMDOptimized" in front of them, ends the graph in a float image, and brings that back to 16
+/// bits with a graph that has no filter between input and output.
+///
+/// Library::initialize does not call this.
+/// @throws Exception if one of them is registered already, InternalException "isInitialized()" while the
+/// library is down; the factory is then as it was.
+///
 /// Threads: as the factory, from one thread at a time.
 ORVO_API void insertStandardFilters();
 
-/// Removes what insertStandardFilters registered; filters made from them stay alive. Throws InternalException
-/// at the first one that is not registered. Library::terminate removes all prototypes by itself. Threads: as
-/// the factory, from one thread at a time.
+/// Removes what insertStandardFilters registered; filters made from them stay alive. Library::terminate
+/// removes all prototypes by itself.
+/// @throws InternalException "iter != aFilters_.end()" if one of them is not registered; nothing is removed
+/// then.
+///
+/// Threads: as the factory, from one thread at a time.
 ORVO_API void removeStandardFilters();
 
 } // namespace ORVO::FilterGraph

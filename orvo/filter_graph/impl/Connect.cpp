@@ -29,6 +29,8 @@ void Connect(std::shared_ptr<IFilter> const& src, std::shared_ptr<IOutputAdapter
     Internal::Connect(asFilter(src), asFilter(dst));
 }
 
+// The forms for adapters take their pointers by value: that is part of their signature.
+// NOLINTBEGIN(performance-unnecessary-value-param)
 void Connect(std::shared_ptr<IInputAdapter> src, Input* dst) { Internal::Connect(asFilter(src), dst); }
 
 void Connect(std::shared_ptr<IInputAdapter> src, std::shared_ptr<IFilter> dst) {
@@ -38,6 +40,8 @@ void Connect(std::shared_ptr<IInputAdapter> src, std::shared_ptr<IFilter> dst) {
 void Connect(std::shared_ptr<IInputAdapter> src, std::shared_ptr<IOutputAdapter> dst) {
     Internal::Connect(asFilter(src), asFilter(dst));
 }
+
+// NOLINTEND(performance-unnecessary-value-param)
 
 void Disconnect(Input* pInput) {
     ORVO_ENFORCE(pInput);

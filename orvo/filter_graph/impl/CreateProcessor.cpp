@@ -10,6 +10,8 @@
 
 namespace ORVO::FilterGraph {
 
+// The pointers are taken by value: that is part of the signatures.
+// NOLINTBEGIN(performance-unnecessary-value-param)
 std::shared_ptr<IProcessor> createProcessor(std::shared_ptr<IOutputAdapter> output,
                                             OGL::Context const* context) {
     return std::make_shared<Internal::StandardProcessor>(dynamic_cast<Internal::OutputAdapter*>(output.get()),
@@ -21,5 +23,7 @@ std::shared_ptr<IEmbeddedProcessor> createEmbeddedProcessor(std::shared_ptr<IOut
     return std::make_shared<Internal::Processor>(dynamic_cast<Internal::OutputAdapter*>(output.get()),
                                                  IAdapter::REGION_SYNC_EXPLICIT, context);
 }
+
+// NOLINTEND(performance-unnecessary-value-param)
 
 } // namespace ORVO::FilterGraph

@@ -17,7 +17,7 @@ public:
     DataDescriptor() = default;
 
     /// A connection in a named colour space; the channel count is the one of that space.
-    /// @throws InternalException if `colorSpace` is none of the known spaces.
+    /// @throws ParameterException "Unknown color space" if `colorSpace` is none of the known spaces.
     explicit DataDescriptor(ColorSpace colorSpace);
 
     /// A connection of `nChannels` channels of no named colour space (the colour space value 6).

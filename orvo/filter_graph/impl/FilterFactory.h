@@ -16,8 +16,8 @@ class Library;
 /// The collection of filter prototypes, one for the whole process, from which a host creates its filters:
 ///
 ///     FilterFactory* factory = FilterFactory::Instance();
-///     std::shared_ptr<IFilter> blur = factory->create({"FastBilateralBlur", "Motion Loft", "Norvane
-///     Works"});
+///     IFilter::Identifier const anyVersion("FastBilateralBlur", "Motion Loft", "Norvane Works");
+///     std::shared_ptr<IFilter> blur = factory->create(anyVersion);
 ///
 /// The factory stores a clone of each filter that it is given and hands out clones of what it stores, so
 /// neither the caller's filters nor the prototypes are ever part of a graph. Versions of one filter stand

@@ -12,9 +12,10 @@ namespace ORVO::FilterGraph {
 /// handle has it.
 ///
 ///     std::vector<unsigned char> pixels(4 * width * height);
-///     ImageDescriptorCPU const rgba8({4, ImageDescriptor::CHANNEL_TYPE_UINT8}, PixelExtentInWorldSpace(1,
-///     1)); PositionExtentInPixelSpace const rect(ExtentInPixelSpace(width, height)); ImageCPU image(rgba8,
-///     rect, pixels.data(), 0);
+///     ImageDescriptor::Format const format = {4, ImageDescriptor::CHANNEL_TYPE_UINT8};
+///     ImageDescriptorCPU const rgba8(format, PixelExtentInWorldSpace(1, 1));
+///     PositionExtentInPixelSpace const rect(ExtentInPixelSpace(width, height));
+///     ImageCPU image(rgba8, rect, pixels.data(), 0);
 ///
 /// Rows stand one after the other, top row first, each `paddedWidthInBytes` long. That pitch should be a
 /// whole number of pixels: a rest is cut off. The channels of a pixel are interleaved: grey; grey, alpha; R,

@@ -31,8 +31,9 @@ MetadataItem<T> const& MetadataItemBase::as() const {
     return static_cast<MetadataItem<T> const&>(*this);
 }
 
-// The instances are made once, in the library.
-#define ORVO_EXTERN_METADATA_ITEM(T) extern template class MetadataItem<T>;
+// The instances are made once, in the library. They name their visibility themselves, which value types
+// without one of their own would otherwise take away.
+#define ORVO_EXTERN_METADATA_ITEM(T) extern template class ORVO_API MetadataItem<T>;
 ORVO_FOR_EACH_DATA_ITEM_TYPE(ORVO_EXTERN_METADATA_ITEM)
 #undef ORVO_EXTERN_METADATA_ITEM
 

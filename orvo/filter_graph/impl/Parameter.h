@@ -41,8 +41,9 @@ Parameter<T> const& ParameterBase::as() const {
     return static_cast<Parameter<T> const&>(*this);
 }
 
-// The instances are made once, in the library.
-#define ORVO_EXTERN_PARAMETER(T) extern template class Parameter<T>;
+// The instances are made once, in the library. They name their visibility themselves, which value types
+// without one of their own would otherwise take away.
+#define ORVO_EXTERN_PARAMETER(T) extern template class ORVO_API Parameter<T>;
 ORVO_FOR_EACH_DATA_ITEM_TYPE(ORVO_EXTERN_PARAMETER)
 #undef ORVO_EXTERN_PARAMETER
 

@@ -4,6 +4,7 @@
 
 #include <iterator>
 #include <memory>
+#include <type_traits>
 #include <vector>
 
 namespace ORVO::FilterGraph {
@@ -38,7 +39,7 @@ public:
     RangeIterator(T first, T last) : iFirst_(first), iLast_(last), iCurrent_(first) {}
 
     /// The const form from the plain form, at its first element.
-    template <class Other>
+    template <class Other, std::enable_if_t<std::is_convertible_v<Other, T>, int> = 0>
     RangeIterator(RangeIterator<Other> const& other) : RangeIterator(T(other.begin()), T(other.end())) {}
 
     /// The first element, as an iterator of the vector.

@@ -1,7 +1,9 @@
 #pragma once
 
+#include <cstddef>
 #include <map>
 #include <memory>
+#include <vector>
 
 #include "orvo/filter_graph/internal/INodeVisitor.h"
 
@@ -13,8 +15,21 @@ namespace ORVO::FilterGraph::Internal {
 /// Threads: the thread that owns the graph.
 class ORVO_API CheckTimeStampVisitor : public INodeVisitor {
 public:
-    /// `pClones`: from filter to clone; not owned.
-    explicit CheckTimeStampVisitor(std::map<Filter*, std::shared_ptr<Filter>> const* pClones);
+    /// A filter and the time stamp at which its clone was made.
+    struct Entry {
+        Filter const* pFilter;
+        int clonedTimeStamp;
+    };
+
+    /// What a walk found, in the order of its visits. The next walk over the same clones meets the same
+    /// filters in the same order, unless the graph changed, and then needs no search. To be emptied together
+    /// with the clones.
+    using Memory = std::vector<Entry>;
+
+    /// `pClones`: from filter to clone. `pMemory`: that of the last walk over the same clones, or null.
+    /// Neither is owned.
+    explicit CheckTimeStampVisitor(std::map<Filter*, std::shared_ptr<Filter>> const* pClones,
+                                   Memory* pMemory = nullptr);
 
     /// Throws InternalException "Enforce spClone.get() != NULL" if the filter's entry holds no clone.
     void preVisit(Filter* pFilter) override;
@@ -25,8 +40,12 @@ public:
     ~CheckTimeStampVisitor() override;
 
 private:
+    bool isRemembered(Filter const* pFilter) const;
+
     std::map<Filter*, std::shared_ptr<Filter>> const* pClones_;
     bool bUpToDate_ = true;
+    Memory* pMemory_;
+    std::size_t nVisited_ = 0;
 };
 
 } // namespace ORVO::FilterGraph::Internal

@@ -68,8 +68,28 @@ void Filter::initialize() const {
     // Filters are never constant objects: constant is only the view of a prototype that the factory hands
     // out.
     auto* pSelf = const_cast<Filter*>(this);
-    pSelf->finishLazyInitialization();
+    Sizes const sizesBefore = {ownedInputs_.size(), ownedParameters_.size(), ownedMetadata_.size()};
+    try {
+        pSelf->finishLazyInitialization();
+    } catch (...) {
+        // Half a set-up would stand in the way of the next try.
+        pSelf->shrinkTo(sizesBefore);
+        throw;
+    }
     pSelf->initialized = true;
+}
+
+void Filter::shrinkTo(Sizes const& sizes) noexcept {
+    for (; ownedInputs_.size() > sizes.nInputs; ownedInputs_.pop_back())
+        if (pInputSet_)
+            pInputSet_->remove(ownedInputs_.back().get());
+    for (; ownedParameters_.size() > sizes.nParameters; ownedParameters_.pop_back())
+        if (pParameterSet_)
+            pParameterSet_->remove(ownedParameters_.back().get());
+    if (ownedMetadata_.size() > sizes.nMetadata) {
+        ownedMetadata_.resize(sizes.nMetadata);
+        metadata_.resize(sizes.nMetadata);
+    }
 }
 
 void Filter::assign(Filter const& other) {
@@ -77,7 +97,7 @@ void Filter::assign(Filter const& other) {
     cloneParameters(other, parts);
     cloneConnectors(other, parts);
     for (MetadataItemBase const* pItem : other.metadata())
-        parts.metadata.emplace_back(pItem->clone());
+        parts.metadata.push_back(OwnedMetadata(pItem->clone()));
     std::vector<MetadataItemBase const*> metadataView;
     for (OwnedMetadata const& item : parts.metadata)
         metadataView.push_back(item.get());
@@ -99,14 +119,14 @@ void Filter::assign(Filter const& other) {
 
 void Filter::cloneParameters(Filter const& other, Parts& parts) {
     for (ParameterBase* pParameter : other.parameters()) {
-        parts.parameters.emplace_back(pParameter->clone());
+        parts.parameters.push_back(OwnedParameter(pParameter->clone()));
         parts.parameterSet->insert(parts.parameters.back().get());
     }
 }
 
 void Filter::cloneConnectors(Filter const& other, Parts& parts) {
     for (Input* pInput : other.inputs()) {
-        parts.inputs.emplace_back(pInput->clone(this));
+        parts.inputs.push_back(OwnedInput(pInput->clone(this)));
         parts.inputSet->insert(parts.inputs.back().get());
     }
     ORVO_ENFORCE(other.pOutput_);
@@ -198,13 +218,10 @@ void Filter::updateNumChannelsOnInput(Input* pInput, std::size_t nChannel) {
 void Filter::addInput(std::string const& name, std::size_t nChannel) {
     Input const* existing = input(name);
     ORVO_CHECK(existing == nullptr, "existing==0");
-    ownedInputs_.emplace_back(ORVO_NEW Input(this, name, nChannel));
-    try {
-        inputSet().insert(ownedInputs_.back().get());
-    } catch (...) {
-        ownedInputs_.pop_back();
-        throw;
-    }
+    OwnedInput added(ORVO_NEW Input(this, name, nChannel));
+    ownedInputs_.reserve(ownedInputs_.size() + 1);
+    inputSet().insert(added.get());
+    ownedInputs_.push_back(std::move(added));
 }
 
 void Filter::addParameter(ParameterBase* pParameter) { parameterSet().insert(pParameter); }

@@ -88,7 +88,8 @@ protected:
 
 public:
     /// Runs the costly part of the set-up, unless that was done. The factory does this to a prototype before
-    /// it clones it, which is why it can be asked of a constant filter.
+    /// it clones it, which is why it can be asked of a constant filter. If it throws, the inputs, metadata
+    /// items and owned parameters that it had added are gone again, and it may be tried once more.
     void initialize() const;
 
     bool isInitialized() const { return initialized; }
@@ -158,11 +159,19 @@ private:
     using OwnedMetadata = std::unique_ptr<MetadataItemBase const, ORVODeleter<MetadataItemBase const>>;
     struct Parts;
 
+    /// How many of each the filter owns.
+    struct Sizes {
+        std::size_t nInputs;
+        std::size_t nParameters;
+        std::size_t nMetadata;
+    };
+
     InputSet& inputSet() const;
     ParameterSet& parameterSet() const;
     void cloneParameters(Filter const& other, Parts& parts);
     void cloneConnectors(Filter const& other, Parts& parts);
     void releaseInputs() noexcept;
+    void shrinkTo(Sizes const& sizes) noexcept;
 
     std::unique_ptr<ParameterSet> pParameterSet_;
     std::unique_ptr<InputSet> pInputSet_;

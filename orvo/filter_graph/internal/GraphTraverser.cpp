@@ -24,6 +24,9 @@ struct Step {
     InputIterator oInputs;
 };
 
+/// Producers are set by `Connect`, which takes a `Filter`: there are no others.
+Filter* producerOf(Input const& input) { return static_cast<Filter*>(input.producerFilter()); }
+
 [[noreturn]] void failOnCycle(Filter const& filter) {
     throw Exception(filter.identifier().name() + ": circular reference detected in filter");
 }
@@ -84,7 +87,7 @@ void GraphTraverser::traverseDepthFirst(Filter* pFilter) {
             if (step.oInputs.isValid()) {
                 Input const& input = **step.oInputs;
                 ++step.oInputs;
-                auto* const pProducer = dynamic_cast<Filter*>(input.producerFilter());
+                Filter* const pProducer = producerOf(input);
                 if (!pProducer) {
                     bGraphIsBroken = true;
                     failOnUnconnectedInput(*step.pFilter, input);
@@ -117,7 +120,7 @@ void GraphTraverser::traverseAndResetGraph(Filter* pFilter) {
         aPending.pop_back();
         pNext->resetColor();
         for (InputIterator iInput = pNext->inputs(); iInput.isValid(); ++iInput) {
-            auto* const pSource = dynamic_cast<Filter*>((*iInput)->producerFilter());
+            Filter* const pSource = producerOf(**iInput);
             ORVO_ENFORCE(pSource);
             if (pSource->getColor() != kUnvisited) {
                 // Taken back at once, so that a shared producer is not queued twice.

@@ -43,17 +43,14 @@ FormatRow const& formatsOf(ImageDescriptor::eChannelType channelType) {
 }
 
 ImageDescriptor::eChannelType channelTypeOf(CPU::tePixelFormat ePixelFormat) {
+    bool const bInt = isInt(ePixelFormat);
     switch (channelSizeBits(ePixelFormat)) {
     case 8:
         return ImageDescriptor::CHANNEL_TYPE_UINT8;
     case 16:
-        return isInt(ePixelFormat) ? ImageDescriptor::CHANNEL_TYPE_UINT15_1
-                                   : ImageDescriptor::CHANNEL_TYPE_FLOAT16;
-    case 32:
-        return isInt(ePixelFormat) ? ImageDescriptor::CHANNEL_TYPE_INT32
-                                   : ImageDescriptor::CHANNEL_TYPE_FLOAT32;
+        return bInt ? ImageDescriptor::CHANNEL_TYPE_UINT15_1 : ImageDescriptor::CHANNEL_TYPE_FLOAT16;
     default:
-        ORVO_FAIL("Not implemented: ePixelFormat in mapPixelFormatToDescriptorFormat");
+        return bInt ? ImageDescriptor::CHANNEL_TYPE_INT32 : ImageDescriptor::CHANNEL_TYPE_FLOAT32;
     }
 }
 
@@ -67,6 +64,8 @@ CPU::tePixelFormat ImageAccessor::mapDescriptorToCPUPixelFormat(std::size_t nCha
 }
 
 ImageDescriptor::Format ImageAccessor::mapPixelFormatToDescriptorFormat(CPU::tePixelFormat ePixelFormat) {
+    ORVO_CHECK(ePixelFormat >= CPU::PIXEL_FORMAT_BGR8 && ePixelFormat <= CPU::PIXEL_FORMAT_UNDEFINED,
+               "Not implemented: ePixelFormat in mapPixelFormatToDescriptorFormat");
     // The channels are asked for first: that is what refuses the half-float and undefined formats.
     std::size_t const nChannel = nChannels(ePixelFormat);
     return {nChannel, channelTypeOf(ePixelFormat)};

@@ -32,7 +32,9 @@ public:
     mapDescriptorToCPUPixelFormat(std::size_t nChannel, ImageDescriptor::eChannelType channelType);
 
     /// Channels and channel type of a pixel format. 16-bit integers are `CHANNEL_TYPE_UINT15_1`.
-    /// @throws InternalException for half-float and undefined formats and for values that are no format.
+    /// @throws InternalException "Pixel format not supported by ORVO in CPU mode" for half-float and
+    /// undefined formats, "Not implemented: ePixelFormat in mapPixelFormatToDescriptorFormat" for what is no
+    /// format.
     static ImageDescriptor::Format
     mapPixelFormatToDescriptorFormat(ORVO::ImageCPU::tePixelFormat ePixelFormat);
 

@@ -52,10 +52,7 @@ ImageFlowFilterWrapper::ImageFlowFilterWrapper(IFilter::Identifier const& identi
     }
     clientID_ = pMetaData->clientID();
     for (char const* const name : {"mlMatchname", "clientID"}) {
-        using Item = MetadataItem<std::string>;
-        std::unique_ptr<Item, ORVODeleter<Item>> pItem(ORVO_NEW Item(name, clientID_));
-        addMetadataItem(pItem.get());
-        static_cast<void>(pItem.release());
+        addMetadataItem(ORVO_NEW MetadataItem<std::string>(name, clientID_));
     }
 }
 

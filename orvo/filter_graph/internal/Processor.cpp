@@ -114,7 +114,7 @@ bool Processor::isUpToDate(OptimizationOptions const& options) {
     if (!options.equals(irOptions_)) {
         return false;
     }
-    CheckTimeStampVisitor visitor(&clones_);
+    CheckTimeStampVisitor visitor(&clones_, &aTimeStamps_);
     try {
         traverseClientGraph(*pOriginalGraph_, visitor);
     } catch (...) {
@@ -131,6 +131,7 @@ void Processor::dropGraphs() noexcept {
 }
 
 void Processor::clearIR() noexcept {
+    aTimeStamps_.clear();
     aAdapters_.clear();
     aChildForwarders_.clear();
     parameterForwarder_.clear();

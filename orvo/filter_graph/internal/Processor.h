@@ -6,6 +6,7 @@
 
 #include "orvo/filter_graph/impl/IAdapter.h"
 #include "orvo/filter_graph/impl/IEmbeddedProcessor.h"
+#include "orvo/filter_graph/internal/CheckTimeStampVisitor.h"
 #include "orvo/filter_graph/internal/ParameterForwarder.h"
 
 namespace ORVO::OGL {
@@ -134,6 +135,8 @@ private:
     IAdapter::eRegionSyncMode regionSyncMode_;
     eFrameStatus frameStatus_;
     OGL::Context const* context_;
+    CheckTimeStampVisitor::Memory
+        aTimeStamps_;               // of the last walk that compared clones_ with the client graph
     OptimizationOptions irOptions_; // those that clones_ were made for
     std::vector<AdapterPair>
         aAdapters_; // those of clones_ in map order: a frame need not ask each filter for its kind

@@ -28,7 +28,7 @@ std::shared_ptr<Filter> createScalingFilter(std::string const& prefix, std::size
         "Not implemented: Only 1/2/3/4 channel 15+1 to 16 bit scaling nodes are available in the filter "
         "factory\n");
     IFilter::Identifier const identifier(prefix + std::to_string(nChannel) + "channel", "ORVO", "Norvane", 1);
-    auto const spFilter = std::dynamic_pointer_cast<Filter>(FilterFactory::Instance()->create(identifier));
+    auto spFilter = std::dynamic_pointer_cast<Filter>(FilterFactory::Instance()->create(identifier));
     ORVO_ENFORCE(spFilter.get(), "spFilter");
     return spFilter;
 }

@@ -43,10 +43,14 @@ struct FastBilateralCPUFilter::Call {
     WorkingImage working;
     SerialBandRunner serialRunner = {};
 
+    /// Rows whose alpha is 1 throughout: their alpha is not kept.
+    std::vector<unsigned char> aOpaqueRows = {};
+
     GridLayout layout = {};
     std::vector<std::uint32_t> aColumns = {}; ///< the grid column that each pixel of a row falls into
     std::vector<float> aFractions = {};       ///< how far each pixel of a row is from the column left of it
-    std::vector<PixelRun> aRuns = {};         ///< the pixels of a row by the columns between which they lie
+    std::vector<std::int32_t> aLevels = {};   ///< where the column left of each pixel begins in a plane
+    std::vector<std::uint32_t> aEnds = {};    ///< the first pixel behind those between the same columns
     std::vector<std::size_t> aFirstRows = {}; ///< the first image row of each row of the grid, and the end
     std::shared_ptr<ImageCPU> spGrid = {};
     float* pGrid = nullptr;
@@ -187,10 +191,18 @@ void FastBilateralCPUFilter::convertRows(Call& call, ConvertRow const& convertRo
     float const largest = std::numeric_limits<float>::max();
     std::vector<ValueBounds> aBounds(call.working.height(), ValueBounds{largest, -largest});
     BandRunner& runner = call.source.isConcurrent() ? call.runner : call.serialRunner;
+    std::size_t const nWidth = call.working.width();
+    call.aOpaqueRows.assign(call.working.height(), 0);
     auto const convert = [&](std::size_t first, std::size_t last) {
-        std::vector<float> aBuffer(4 * call.working.width());
+        std::vector<float> aBuffer(4 * nWidth);
+        std::vector<float> aAlpha(nWidth);
         for (std::size_t row = first; row < last; ++row) {
-            convertRow(call.source.row(row, aBuffer.data()), row, aBounds[row]);
+            float const* const pRGBA = call.source.row(row, aBuffer.data());
+            bool const isOpaque = convertRow(pRGBA, row, aAlpha.data(), aBounds[row]);
+            call.aOpaqueRows[row] = isOpaque ? 1 : 0;
+            if (!isOpaque) {
+                std::copy(aAlpha.begin(), aAlpha.end(), call.working.row(call.working.channels(), row));
+            }
         }
     };
     runRows(runner, call.working.height(), kRowsPerBand, call.working.width(), convert, asksOnce);
@@ -205,17 +217,17 @@ void FastBilateralCPUFilter::convertRows(Call& call, ConvertRow const& convertRo
 }
 
 void FastBilateralCPUFilter::convertToLuminance(Call& call) {
-    convertRows(call, [&call](float const* pRGBA, std::size_t row, ValueBounds& bounds) {
-        call.kernels.luminanceFromRGBA(pRGBA, call.working.row(0, row), call.working.row(1, row),
-                                       call.working.width(), &bounds);
+    convertRows(call, [&call](float const* pRGBA, std::size_t row, float* pAlpha, ValueBounds& bounds) {
+        return call.kernels.luminanceFromRGBA(pRGBA, call.working.row(0, row), pAlpha, call.working.width(),
+                                              &bounds);
     });
 }
 
 void FastBilateralCPUFilter::convertToLAB(Call& call) {
-    convertRows(call, [&call](float const* pRGBA, std::size_t row, ValueBounds& bounds) {
+    convertRows(call, [&call](float const* pRGBA, std::size_t row, float* pAlpha, ValueBounds& bounds) {
         std::array<float*, 4> const apPlanes = {call.working.row(0, row), call.working.row(1, row),
-                                                call.working.row(2, row), call.working.row(3, row)};
-        call.kernels.labFromRGBA(pRGBA, apPlanes.data(), call.working.width(), &bounds);
+                                                call.working.row(2, row), pAlpha};
+        return call.kernels.labFromRGBA(pRGBA, apPlanes.data(), call.working.width(), &bounds);
     });
 }
 
@@ -233,19 +245,20 @@ void FastBilateralCPUFilter::layOutGrid(Call& call) const {
     std::size_t const nWidth = call.working.width();
     call.aColumns.resize(nWidth);
     call.aFractions.resize(nWidth);
+    call.aLevels.resize(nWidth);
     for (std::size_t px = 0; px < nWidth; ++px) {
         call.aColumns[px] =
             static_cast<std::uint32_t>(cellAlong(px, fSigmaX_, fPaddingXY_, fGridOffset_, nGridWidth_));
         float const place = static_cast<float>(px) / fSigmaX_ + fGridOffset_ + fPaddingXY_;
         float const whole = std::floor(place);
         call.aFractions[px] = place - whole;
-        std::uint32_t const column = static_cast<std::uint32_t>(clampedCell(whole, nGridWidth_));
-        std::uint32_t const next = static_cast<std::uint32_t>(clampedCell(whole + 1.0F, nGridWidth_));
-        std::uint32_t const pixel = static_cast<std::uint32_t>(px);
-        if (call.aRuns.empty() || call.aRuns.back().nColumn != column) {
-            call.aRuns.push_back({pixel, pixel, column, next});
-        }
-        call.aRuns.back().nEnd = pixel + 1;
+        // The padding keeps the column right of it inside the grid.
+        call.aLevels[px] = static_cast<std::int32_t>(clampedCell(whole, nGridWidth_ - 1) * layout.nLevels);
+    }
+    call.aEnds.assign(nWidth, static_cast<std::uint32_t>(nWidth));
+    for (std::size_t px = nWidth - 1; px-- > 0;) {
+        bool const isLast = call.aLevels[px] != call.aLevels[px + 1];
+        call.aEnds[px] = isLast ? static_cast<std::uint32_t>(px + 1) : call.aEnds[px + 1];
     }
     call.aFirstRows.assign(nGridHeight_ + 1, call.working.height());
     for (std::size_t py = call.working.height(); py-- > 0;) {
@@ -313,7 +326,8 @@ void FastBilateralCPUFilter::blurGridAlongY(Call& call) const {
     askCallback(2 * nGridWidth_);
 }
 
-void FastBilateralCPUFilter::sliceGridRow(Call& call, std::size_t row, float* pBlended) const {
+void FastBilateralCPUFilter::sliceGridRow(Call const& call, std::size_t row, float* pBlended,
+                                          float* const* apResults) const {
     float const place = static_cast<float>(row) / fSigmaY_ + fGridOffset_ + fPaddingXY_;
     float const whole = std::floor(place);
     SliceJob job = {};
@@ -322,12 +336,12 @@ void FastBilateralCPUFilter::sliceGridRow(Call& call, std::size_t row, float* pB
     job.pLower = call.pDivided + clampedCell(whole + 1.0F, nGridHeight_) * call.dividedPitch();
     job.fFraction = place - whole;
     job.pBlended = pBlended;
-    job.pRuns = call.aRuns.data();
-    job.nRuns = call.aRuns.size();
+    job.nPixels = call.working.width();
+    job.pLevels = call.aLevels.data();
+    job.pEnds = call.aEnds.data();
     job.pFractions = call.aFractions.data();
-    for (std::size_t channel = 0; channel < call.layout.nChannels; ++channel) {
-        job.apPixels[channel] = call.working.row(channel, row);
-    }
+    job.pIntensities = call.working.row(0, row);
+    std::copy_n(apResults, call.layout.nChannels, job.apResults);
     call.kernels.slice(job);
 }
 
@@ -371,30 +385,38 @@ void FastBilateralCPUFilter::applyBruteForceFilter(Call& call) const {
 }
 
 void FastBilateralCPUFilter::writeImage(Call& call, bool bSlice) const {
-    WorkingImage& working = call.working;
+    WorkingImage const& working = call.working;
+    std::size_t const nWidth = working.width();
     BandRunner& runner = call.target.isConcurrent() ? call.runner : call.serialRunner;
     // Other targets clamp by themselves, or want their pixels as they are.
     StoreStyle const style = {call.target.isDirect(), call.target.prefersStreaming()};
+    std::vector<float> const aOnes(nWidth, 1.0F);
     auto const write = [&](std::size_t first, std::size_t last) {
-        std::vector<float> aBuffer(4 * working.width());
+        std::vector<float> aBuffer(4 * nWidth);
         std::vector<float> aBlended(bSlice ? call.dividedPitch() : 0);
+        std::vector<float> aSliced(bSlice ? working.channels() * nWidth : 0);
         for (std::size_t row = first; row < last; ++row) {
+            std::array<float const*, 4> apPlanes = {};
+            std::array<float*, 3> apSliced = {};
+            for (std::size_t channel = 0; channel < working.channels(); ++channel) {
+                apSliced[channel] = aSliced.data() + channel * nWidth;
+                apPlanes[channel] = bSlice ? apSliced[channel] : working.row(channel, row);
+            }
+            apPlanes[working.channels()] =
+                call.aOpaqueRows[row] != 0 ? aOnes.data() : working.row(working.channels(), row);
             if (bSlice) {
-                sliceGridRow(call, row, aBlended.data());
+                sliceGridRow(call, row, aBlended.data(), apSliced.data());
             }
             float* const pRow = call.target.rowBuffer(row, aBuffer.data());
             if (bColorize_) {
-                std::array<float const*, 4> const apPlanes = {working.row(0, row), working.row(1, row),
-                                                              working.row(2, row), working.row(3, row)};
-                call.kernels.rgbaFromLab(apPlanes.data(), pRow, working.width(), style);
+                call.kernels.rgbaFromLab(apPlanes.data(), pRow, nWidth, style);
             } else {
-                call.kernels.greyFromLuminance(working.row(0, row), working.row(1, row), pRow,
-                                               working.width(), style);
+                call.kernels.greyFromLuminance(apPlanes[0], apPlanes[1], pRow, nWidth, style);
             }
             call.target.finishRow(row, pRow);
         }
     };
-    runRows(runner, working.height(), kRowsPerBand, working.width(), write, asksNobody);
+    runRows(runner, working.height(), kRowsPerBand, nWidth, write, asksNobody);
 }
 
 } // namespace ORVO

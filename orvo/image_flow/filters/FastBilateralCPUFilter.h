@@ -98,7 +98,7 @@ private:
     void layOutGrid(Call& call) const;
     void constructDownsampled3DGrid(Call& call) const;
     void blurGridAlongY(Call& call) const;
-    void sliceGridRow(Call& call, std::size_t row, float* pBlended) const;
+    void sliceGridRow(Call const& call, std::size_t row, float* pBlended, float* const* apResults) const;
     void applyBruteForceFilter(Call& call) const;
     void writeImage(Call& call, bool bSlice) const;
 

@@ -48,8 +48,8 @@ public:
     void processSlice(std::size_t begin, std::size_t end) override;
 
 protected:
-    /// @throws InternalException "Enforce spData_.get() != NULL" without an input image, "Enforce pOutput != NULL"
-    /// without an output image, and what FastBilateralCPUFilter::applyFilter() throws.
+    /// @throws InternalException "Enforce spData_.get() != NULL" without an input image, "Enforce pOutput !=
+    /// NULL" without an output image, and what FastBilateralCPUFilter::applyFilter() throws.
     void internalProcess() override;
 
 private:

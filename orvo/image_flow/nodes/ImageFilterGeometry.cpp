@@ -17,6 +17,8 @@ PixelExtentInWorldSpace extentOf(std::map<std::string, PixelExtentInWorldSpace> 
 
 } // namespace
 
+// Overrides may keep the name.
+// NOLINTBEGIN(performance-unnecessary-value-param)
 PositionExtentInWorldSpace ImageFilter::needed(PositionExtentInWorldSpace const& outputRegion,
                                                std::string /*inputName*/, RegionMap const& /*inputDODs*/) {
     return outputRegion;
@@ -26,6 +28,7 @@ PositionExtentInWorldSpace ImageFilter::changed(PositionExtentInWorldSpace const
                                                 std::string /*inputName*/, RegionMap const& /*inputDODs*/) {
     return inputRegion;
 }
+// NOLINTEND(performance-unnecessary-value-param)
 
 PositionExtentInWorldSpace ImageFilter::computeDomainOfDefinition() {
     PositionExtentInWorldSpace result;

@@ -36,12 +36,6 @@ bool ImageCPUInput::hasBufferChanged() {
     return bChanged;
 }
 
-void ImageCPUInput::flush() {
-    Node::flush();
-    spOutputImage_.reset();
-    bPreparedForRender_ = false;
-}
-
 bool ImageCPUInput::isReady() const { return Node::isReady() && !bEmitted_; }
 
 PositionExtentInWorldSpace ImageCPUInput::generated(RegionMap const& inputDODs) {

@@ -27,8 +27,6 @@ public:
     bool canEmit() const override;
     /// Whether an image was set since the last call.
     bool hasBufferChanged() override;
-    /// Drops connector data only; the image stays set.
-    void flush() override;
     /// `Node::isReady`, and emitted since the last run.
     bool isReady() const override;
 

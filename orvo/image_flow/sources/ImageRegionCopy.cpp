@@ -90,7 +90,9 @@ Channel fromFloat(float value) {
     if constexpr (std::is_integral_v<Channel>) {
         // The comparison is false for a NaN, which so becomes 0.
         float const bounded = value > 0.0f ? std::min(value, 1.0f) : 0.0f;
-        return static_cast<Channel>(static_cast<int>(bounded * whiteOf<Channel>() + 0.5f));
+        // Never negative, and unlike a call of the library it runs in vectors.
+        return static_cast<Channel>(
+            static_cast<int>(bounded * whiteOf<Channel>() + 0.5f)); // NOLINT(bugprone-incorrect-roundings)
     } else {
         return Channel(value);
     }

@@ -85,13 +85,17 @@ std::uint64_t checkedSize(ExtentInPixelSpace const& extent, ExtentInPixelSpace c
     return nPixels * nPixelBytes;
 }
 
+/// Copies each channel out, since memory of the caller may lie anywhere.
 template <class Channel>
-void writeRow(std::ostream& stream, Channel const* pRow, int width, std::size_t nChannels,
+void writeRow(std::ostream& stream, unsigned char const* pRow, int width, std::size_t nChannels,
               char const* sBehindPixel) {
     for (int x = 0; x < width; ++x) {
         for (std::size_t c = 0; c < nChannels; ++c) {
+            Channel value;
+            std::memcpy(&value, pRow, sizeof(value));
+            pRow += sizeof(value);
             // The unary plus makes a number of a byte.
-            stream << +*pRow++ << " ";
+            stream << +value << " ";
         }
         stream << sBehindPixel;
     }
@@ -113,7 +117,7 @@ ImageCPU::ImageCPU(tePixelFormat ePixelFormat, PositionExtentInPixelSpace const&
       bOwnsPixels_(false),
       nSizeBytes_(0) {
     eTargetPlatform_ = ORVO_TARGET_CPU;
-    initStride(capacity);
+    init_stride(capacity);
     pPixels_ = allocatePixels(nSizeBytes_, FRESH_ALIGNMENT);
     bOwnsPixels_ = true;
 }
@@ -128,7 +132,7 @@ ImageCPU::ImageCPU(tePixelFormat ePixelFormat, unsigned char const* pPixels,
       bOwnsPixels_(false),
       nSizeBytes_(0) {
     eTargetPlatform_ = ORVO_TARGET_CPU;
-    initStride(capacity);
+    init_stride(capacity);
 }
 
 ImageCPU::ImageCPU(ImageCPU const& other)
@@ -164,7 +168,7 @@ ImageCPU::~ImageCPU() {
     }
 }
 
-void ImageCPU::initStride(ExtentInPixelSpace const& capacity) {
+void ImageCPU::init_stride(ExtentInPixelSpace const& capacity) {
     ExtentInPixelSpace const stride = !capacity.isDefined() || capacity.width() == 0 ? extent() : capacity;
     nSizeBytes_ = checkedSize(extent(), stride, pixelSizeBytes(ePixelFormat_));
     oCapacity_ = stride;
@@ -219,9 +223,9 @@ void ImageCPU::writeImageData(std::ostream& stream, int maxWidth, int maxHeight)
                                     pixelSizeBytes(ePixelFormat_);
         unsigned char const* pRow = pixels() + nOffset;
         if (bBytes) {
-            writeRow(stream, pRow, width, nPixelChannels, sBehindPixel);
+            writeRow<unsigned char>(stream, pRow, width, nPixelChannels, sBehindPixel);
         } else {
-            writeRow(stream, reinterpret_cast<float const*>(pRow), width, nPixelChannels, sBehindPixel);
+            writeRow<float>(stream, pRow, width, nPixelChannels, sBehindPixel);
         }
     }
 }

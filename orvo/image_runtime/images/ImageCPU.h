@@ -72,11 +72,11 @@ public:
     /// @param positionExtent the meaningful pixels, in pixel space.
     /// @param pixelExtent the world size of one pixel, positive.
     /// @param capacity the storage in pixels; undefined or of width 0 it becomes the extent, else it is taken
-    /// as given,
-    ///        also if it is smaller than the extent.
-    /// @throws ParameterException "Image extent and capacity must not be negative" and "Image size exceeds
-    /// 4294967295
-    ///         bytes", before anything is allocated.
+    ///        as given, also if it is smaller than the extent: pixels beyond
+    ///        the storage are then not to be touched.
+    /// @throws ParameterException "Image extent and capacity must not be negative" and
+    ///         "Image size exceeds 4294967295 bytes",
+    ///         before anything is allocated.
     /// @throws InternalException as pixelSizeBytes() and ImageBase do. @throws std::bad_alloc.
     ImageCPU(tePixelFormat ePixelFormat, PositionExtentInPixelSpace const& positionExtent,
              PixelExtentInWorldSpace const& pixelExtent, ExtentInPixelSpace capacity);
@@ -152,7 +152,7 @@ public:
     void writeFull(std::ostream& stream) const;
 
 private:
-    void initStride(ExtentInPixelSpace const& capacity);
+    void init_stride(ExtentInPixelSpace const& capacity);
 
     tePixelFormat ePixelFormat_;
     unsigned char* pPixels_;
@@ -162,21 +162,21 @@ private:
 };
 
 /// Channels of a pixel.
-/// @throws InternalException "Pixel format not supported by ORVO in CPU mode" for the four half-float
-/// formats, the
-///         undefined format and any number that is no format.
+/// @throws InternalException
+///         "Pixel format not supported by ORVO in CPU mode" for the four half-float formats, the undefined
+///         format and any number that is no format.
 ORVO_API std::size_t nChannels(ImageCPU::tePixelFormat ePixelFormat);
 
 /// Bits of a channel: 8, 16 or 32.
-/// @throws InternalException "Not implemented: ePixelFormat in channelSizeBits()." for the undefined format
-/// and any
-///         number that is no format.
+/// @throws InternalException
+///         "Not implemented: ePixelFormat in channelSizeBits()." for the undefined format and any number that
+///         is no format.
 ORVO_API std::size_t channelSizeBits(ImageCPU::tePixelFormat ePixelFormat);
 
 /// Bytes of a pixel.
-/// @throws InternalException "!\"PIXEL_FORMAT_UNDEFINED\"" for the undefined format, "Not implemented:
-/// ePixelFormat in
-///         pixelSizeBytes()." for the two half-float luminance formats and any number that is no format.
+/// @throws InternalException "!\"PIXEL_FORMAT_UNDEFINED\"" for the undefined format,
+///         "Not implemented: ePixelFormat in pixelSizeBytes()." for the two half-float luminance formats and
+///         any number that is no format.
 ORVO_API std::size_t pixelSizeBytes(ImageCPU::tePixelFormat ePixelFormat);
 
 /// Whether the channels are no integers: true also for the undefined format and for numbers that are no

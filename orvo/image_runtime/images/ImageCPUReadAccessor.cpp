@@ -1,7 +1,7 @@
 #include "orvo/image_runtime/images/ImageCPUReadAccessor.h"
 
 #include "orvo/image_runtime/images/ImageCPU.h"
-#include "orvo/image_runtime/kernels/Rows.h"
+#include "orvo/image_runtime/kernels/PixelRuns.h"
 
 namespace ORVO {
 
@@ -19,7 +19,7 @@ int ImageCPUReadAccessor::physicalWidth() const { return pImage_->capacityExtent
 
 float4 ImageCPUReadAccessor::getRGBAFloat4PixelAt(int x, int y) const {
     float aRGBA[4];
-    ImageRuntime::readRowAsRGBAFloat(*pImage_, y, x, x + 1, aRGBA);
+    ImageRuntime::Internal::readPixelRun(*pImage_, x, y, 1, aRGBA);
     return float4(aRGBA[0], aRGBA[1], aRGBA[2], aRGBA[3]);
 }
 

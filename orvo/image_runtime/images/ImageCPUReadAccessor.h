@@ -24,8 +24,7 @@ public:
     /// The pixel at the pixel-space coordinates (x, y), without a test of bounds: 8-bit channels divided by
     /// 255, halves and floats as stored, alpha 1.0 where the format has none.
     /// @throws InternalException "Invalid input image type" for any format other than BGR8, BGRA8, RGB8,
-    /// RGBA8, RGB32F,
-    ///         RGBA32F, RGB16F and RGBA16F.
+    ///         RGBA8, RGB32F, RGBA32F, RGB16F and RGBA16F.
     float4 getRGBAFloat4PixelAt(int x, int y) const override;
 
     ImageCPU const& image() const;

@@ -1,7 +1,7 @@
 #include "orvo/image_runtime/images/ImageCPUWriteAccessor.h"
 
 #include "orvo/image_runtime/images/ImageCPU.h"
-#include "orvo/image_runtime/kernels/Rows.h"
+#include "orvo/image_runtime/kernels/PixelRuns.h"
 
 namespace ORVO {
 
@@ -19,7 +19,7 @@ int ImageCPUWriteAccessor::physicalWidth() const { return pImage_->capacityExten
 
 void ImageCPUWriteAccessor::writeRGBAFloatPixel4At(float4 pixel, int x, int y) {
     float const aRGBA[4] = {pixel[0], pixel[1], pixel[2], pixel[3]};
-    ImageRuntime::writeRowFromRGBAFloat(*pImage_, y, x, x + 1, aRGBA);
+    ImageRuntime::Internal::writePixelRun(*pImage_, x, y, 1, aRGBA);
 }
 
 ImageCPU& ImageCPUWriteAccessor::image() const { return *pImage_; }

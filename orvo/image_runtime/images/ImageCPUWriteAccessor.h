@@ -25,8 +25,7 @@ public:
     /// without a test of bounds. An 8-bit channel becomes the truncation of the exact value * 255.0, NaN
     /// becoming 0; halves and floats are stored as clamped. Alpha is dropped where the format has none.
     /// @throws InternalException "Invalid input image type" for any format other than BGR8, BGRA8, RGB8,
-    /// RGBA8, RGB32F,
-    ///         RGBA32F, RGB16F and RGBA16F.
+    ///         RGBA8, RGB32F, RGBA32F, RGB16F and RGBA16F.
     void writeRGBAFloatPixel4At(float4 pixel, int x, int y) override;
 
     ImageCPU& image() const;

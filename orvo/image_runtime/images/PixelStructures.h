@@ -2,8 +2,6 @@
 
 #include "orvo/core/math/Half.h"
 
-#include <type_traits>
-
 /// Plain structures of one pixel in host memory, in the memory order of the format that bears the same name.
 /// 8-bit channels are 0..255 for 0.0 to 1.0. There are none for the formats of 16-bit integers.
 ///

@@ -14,19 +14,22 @@ namespace ORVO::ImageRuntime {
 enum class StoreMode : std::int32_t { CACHED = 0, STREAM = 1 };
 
 /// Kernels over one row of `n` channel values, made for one instruction set. The channel order passes
-/// through. The two rows of a call must not overlap. Pointers need the alignment of their element only.
+/// through. The two rows of a call must not overlap. Pointers need no alignment, not even of their element.
 ///
 /// The first five work on the SIMD-optimised layout, in three stretches: a scalar head that brings the float
 /// pointer to 16 bytes (((16 - (address & 15)) >> 2) & 3 values at most), groups of four, and a scalar tail.
 /// The stretches differ:
 ///
-/// | kernel | head and tail | groups of four |
-/// | --- | --- | --- |
-/// | `floatFromUInt8` | value / 255.0f | value * (1.0f / 255.0f) |
-/// | `floatFromUInt16` | value / 32768 | the same |
-/// | `uInt8FromFloat` | truncation of value * 255.0f, wrapping at 256 | rounded to the nearest, ties to even,
-/// saturated | | `uInt16FromFloat` | clamped to 0..1, then floor(value * 32768.0f + 0.5f) | rounded to the
-/// nearest, ties to even, 0..32768 | | `copyFloat` | copy | copy |
+/// | kernel            | head and tail                               | groups of four              |
+/// |-------------------|---------------------------------------------|-----------------------------|
+/// | `floatFromUInt8`  | value / 255.0f                              | value * (1.0f / 255.0f)     |
+/// | `floatFromUInt16` | value / 32768                               | the same                    |
+/// | `uInt8FromFloat`  | truncation of value * 255.0f, modulo 256    | nearest of it, saturated    |
+/// | `uInt16FromFloat` | floor(value * 32768.0f + 0.5f), of 0..1     | nearest of value * 32768.0f |
+/// | `copyFloat`       | copy                                        | copy                        |
+///
+/// The nearest integer is the even one where two are equally near. Both forms of `uInt16FromFloat` give
+/// 0..32768 for any number.
 ///
 /// The others belong to the pixel accessors and treat all places alike. A NaN becomes 0 wherever an integer
 /// is stored. Results are the same, bit for bit, for all instruction sets.
@@ -41,7 +44,7 @@ struct RowKernels {
 
     /// value / 255.0f.
     void (*unitFromUInt8)(float* pOutput, std::uint8_t const* pInput, std::size_t n);
-    /// Halves given as bit patterns, to float, exactly.
+    /// Halves given as bit patterns, to float, exactly. A signalling NaN becomes a quiet one.
     void (*floatFromHalf)(float* pOutput, std::uint16_t const* pInput, std::size_t n);
     /// Clamped to 0..1; a NaN stays as it is.
     void (*clampedToUnit)(float* pOutput, float const* pInput, std::size_t n);

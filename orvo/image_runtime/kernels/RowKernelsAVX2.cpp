@@ -4,7 +4,7 @@ namespace ORVO::ImageRuntime::Internal {
 
 namespace {
 
-struct Operations {
+struct Vectors {
     /// A block: its lower and its upper eight values.
     struct Floats {
         __m256 lower, upper;
@@ -70,6 +70,11 @@ struct Operations {
         return {_mm256_mul_ps(values.lower, factors), _mm256_mul_ps(values.upper, factors)};
     }
 
+    static Floats divided(Floats values, float divisor) {
+        __m256 const divisors = _mm256_set1_ps(divisor);
+        return {_mm256_div_ps(values.lower, divisors), _mm256_div_ps(values.upper, divisors)};
+    }
+
     /// Scaled, a NaN made 0, clamped, rounded.
     static __m256i integers(__m256 values, float white) {
         __m256 const scaled = _mm256_mul_ps(values, _mm256_set1_ps(white));
@@ -100,98 +105,27 @@ struct Operations {
         return _mm256_add_epi32(truncated, _mm256_castps_si256(_mm256_cmp_ps(rest, value, _CMP_LT_OQ)));
     }
 
-    struct FloatFromUInt8 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint8_t const* pInput) {
-            store<bStream>(pOutput, scaled(load(pInput), 1.0f / 255.0f));
-        }
-    };
+    static Integers truncatedBytes(Floats values) {
+        return {truncatedBytes(values.lower), truncatedBytes(values.upper)};
+    }
 
-    struct FloatFromUInt16 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint16_t const* pInput) {
-            store<bStream>(pOutput, scaled(load(pInput), 1.0f / 32768.0f));
-        }
-    };
+    static void floatFromHalf(float* pOutput, std::uint16_t const* pInput) {
+        __m128i const lower = _mm_loadu_si128(reinterpret_cast<__m128i const*>(pInput));
+        __m128i const upper = _mm_loadu_si128(reinterpret_cast<__m128i const*>(pInput + 8));
+        store<false>(pOutput, Floats{_mm256_cvtph_ps(lower), _mm256_cvtph_ps(upper)});
+    }
 
-    struct UInt8FromFloat {
-        template <bool bStream>
-        static void run(std::uint8_t* pOutput, float const* pInput) {
-            store<bStream>(pOutput, integers(load(pInput), 255.0f));
-        }
-    };
-
-    struct UInt16FromFloat {
-        template <bool bStream>
-        static void run(std::uint16_t* pOutput, float const* pInput) {
-            store<bStream>(pOutput, integers(load(pInput), 32768.0f));
-        }
-    };
-
-    struct CopyFloat {
-        template <bool bStream>
-        static void run(float* pOutput, float const* pInput) {
-            store<bStream>(pOutput, load(pInput));
-        }
-    };
-
-    struct UnitFromUInt8 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint8_t const* pInput) {
-            Floats const values = load(pInput);
-            __m256 const white = _mm256_set1_ps(255.0f);
-            store<bStream>(pOutput,
-                           Floats{_mm256_div_ps(values.lower, white), _mm256_div_ps(values.upper, white)});
-        }
-    };
-
-    struct ClampedToUnit {
-        template <bool bStream>
-        static void run(float* pOutput, float const* pInput) {
-            store<bStream>(pOutput, clamped(load(pInput)));
-        }
-    };
-
-    struct UInt8FromUnit {
-        template <bool bStream>
-        static void run(std::uint8_t* pOutput, float const* pInput) {
-            Floats const values = load(pInput);
-            store<bStream>(pOutput, Integers{truncatedBytes(values.lower), truncatedBytes(values.upper)});
-        }
-    };
-
-    struct FloatFromHalf {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint16_t const* pInput) {
-            __m128i const lower = _mm_loadu_si128(reinterpret_cast<__m128i const*>(pInput));
-            __m128i const upper = _mm_loadu_si128(reinterpret_cast<__m128i const*>(pInput + 8));
-            store<bStream>(pOutput, Floats{_mm256_cvtph_ps(lower), _mm256_cvtph_ps(upper)});
-        }
-    };
-
-    struct HalfFromUnit {
-        template <bool bStream>
-        static void run(std::uint16_t* pOutput, float const* pInput) {
-            Floats const values = clamped(load(pInput));
-            __m128i const lower =
-                _mm256_cvtps_ph(values.lower, _MM_FROUND_TO_NEAREST_INT | _MM_FROUND_NO_EXC);
-            __m128i const upper =
-                _mm256_cvtps_ph(values.upper, _MM_FROUND_TO_NEAREST_INT | _MM_FROUND_NO_EXC);
-            _mm_storeu_si128(reinterpret_cast<__m128i*>(pOutput), lower);
-            _mm_storeu_si128(reinterpret_cast<__m128i*>(pOutput + 8), upper);
-        }
-    };
+    static void halfFromUnit(std::uint16_t* pOutput, float const* pInput) {
+        Floats const values = clamped(load(pInput));
+        __m128i const lower = _mm256_cvtps_ph(values.lower, _MM_FROUND_TO_NEAREST_INT | _MM_FROUND_NO_EXC);
+        __m128i const upper = _mm256_cvtps_ph(values.upper, _MM_FROUND_TO_NEAREST_INT | _MM_FROUND_NO_EXC);
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(pOutput), lower);
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(pOutput + 8), upper);
+    }
 };
 
 } // namespace
 
-RowKernels const& avx2RowKernels() {
-    using Body = RowKernelBody<Operations>;
-    static constexpr RowKernels KERNELS = {Body::floatFromUInt8,  Body::floatFromUInt16, Body::uInt8FromFloat,
-                                           Body::uInt16FromFloat, Body::copyFloat,       Body::unitFromUInt8,
-                                           Body::floatFromHalf,   Body::clampedToUnit,   Body::uInt8FromUnit,
-                                           Body::halfFromUnit};
-    return KERNELS;
-}
+RowKernels const& avx2RowKernels() { return RowKernelBody<Vectors>::table(); }
 
 } // namespace ORVO::ImageRuntime::Internal

@@ -4,7 +4,7 @@ namespace ORVO::ImageRuntime::Internal {
 
 namespace {
 
-struct Operations {
+struct Vectors {
     template <bool bStream>
     static void store(float* pOutput, __m512 values) {
         if constexpr (bStream) {
@@ -34,6 +34,8 @@ struct Operations {
         }
     }
 
+    static __m512 load(float const* pInput) { return _mm512_loadu_ps(pInput); }
+
     static __m512 load(std::uint8_t const* pInput) {
         __m128i const bytes = _mm_loadu_si128(reinterpret_cast<__m128i const*>(pInput));
         return _mm512_cvtepi32_ps(_mm512_cvtepu8_epi32(bytes));
@@ -44,112 +46,53 @@ struct Operations {
         return _mm512_cvtepi32_ps(_mm512_cvtepu16_epi32(words));
     }
 
+    static __m512 scaled(__m512 values, float factor) {
+        return _mm512_mul_ps(values, _mm512_set1_ps(factor));
+    }
+
+    static __m512 divided(__m512 values, float divisor) {
+        return _mm512_div_ps(values, _mm512_set1_ps(divisor));
+    }
+
     /// Scaled, a NaN made 0, clamped, rounded.
-    static __m512i integers(float const* pInput, float white) {
-        __m512 const scaled = _mm512_mul_ps(_mm512_loadu_ps(pInput), _mm512_set1_ps(white));
-        __m512 const positive = _mm512_max_ps(scaled, _mm512_setzero_ps());
+    static __m512i integers(__m512 values, float white) {
+        __m512 const positive = _mm512_max_ps(scaled(values, white), _mm512_setzero_ps());
         return _mm512_cvt_roundps_epi32(_mm512_min_ps(positive, _mm512_set1_ps(white)),
                                         _MM_FROUND_TO_NEAREST_INT | _MM_FROUND_NO_EXC);
     }
 
     /// A NaN is the second operand that both comparisons give back.
-    static __m512 clamped(float const* pInput) {
-        __m512 const positive = _mm512_max_ps(_mm512_setzero_ps(), _mm512_loadu_ps(pInput));
+    static __m512 clamped(__m512 values) {
+        __m512 const positive = _mm512_max_ps(_mm512_setzero_ps(), values);
         return _mm512_min_ps(_mm512_set1_ps(1.0f), positive);
     }
 
-    struct FloatFromUInt8 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint8_t const* pInput) {
-            store<bStream>(pOutput, _mm512_mul_ps(load(pInput), _mm512_set1_ps(1.0f / 255.0f)));
-        }
-    };
+    static __m512i truncatedBytes(__m512 values) {
+        __m512 const positive = _mm512_max_ps(values, _mm512_setzero_ps());
+        __m512 const value = _mm512_min_ps(positive, _mm512_set1_ps(1.0f));
+        __m512i const truncated = _mm512_cvttps_epi32(_mm512_mul_ps(value, _mm512_set1_ps(255.0f)));
+        // The product may have been rounded up to an integer t. As 256 value - t is exact there, it is less
+        // than value exactly if 255 value is less than t.
+        __m512 const rest =
+            _mm512_sub_ps(_mm512_mul_ps(value, _mm512_set1_ps(256.0f)), _mm512_cvtepi32_ps(truncated));
+        __mmask16 const bTooLarge = _mm512_cmp_ps_mask(rest, value, _CMP_LT_OQ);
+        return _mm512_mask_sub_epi32(truncated, bTooLarge, truncated, _mm512_set1_epi32(1));
+    }
 
-    struct FloatFromUInt16 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint16_t const* pInput) {
-            store<bStream>(pOutput, _mm512_mul_ps(load(pInput), _mm512_set1_ps(1.0f / 32768.0f)));
-        }
-    };
+    static void floatFromHalf(float* pOutput, std::uint16_t const* pInput) {
+        __m256i const halves = _mm256_loadu_si256(reinterpret_cast<__m256i const*>(pInput));
+        store<false>(pOutput, _mm512_cvtph_ps(halves));
+    }
 
-    struct UInt8FromFloat {
-        template <bool bStream>
-        static void run(std::uint8_t* pOutput, float const* pInput) {
-            store<bStream>(pOutput, integers(pInput, 255.0f));
-        }
-    };
-
-    struct UInt16FromFloat {
-        template <bool bStream>
-        static void run(std::uint16_t* pOutput, float const* pInput) {
-            store<bStream>(pOutput, integers(pInput, 32768.0f));
-        }
-    };
-
-    struct CopyFloat {
-        template <bool bStream>
-        static void run(float* pOutput, float const* pInput) {
-            store<bStream>(pOutput, _mm512_loadu_ps(pInput));
-        }
-    };
-
-    struct UnitFromUInt8 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint8_t const* pInput) {
-            store<bStream>(pOutput, _mm512_div_ps(load(pInput), _mm512_set1_ps(255.0f)));
-        }
-    };
-
-    struct ClampedToUnit {
-        template <bool bStream>
-        static void run(float* pOutput, float const* pInput) {
-            store<bStream>(pOutput, clamped(pInput));
-        }
-    };
-
-    struct UInt8FromUnit {
-        template <bool bStream>
-        static void run(std::uint8_t* pOutput, float const* pInput) {
-            __m512 const positive = _mm512_max_ps(_mm512_loadu_ps(pInput), _mm512_setzero_ps());
-            __m512 const value = _mm512_min_ps(positive, _mm512_set1_ps(1.0f));
-            __m512i const truncated = _mm512_cvttps_epi32(_mm512_mul_ps(value, _mm512_set1_ps(255.0f)));
-            // The product may have been rounded up to an integer t. As 256 value - t is exact there, it is
-            // less than value exactly if 255 value is less than t.
-            __m512 const rest =
-                _mm512_sub_ps(_mm512_mul_ps(value, _mm512_set1_ps(256.0f)), _mm512_cvtepi32_ps(truncated));
-            __mmask16 const bTooLarge = _mm512_cmp_ps_mask(rest, value, _CMP_LT_OQ);
-            store<bStream>(pOutput,
-                           _mm512_mask_sub_epi32(truncated, bTooLarge, truncated, _mm512_set1_epi32(1)));
-        }
-    };
-
-    struct FloatFromHalf {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint16_t const* pInput) {
-            store<bStream>(pOutput,
-                           _mm512_cvtph_ps(_mm256_loadu_si256(reinterpret_cast<__m256i const*>(pInput))));
-        }
-    };
-
-    struct HalfFromUnit {
-        template <bool bStream>
-        static void run(std::uint16_t* pOutput, float const* pInput) {
-            __m256i const halves =
-                _mm512_cvtps_ph(clamped(pInput), _MM_FROUND_TO_NEAREST_INT | _MM_FROUND_NO_EXC);
-            _mm256_storeu_si256(reinterpret_cast<__m256i*>(pOutput), halves);
-        }
-    };
+    static void halfFromUnit(std::uint16_t* pOutput, float const* pInput) {
+        __m256i const halves =
+            _mm512_cvtps_ph(clamped(load(pInput)), _MM_FROUND_TO_NEAREST_INT | _MM_FROUND_NO_EXC);
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(pOutput), halves);
+    }
 };
 
 } // namespace
 
-RowKernels const& avx512RowKernels() {
-    using Body = RowKernelBody<Operations>;
-    static constexpr RowKernels KERNELS = {Body::floatFromUInt8,  Body::floatFromUInt16, Body::uInt8FromFloat,
-                                           Body::uInt16FromFloat, Body::copyFloat,       Body::unitFromUInt8,
-                                           Body::floatFromHalf,   Body::clampedToUnit,   Body::uInt8FromUnit,
-                                           Body::halfFromUnit};
-    return KERNELS;
-}
+RowKernels const& avx512RowKernels() { return RowKernelBody<Vectors>::table(); }
 
 } // namespace ORVO::ImageRuntime::Internal

@@ -6,32 +6,50 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <type_traits>
 
 namespace ORVO::ImageRuntime::Internal {
 
+namespace {
+
+/// A channel of a row, wherever the row lies in memory.
+template <class Channel>
+Channel get(Channel const* pRow, std::size_t i) {
+    Channel value;
+    std::memcpy(&value, reinterpret_cast<unsigned char const*>(pRow) + i * sizeof(Channel), sizeof(Channel));
+    return value;
+}
+
+template <class Channel>
+void put(Channel* pRow, std::size_t i, std::type_identity_t<Channel> value) {
+    std::memcpy(reinterpret_cast<unsigned char*>(pRow) + i * sizeof(Channel), &value, sizeof(Channel));
+}
+
+} // namespace
+
 void headFloatFromUInt8(float* pOutput, std::uint8_t const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
-        pOutput[i] = static_cast<float>(pInput[i]) / 255.0f;
+        put(pOutput, i, static_cast<float>(get(pInput, i)) / 255.0f);
     }
 }
 
 void headFloatFromUInt16(float* pOutput, std::uint16_t const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
-        pOutput[i] = static_cast<float>(pInput[i]) * 3.0517578125e-05f;
+        put(pOutput, i, static_cast<float>(get(pInput, i)) * 3.0517578125e-05f);
     }
 }
 
 void headUInt8FromFloat(std::uint8_t* pOutput, float const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
         // Out of range, the low byte of the integer is kept.
-        pOutput[i] = static_cast<std::uint8_t>(saturatingCast<std::int32_t>(pInput[i] * 255.0f));
+        put(pOutput, i, static_cast<std::uint8_t>(saturatingCast<std::int32_t>(get(pInput, i) * 255.0f)));
     }
 }
 
 void headUInt16FromFloat(std::uint16_t* pOutput, float const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
-        float const clamped = std::min(std::max(pInput[i], 0.0f), 1.0f);
-        pOutput[i] = saturatingCast<std::uint16_t>(std::floor(clamped * 32768.0f + 0.5f));
+        float const clamped = std::min(std::max(get(pInput, i), 0.0f), 1.0f);
+        put(pOutput, i, saturatingCast<std::uint16_t>(std::floor(clamped * 32768.0f + 0.5f)));
     }
 }
 
@@ -39,13 +57,13 @@ namespace {
 
 void groupsFloatFromUInt8(float* pOutput, std::uint8_t const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
-        pOutput[i] = static_cast<float>(pInput[i]) * (1.0f / 255.0f);
+        put(pOutput, i, static_cast<float>(get(pInput, i)) * (1.0f / 255.0f));
     }
 }
 
 void groupsFloatFromUInt16(float* pOutput, std::uint16_t const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
-        pOutput[i] = static_cast<float>(static_cast<double>(pInput[i]) * 3.0517578125e-05);
+        put(pOutput, i, static_cast<float>(static_cast<double>(get(pInput, i)) * 3.0517578125e-05));
     }
 }
 
@@ -61,10 +79,10 @@ int roundedToNearest(float value) {
 template <class Integer>
 void groupsIntegerFromFloat(Integer* pOutput, float const* pInput, std::size_t n, float white) {
     for (std::size_t i = 0; i < n; ++i) {
-        float const scaled = pInput[i] * white;
+        float const scaled = get(pInput, i) * white;
         // The comparisons are false for a NaN, which thus becomes 0.
         float const clamped = scaled > 0.0f ? std::min(scaled, white) : 0.0f;
-        pOutput[i] = static_cast<Integer>(roundedToNearest(clamped));
+        put(pOutput, i, static_cast<Integer>(roundedToNearest(clamped)));
     }
 }
 
@@ -112,8 +130,9 @@ void copyFloat(float* pOutput, float const* pInput, std::size_t n, StoreMode) {
 void floatFromHalf(float* pOutput, std::uint16_t const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
         // A signalling NaN is made quiet, as the processor's own conversion does.
-        bool const bNaN = (pInput[i] & 0x7fff) > 0x7c00;
-        pOutput[i] = half::fromBits(static_cast<std::uint16_t>(bNaN ? pInput[i] | 0x0200 : pInput[i]));
+        std::uint16_t const bits = get(pInput, i);
+        bool const bNaN = (bits & 0x7fff) > 0x7c00;
+        put(pOutput, i, half::fromBits(static_cast<std::uint16_t>(bNaN ? bits | 0x0200 : bits)));
     }
 }
 
@@ -121,20 +140,21 @@ float clampedToUnit(float value) { return value > 1.0f ? 1.0f : value < 0.0f ? 0
 
 void clampedToUnit(float* pOutput, float const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
-        pOutput[i] = clampedToUnit(pInput[i]);
+        put(pOutput, i, clampedToUnit(get(pInput, i)));
     }
 }
 
 void uInt8FromUnit(std::uint8_t* pOutput, float const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
         // In double the product of a float and 255 is exact.
-        pOutput[i] = saturatingCast<std::uint8_t>(static_cast<double>(clampedToUnit(pInput[i])) * 255.0);
+        put(pOutput, i,
+            saturatingCast<std::uint8_t>(static_cast<double>(clampedToUnit(get(pInput, i))) * 255.0));
     }
 }
 
 void halfFromUnit(std::uint16_t* pOutput, float const* pInput, std::size_t n) {
     for (std::size_t i = 0; i < n; ++i) {
-        pOutput[i] = half(clampedToUnit(pInput[i])).bits();
+        put(pOutput, i, half(clampedToUnit(get(pInput, i))).bits());
     }
 }
 

@@ -4,7 +4,7 @@ namespace ORVO::ImageRuntime::Internal {
 
 namespace {
 
-struct Operations {
+struct Vectors {
     /// A block as four vectors.
     struct Floats {
         __m128 part[4];
@@ -84,6 +84,13 @@ struct Operations {
         return values;
     }
 
+    static Floats divided(Floats values, float divisor) {
+        for (__m128& part : values.part) {
+            part = _mm_div_ps(part, _mm_set1_ps(divisor));
+        }
+        return values;
+    }
+
     /// Scaled, a NaN made 0, clamped, rounded.
     static Integers integers(Floats const& values, float white) {
         Integers result;
@@ -113,94 +120,23 @@ struct Operations {
         return _mm_add_epi32(truncated, _mm_castps_si128(_mm_cmplt_ps(rest, value)));
     }
 
-    struct FloatFromUInt8 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint8_t const* pInput) {
-            store<bStream>(pOutput, scaled(load(pInput), 1.0f / 255.0f));
-        }
-    };
-
-    struct FloatFromUInt16 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint16_t const* pInput) {
-            store<bStream>(pOutput, scaled(load(pInput), 1.0f / 32768.0f));
-        }
-    };
-
-    struct UInt8FromFloat {
-        template <bool bStream>
-        static void run(std::uint8_t* pOutput, float const* pInput) {
-            store<bStream>(pOutput, integers(load(pInput), 255.0f));
-        }
-    };
-
-    struct UInt16FromFloat {
-        template <bool bStream>
-        static void run(std::uint16_t* pOutput, float const* pInput) {
-            store<bStream>(pOutput, integers(load(pInput), 32768.0f));
-        }
-    };
-
-    struct CopyFloat {
-        template <bool bStream>
-        static void run(float* pOutput, float const* pInput) {
-            store<bStream>(pOutput, load(pInput));
-        }
-    };
-
-    struct UnitFromUInt8 {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint8_t const* pInput) {
-            Floats values = load(pInput);
-            for (__m128& part : values.part) {
-                part = _mm_div_ps(part, _mm_set1_ps(255.0f));
-            }
-            store<bStream>(pOutput, values);
-        }
-    };
-
-    struct ClampedToUnit {
-        template <bool bStream>
-        static void run(float* pOutput, float const* pInput) {
-            store<bStream>(pOutput, clamped(load(pInput)));
-        }
-    };
-
-    struct UInt8FromUnit {
-        template <bool bStream>
-        static void run(std::uint8_t* pOutput, float const* pInput) {
-            Floats const values = load(pInput);
-            store<bStream>(pOutput,
-                           Integers{{truncatedBytes(values.part[0]), truncatedBytes(values.part[1]),
-                                     truncatedBytes(values.part[2]), truncatedBytes(values.part[3])}});
-        }
-    };
+    static Integers truncatedBytes(Floats const& values) {
+        return {{truncatedBytes(values.part[0]), truncatedBytes(values.part[1]),
+                 truncatedBytes(values.part[2]), truncatedBytes(values.part[3])}};
+    }
 
     // There are no instructions for halves in this set.
-    struct FloatFromHalf {
-        template <bool bStream>
-        static void run(float* pOutput, std::uint16_t const* pInput) {
-            plainRowKernels().floatFromHalf(pOutput, pInput, 16);
-        }
-    };
+    static void floatFromHalf(float* pOutput, std::uint16_t const* pInput) {
+        plainRowKernels().floatFromHalf(pOutput, pInput, 16);
+    }
 
-    struct HalfFromUnit {
-        template <bool bStream>
-        static void run(std::uint16_t* pOutput, float const* pInput) {
-            plainRowKernels().halfFromUnit(pOutput, pInput, 16);
-        }
-    };
+    static void halfFromUnit(std::uint16_t* pOutput, float const* pInput) {
+        plainRowKernels().halfFromUnit(pOutput, pInput, 16);
+    }
 };
 
 } // namespace
 
-RowKernels const& sse2RowKernels() {
-    using Body = RowKernelBody<Operations>;
-    static constexpr RowKernels KERNELS = {Body::floatFromUInt8,  Body::floatFromUInt16, Body::uInt8FromFloat,
-                                           Body::uInt16FromFloat, Body::copyFloat,       Body::unitFromUInt8,
-                                           Body::floatFromHalf,   Body::clampedToUnit,   Body::uInt8FromUnit,
-                                           Body::halfFromUnit};
-    return KERNELS;
-}
+RowKernels const& sse2RowKernels() { return RowKernelBody<Vectors>::table(); }
 
 } // namespace ORVO::ImageRuntime::Internal

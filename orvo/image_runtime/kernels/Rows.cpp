@@ -4,6 +4,7 @@
 #include "orvo/image_runtime/images/ImageCPU.h"
 #include "orvo/image_runtime/images/ImageCPUReadAccessor.h"
 #include "orvo/image_runtime/images/ImageCPUWriteAccessor.h"
+#include "orvo/image_runtime/kernels/PixelRuns.h"
 #include "orvo/image_runtime/kernels/RowKernelTables.h"
 
 #include <algorithm>
@@ -168,14 +169,15 @@ void writeRearranged(RowKernels const& kernels, RowFormat const& format, unsigne
 
 } // namespace
 
-void readRowAsRGBAFloat(ImageCPU const& image, int y, int beginX, int endX, float* pRGBA) {
+namespace Internal {
+
+void readPixelRun(ImageCPU const& image, int x, int y, std::size_t nPixels, float* pRGBA) {
     RowFormat const format = rowFormatOf(image);
-    std::size_t const nPixels = pixelsOf(beginX, endX);
     if (!nPixels) {
         return;
     }
     RowKernels const& kernels = kernelsFor(nPixels);
-    unsigned char const* const pRow = image.pixels() + byteOffset(image, format, beginX, y);
+    unsigned char const* const pRow = image.pixels() + byteOffset(image, format, x, y);
     if (format.nPixelChannels == 3) {
         readThreeChannels(kernels, format, pRGBA, pRow, nPixels);
         return;
@@ -186,19 +188,28 @@ void readRowAsRGBAFloat(ImageCPU const& image, int y, int beginX, int endX, floa
     }
 }
 
-void writeRowFromRGBAFloat(ImageCPU& image, int y, int beginX, int endX, float const* pRGBA) {
+void writePixelRun(ImageCPU& image, int x, int y, std::size_t nPixels, float const* pRGBA) {
     RowFormat const format = rowFormatOf(image);
-    std::size_t const nPixels = pixelsOf(beginX, endX);
     if (!nPixels) {
         return;
     }
     RowKernels const& kernels = kernelsFor(nPixels);
-    unsigned char* const pRow = image.pixels() + byteOffset(image, format, beginX, y);
+    unsigned char* const pRow = image.pixels() + byteOffset(image, format, x, y);
     if (format.nPixelChannels == 4 && !format.bBlueFirst) {
         store(kernels, format, pRow, pRGBA, 4 * nPixels);
     } else {
         writeRearranged(kernels, format, pRow, pRGBA, nPixels);
     }
+}
+
+} // namespace Internal
+
+void readRowAsRGBAFloat(ImageCPU const& image, int y, int beginX, int endX, float* pRGBA) {
+    Internal::readPixelRun(image, beginX, y, pixelsOf(beginX, endX), pRGBA);
+}
+
+void writeRowFromRGBAFloat(ImageCPU& image, int y, int beginX, int endX, float const* pRGBA) {
+    Internal::writePixelRun(image, beginX, y, pixelsOf(beginX, endX), pRGBA);
 }
 
 void readRowAsRGBAFloat(ImageReadAccessor const& accessor, int y, int beginX, int endX, float* pRGBA) {

@@ -7,6 +7,7 @@
 #include "orvo/core/exceptions/SharedException.h"
 #include "orvo/core/utility/SharedPtr.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 namespace {
 
@@ -33,6 +34,18 @@ TEST(ExceptionBase, IsAStandardExceptionWithATextAndAClone) {
     EXPECT_EQ("ORVO exception", written(copy));
     std::unique_ptr<ExceptionBase> const pClone(static_cast<ExceptionBase const&>(original).clone());
     EXPECT_NE(nullptr, dynamic_cast<PlainException*>(pClone.get()));
+}
+
+/// what() is noexcept, which is part of its type.
+std::ptrdiff_t slotOfWhat() {
+    return ORVO::Test::constSlotOf(static_cast<char const* (ExceptionBase::*)() const>(&ExceptionBase::what));
+}
+
+TEST(ExceptionBase, HasItsOperationsInOrder) {
+    // The destructor stands first.
+    EXPECT_EQ(2, slotOfWhat());
+    EXPECT_EQ(3, ORVO::Test::constSlotOf(&ExceptionBase::clone));
+    EXPECT_EQ(4, ORVO::Test::constSlotOf(&ExceptionBase::write));
 }
 
 TEST(Exceptions, HaveTheirBases) {

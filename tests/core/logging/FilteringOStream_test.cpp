@@ -4,6 +4,7 @@
 
 #include <cctype>
 #include <iomanip>
+#include <locale>
 #include <sstream>
 #include <string>
 
@@ -86,6 +87,19 @@ TEST(FilteringOStream, TakesOverTheNumberFormat) {
     FilteringOStream<LoggingInserter> stream(target);
     stream << 255 << ' ' << 1.23456 << ' ' << std::setw(4) << 1;
     EXPECT_EQ("ff 1.23 ***1", target.str());
+}
+
+/// Numbers with a decimal comma.
+struct DecimalComma : std::numpunct<char> {
+    char do_decimal_point() const override { return ','; }
+};
+
+TEST(FilteringOStream, TakesOverTheLocale) {
+    std::ostringstream target;
+    target.imbue(std::locale(std::locale::classic(), new DecimalComma));
+    FilteringOStream<LoggingInserter> stream(target);
+    stream << 1.5;
+    EXPECT_EQ("1,5", target.str());
 }
 
 TEST(FilteringOStream, GoesBadWhereTheInserterRefuses) {

@@ -1,12 +1,14 @@
 #include "orvo/data_flow/connectors/Inputs.h"
 
 #include "orvo/core/memory/AllocationFailure.h"
+#include "orvo/data_flow/connectors/Connect.h"
 #include "tests/data_flow/connectors/Payload.h"
 #include "tests/support/Expect.h"
 
 #include <gtest/gtest.h>
 
 #include <new>
+#include <type_traits>
 #include <utility>
 
 namespace {
@@ -45,6 +47,21 @@ TYPED_TEST(InputsTest, AccessNeedsAnObject) {
 TYPED_TEST(InputsTest, FetchingNeedsAPartner) {
     TypeParam oInput("in", nullptr);
     ORVO_EXPECT_INTERNAL(oInput.fetchInput(), "Enforce pConnectedOutput_ != NULL");
+}
+
+TYPED_TEST(InputsTest, KnowsItsPartnerByItsType) {
+    struct OpenInput : TypeParam {
+        using TypeParam::typedOutput;
+        using TypeParam::TypeParam;
+    };
+    static_assert(
+        std::is_same_v<decltype(std::declval<OpenInput const&>().typedOutput()), OutputTemplate<Payload>*>);
+    OpenInput oInput("in", nullptr);
+    ORVO_EXPECT_INTERNAL((void)oInput.typedOutput(), "Enforce pConnectedOutput_ != NULL");
+    Output<Payload> oOutput("out", nullptr);
+    Connect(oInput, oOutput);
+    EXPECT_EQ(&oOutput, oInput.typedOutput());
+    oInput.disconnect();
 }
 
 TYPED_TEST(InputsTest, SetDataTakesOrShares) {

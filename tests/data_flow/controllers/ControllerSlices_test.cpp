@@ -142,9 +142,15 @@ TEST_F(ControllerSlicesTest, NullNodeIsRefused) {
 }
 
 TEST_F(ControllerSlicesTest, NodeThatReportsItemsMustOverrideProcessSlice) {
-    struct Careless : SumNode {
-        Careless() : SumNode("careless", 0) { setSlices(4); }
-        void processSlice(std::size_t begin, std::size_t end) override { Node::processSlice(begin, end); }
+    struct Careless : DataFlow::Node {
+        Careless() : Node("careless") {}
+        BlockedRange rangeToProcess() override {
+            BlockedRange range;
+            range.items = 4;
+            range.unitsPerItem = 1;
+            return range;
+        }
+        void internalProcess() override { controller()->processSlices(this); }
     };
     Careless careless;
     controller.addNode(&careless);
@@ -185,6 +191,13 @@ TEST_F(ControllerSlicesTest, GrainIsGivenInWorkUnits) {
             EXPECT_GE(slice.end - slice.begin, std::max<std::size_t>(1, row.nGrain / 2))
                 << row.nMinimum << " over " << row.nUnits;
         }
+        // A range of one grain is not cut, one item more is.
+        node.setSlices(row.nGrain, row.nUnits);
+        frame();
+        EXPECT_EQ(1u, record.take().size()) << row.nMinimum << " over " << row.nUnits;
+        node.setSlices(row.nGrain + 1, row.nUnits);
+        frame();
+        EXPECT_EQ(2u, record.take().size()) << row.nMinimum << " over " << row.nUnits;
     }
 }
 

@@ -75,7 +75,7 @@ protected:
 
     /// Name of the node that the operation makes; empty if it makes none.
     static std::string nameAndFree(Node* pNode) {
-        std::string const sName = pNode != nullptr ? pNode->name() : std::string();
+        std::string sName = pNode != nullptr ? pNode->name() : std::string();
         trackedDelete(pNode);
         return sName;
     }

@@ -52,18 +52,18 @@ public:
 
 protected:
     void preProcess() override {
-        aCalls_.push_back("preProcess");
+        aCalls_.emplace_back("preProcess");
         Node::preProcess();
     }
     void internalProcess() override {
-        aCalls_.push_back("internalProcess");
+        aCalls_.emplace_back("internalProcess");
         Node::internalProcess();
         if (pfnWork_) {
             pfnWork_();
         }
     }
     void postProcess() override {
-        aCalls_.push_back("postProcess");
+        aCalls_.emplace_back("postProcess");
         Node::postProcess();
     }
 
@@ -72,7 +72,7 @@ private:
     Connector& keep(std::unique_ptr<Connector> spInput,
                     std::vector<std::unique_ptr<DataFlow::InputConnector>>& aOwned) {
         Connector& oInput = *spInput;
-        aOwned.push_back(std::move(spInput));
+        aOwned.emplace_back(std::move(spInput));
         addInput(&oInput);
         return oInput;
     }
@@ -80,7 +80,7 @@ private:
     Connector& keep(std::unique_ptr<Connector> spOutput,
                     std::vector<std::unique_ptr<DataFlow::OutputConnector>>& aOwned) {
         Connector& oOutput = *spOutput;
-        aOwned.push_back(std::move(spOutput));
+        aOwned.emplace_back(std::move(spOutput));
         addOutput(&oOutput);
         return oOutput;
     }

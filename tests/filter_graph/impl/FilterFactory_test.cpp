@@ -5,6 +5,7 @@
 #include "orvo/filter_graph/impl/Connect.h"
 #include "orvo/filter_graph/impl/Input.h"
 #include "orvo/filter_graph/impl/Parameter.h"
+#include "tests/filter_graph/support/ForeignFilter.h"
 #include "tests/filter_graph/support/PlainFilter.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ExpectFilterGraph.h"
@@ -13,6 +14,7 @@
 namespace ORVO::FilterGraph {
 namespace {
 
+using ORVO::Test::ForeignFilter;
 using ORVO::Test::PlainFilter;
 
 IODataDescriptors channels(std::size_t n) { return {{DataDescriptor(n)}, {DataDescriptor(n)}}; }
@@ -40,33 +42,6 @@ protected:
         addParameter(OwnedParameter(new Parameter<int>("late", 3, false)));
         PlainFilter::finishLazyInitialization();
     }
-};
-
-/// A filter that the library did not make possible.
-class ForeignFilter : public IFilter {
-public:
-    Identifier const& identifier() const override { return identifier_; }
-    std::size_t nChannel() const override { return 0; }
-    InputConstIterator inputs() const override { return {}; }
-    InputIterator inputs() override { return {}; }
-    Input const* input(std::string const&) const override { return nullptr; }
-    Input* input(std::string const&) override { return nullptr; }
-    std::size_t getNumberOfInputs() const override { return 0; }
-    Output const* output(std::string const&) const override { return nullptr; }
-    Output* output(std::string const&) override { return nullptr; }
-    Output const* output() const override { return nullptr; }
-    Output* output() override { return nullptr; }
-    ParameterConstIterator parameters() const override { return {}; }
-    ParameterIterator parameters() override { return {}; }
-    ParameterBase const* parameter(std::string const&) const override { return nullptr; }
-    ParameterBase* parameter(std::string const&) override { return nullptr; }
-    std::size_t getNumberOfParameters() const override { return 0; }
-    MetadataConstIterator metadata() const override { return {}; }
-    MetadataItemBase const* metadataItem(std::string const&) const override { return nullptr; }
-    std::size_t getNumberOfMetadataItems() const override { return 0; }
-
-private:
-    Identifier identifier_{"foreign", "test", "ORVO", 1};
 };
 
 class FilterFactoryTest : public testing::Test {

@@ -55,5 +55,33 @@ TEST_F(CheckTimeStampVisitorTest, RefusesAnEmptyEntryUnlessItHasFailedAlready) {
     EXPECT_FALSE(visitor.isUpToDate());
 }
 
+TEST_F(CheckTimeStampVisitorTest, RemembersTheOrderOfTheLastWalkAndNoticesAnother) {
+    auto const spA = makeFilter<GainNode>();
+    auto const spB = makeFilter<GainNode>();
+    auto const spC = makeFilter<GainNode>();
+    for (auto const& spFilter : {spA, spB, spC}) {
+        oClones_[spFilter.get()] = spFilter->clone();
+    }
+    CheckTimeStampVisitor::Memory memory;
+    auto const upToDate = [&](std::vector<Filter*> const& aVisits) {
+        CheckTimeStampVisitor visitor(&oClones_, &memory);
+        for (Filter* const pFilter : aVisits) {
+            visitor.preVisit(pFilter);
+        }
+        return visitor.isUpToDate();
+    };
+    EXPECT_TRUE(upToDate({spA.get(), spB.get(), spC.get()}));
+    EXPECT_EQ(memory.size(), 3u);
+    EXPECT_TRUE(upToDate({spA.get(), spB.get(), spC.get()}));
+    EXPECT_TRUE(upToDate({spA.get(), spC.get()}));
+    EXPECT_TRUE(upToDate({spC.get(), spB.get(), spA.get()}));
+    auto const spStranger = makeFilter<GainNode>();
+    EXPECT_FALSE(upToDate({spC.get(), spStranger.get(), spA.get()}));
+    spB->updateTimeStamp();
+    EXPECT_TRUE(upToDate({spC.get(), spA.get()}));
+    EXPECT_FALSE(upToDate({spC.get(), spA.get(), spB.get()}));
+    EXPECT_FALSE(upToDate({spC.get(), spA.get(), spB.get()}));
+}
+
 } // namespace
 } // namespace ORVO::FilterGraph::Internal

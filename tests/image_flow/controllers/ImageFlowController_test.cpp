@@ -8,6 +8,7 @@
 #include "tests/support/ImageFlowLayers.h"
 
 #include <deque>
+#include <initializer_list>
 
 namespace ORVO {
 
@@ -270,15 +271,40 @@ TEST_F(ImageFlowControllerTest, infiniteComputeRegionsAreRefused) {
     EXPECT_EQ(world(1, 1, 8, 8), graph.a.computeRegionParameter().value());
 }
 
+/// A filter that cannot say what it needs.
+class HelplessFilter : public TestFilter {
+public:
+    PositionExtentInWorldSpace needed(PositionExtentInWorldSpace const& outputRegion, std::string inputName,
+                                      RegionMap const& inputDODs) override {
+        ORVO_CHECK(!bHelpless_, "helpless");
+        return TestFilter::needed(outputRegion, inputName, inputDODs);
+    }
+    bool bHelpless_ = true;
+};
+
 TEST_F(ImageFlowControllerTest, regionsOfAFailedPassAreForgotten) {
-    Diamond graph;
-    // b is asked for before c fails to find its producer, so that a is left with one region of two.
-    graph.oController_.computeRegions(world(0, 0, 4, 4));
-    graph.a.setParentROI(world(50, 50, 1, 1));
-    graph.b.setParentROI(world(60, 60, 1, 1));
-    graph.oController_.computeRegions(world(0, 0, 4, 4));
-    EXPECT_EQ(world(0, 0, 4, 4), graph.a.regionOfInterest());
-    EXPECT_EQ(world(0, 0, 4, 4), graph.b.regionOfInterest());
+    TestFilter source(0, true, "source");
+    HelplessFilter first;
+    TestFilter second(1, true, "second");
+    TestFilter sink(2, false, "sink");
+    feed(first, 0, source);
+    feed(second, 0, source);
+    feed(sink, 0, first);
+    feed(sink, 1, second);
+    ImageFlowController controller;
+    for (TestFilter* pFilter : std::initializer_list<TestFilter*>{&source, &first, &second, &sink}) {
+        controller.addNode(pFilter);
+    }
+    controller.setImageSink(sink);
+    source.setGeneratedRegion(world(0, 0, 100, 100));
+    ORVO_EXPECT_INTERNAL(controller.computeRegions(world(50, 50, 4, 4)), "helpless");
+    // The source is left with the region of one consumer of two.
+    EXPECT_EQ(1u, source.aParentROIs_.size());
+    first.bHelpless_ = false;
+    controller.computeRegions(world(0, 0, 4, 4));
+    EXPECT_EQ(world(0, 0, 4, 4), source.regionOfInterest());
+    EXPECT_EQ(world(0, 0, 4, 4), source.computeRegionParameter().value());
+    EXPECT_TRUE(source.aParentROIs_.empty());
 }
 
 TEST_F(ImageFlowControllerTest, anOutputThatNobodyConsumesFailsThePass) {

@@ -268,6 +268,54 @@ TEST_F(ImageFramesTest, onlyWhatChangedRunsAgain) {
     graph.expectRight();
 }
 
+/// Halves the resolution: each pixel is the mean of the four that lie under it.
+class HalvingFilter : public TestFilter {
+public:
+    HalvingFilter() { setOutputPixelExtent(PixelExtentInWorldSpace(2, 2)); }
+    void processSlice(std::size_t begin, std::size_t end) override {
+        PositionInPixelSpace const corner = oOutputRegionInPixels_.position();
+        for (int y = corner.y() + int(begin); y < corner.y() + int(end); ++y) {
+            for (int x = corner.x(); x < corner.x() + oOutputRegionInPixels_.extent().width(); ++x) {
+                float const* const pUpper = pixelAt(*in(), 2 * x, 2 * y);
+                float const* const pLower = pixelAt(*in(), 2 * x, 2 * y + 1);
+                *pixelAt(*spOutputImage_, x, y) = (pUpper[0] + pUpper[1] + pLower[0] + pLower[1]) / 4;
+            }
+        }
+    }
+};
+
+TEST_F(ImageFramesTest, aChainMayChangeTheResolution) {
+    ImagePtr const upImage =
+        floatImage(pixels(-4, -6, 12, 16), [](int x, int y) { return float(x + 100 * y); });
+    ImageFlowController controller;
+    ImageCPUInput source;
+    HalvingFilter halving;
+    TestFilter after;
+    ImageCPUOutput sink;
+    after.iRadius_ = 1;
+    feed(halving, 0, source);
+    feed(after, 0, halving);
+    feed(sink, 0, after);
+    for (ImageFilter* pFilter : std::initializer_list<ImageFilter*>{&source, &halving, &after, &sink}) {
+        controller.addNode(pFilter);
+    }
+    controller.setImageSink(sink);
+    source.setImageCPUWithNoOwnership(upImage.get());
+    source.emit();
+    controller.computeRegions(world(0, 0, 4, 2));
+    // One pixel of 2 by 2 on each side.
+    EXPECT_EQ(world(-2, -2, 8, 6), halving.regionOfInterest());
+    controller.process();
+    ImageCPU const& result = *sink.getImageCPU();
+    EXPECT_EQ(pixels(0, 0, 2, 1), result.positionExtent());
+    EXPECT_EQ(PixelExtentInWorldSpace(2, 2), result.pixelExtent());
+    // The mean of a linear picture over the window's pixels -2 to 3 (x) and -2 to 3 (y) is its value in the
+    // middle.
+    EXPECT_FLOAT_EQ(0.5f + 50.0f, *pixelAt(result, 0, 0));
+    EXPECT_FLOAT_EQ(2.5f + 50.0f, *pixelAt(result, 1, 0));
+    sink.disconnect();
+}
+
 TEST_F(ImageFramesTest, everyAllocationOfAFrameMayFail) {
     int nFailures = 0;
     for (std::uint64_t n = 1;; ++n) {

@@ -2,12 +2,14 @@
 #include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
 
 #include "orvo/core/exceptions/SharedException.h"
+#include "orvo/image_runtime/BlankSIMDOptimizedImageCPU.h"
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
 
 #include <cmath>
 #include <cstring>
+#include <memory>
 
 namespace ORVO {
 
@@ -289,23 +291,135 @@ TEST_F(ConvertSIMDOptimizedTest, refuseAnInputThatDoesNotCoverTheRegion) {
     EXPECT_NEAR(numberAt(image, 7, 7, 3), numberAt(result, 7, 7, 3), 1e-6);
 }
 
+/// The converter with its image in the making.
+class OpenConverter : public ConvertToSIMDOptimized {
+public:
+    ~OpenConverter() override { disconnect(); }
+    void setInput(ImageCPU* pImage) {
+        static_cast<DataFlow::ConstInput<ImageCPU>&>(*imageInput(0)).setData(pImage);
+    }
+    using ConvertToSIMDOptimized::spOutputImage_;
+};
+
+/// Leaves a block without a zero in the store that the next image of this kind comes from.
+void soilStorage(int channels, ExtentInPixelSpace const& extent) {
+    std::unique_ptr<ImageCPU, ORVODeleter<ImageCPU>> const upImage(
+        ImageRuntime::getBlankSIMDOptimized32FFormat(channels, extent, PixelExtentInWorldSpace(),
+                                                     PositionInPixelSpace(0, 0)));
+    ExtentInPixelSpace const capacity = upImage->capacityExtent();
+    std::memset(upImage->pixels(), 0x41,
+                std::size_t(capacity.width()) * std::size_t(capacity.height()) * std::size_t(channels) * 4);
+}
+
 TEST_F(ConvertSIMDOptimizedTest, aNewImageIsTransparentBlackWhereNothingIsConverted) {
-    ConvertToSIMDOptimized converter;
-    converter.outputPrecisionHintParameter().setValue(ImageFilter::OUTPUT_PRECISION_8_BIT_INT);
-    ORVO_EXPECT_INTERNAL(converter.allocateOutputImage(),
-                         "Not implemented: pixelFormat not supported in ImageFilter::allocateOutputImage()");
-    Road<ConvertToSIMDOptimized> road;
-    ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGB8, pixels(0, 0, 100, 2), 100);
-    paint(image);
-    ImageCPU const& result = road.run(image, world(0, 0, 100, 2));
-    // A copy takes over the storage as it is: 112 pixels a row for 101 pixels rounded up to 192 bytes.
-    ASSERT_EQ(ExtentInPixelSpace(112, 2), result.capacityExtent());
-    for (int x = 100; x < 112; ++x) {
-        EXPECT_EQ(0.0f, pixelAt(result, x, 1)[0]);
+    OpenConverter converter;
+    converter.setImageDescInfoFromSource(true);
+    converter.setInput(ORVO_NEW ImageCPU(ImageCPU::PIXEL_FORMAT_RGB8, pixels(0, 0, 100, 2),
+                                         PixelExtentInWorldSpace(), ExtentInPixelSpace()));
+    converter.computeRegionParameter().setValue(world(0, 0, 100, 2));
+    soilStorage(3, ExtentInPixelSpace(100, 2));
+    converter.allocateOutputImage();
+    ImageCPU const& covered = *converter.spOutputImage_;
+    // 101 pixels of 12 bytes, rounded up to whole 192 bytes, are 112 pixels.
+    ASSERT_EQ(ExtentInPixelSpace(112, 2), covered.capacityExtent());
+    for (int y = 0; y < 2; ++y) {
+        for (int x = 100; x < 112; ++x) {
+            for (int c = 0; c < 3; ++c) {
+                EXPECT_EQ(0.0f, pixelAt(covered, x, y)[c]) << x << ", " << y;
+            }
+        }
+    }
+    // A region of the same size that leaves the input: its pixels too.
+    converter.flush();
+    converter.setInput(ORVO_NEW ImageCPU(ImageCPU::PIXEL_FORMAT_RGB8, pixels(0, 0, 100, 2),
+                                         PixelExtentInWorldSpace(), ExtentInPixelSpace()));
+    converter.computeRegionParameter().setValue(world(5, 0, 100, 2));
+    soilStorage(3, ExtentInPixelSpace(100, 2));
+    converter.allocateOutputImage();
+    ImageCPU const& partly = *converter.spOutputImage_;
+    for (int y = 0; y < 2; ++y) {
+        for (int x = 5; x < 117; ++x) {
+            EXPECT_EQ(0.0f, pixelAt(partly, x, y)[2]) << x << ", " << y;
+        }
     }
 }
 
+TEST_F(ConvertSIMDOptimizedTest, columnsBeyondTheInputStayTransparentBlack) {
+    Road<ConvertToSIMDOptimized> road;
+    ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 8, 4), 8);
+    std::memset(image.pixels(), 255, 8 * 4 * 4);
+    road.oSource_.setGeneratedRegion(world(0, 0, 12, 4));
+    soilStorage(4, ExtentInPixelSpace(12, 4));
+    ImageCPU const& result = road.run(image, world(0, 0, 12, 4));
+    ASSERT_EQ(pixels(0, 0, 12, 4), result.positionExtent());
+    for (int y = 0; y < 4; ++y) {
+        for (int x = 0; x < 12; ++x) {
+            EXPECT_NEAR(x < 8 ? 1.0f : 0.0f, pixelAt(result, x, y)[3], 1e-6f) << x << ", " << y;
+        }
+    }
+}
+
+TEST_F(ConvertSIMDOptimizedTest, channelsAndHintDecideWhereTheSourceDoesNot) {
+    struct Row {
+        ImageCPU::tePixelFormat source;
+        ImageCPU::tePixelFormat result;
+    };
+    for (Row const& row :
+         {Row{ImageCPU::PIXEL_FORMAT_LUMINANCE8, ImageCPU::PIXEL_FORMAT_LUMINANCE32F},
+          Row{ImageCPU::PIXEL_FORMAT_LUMINANCE_ALPHA8, ImageCPU::PIXEL_FORMAT_LUMINANCE_ALPHA32F},
+          Row{ImageCPU::PIXEL_FORMAT_RGB8, ImageCPU::PIXEL_FORMAT_RGB32F},
+          Row{ImageCPU::PIXEL_FORMAT_BGRA8, ImageCPU::PIXEL_FORMAT_RGBA32F}}) {
+        for (int hint = 0; hint <= 5; ++hint) {
+            SCOPED_TRACE(testing::Message() << row.source << ", hint " << hint);
+            ImageCPU image = makeImage(row.source, pixels(0, 0, 4, 4), 4);
+            ImageCPUInput source;
+            source.setImageCPUWithNoOwnership(&image);
+            OpenConverter converter;
+            feed(converter, 0, source);
+            converter.computeImageDescriptorInfo(static_cast<Hint>(hint));
+            converter.computeRegionParameter().setValue(world(0, 0, 4, 4));
+            if (hint == 2) {
+                ORVO_EXPECT_INTERNAL(converter.allocateOutputImage(),
+                                     "Pixel format not supported by ORVO in CPU mode");
+            } else if (hint > 3) {
+                ORVO_EXPECT_INTERNAL(
+                    converter.allocateOutputImage(),
+                    "Not implemented: Data type not supported in ImageFilter::allocateOutputImage()");
+            } else {
+                converter.allocateOutputImage();
+                ImageCPU const* const pImage = converter.spOutputImage_.get();
+                ASSERT_NE(nullptr, pImage);
+                EXPECT_EQ(row.result, pImage->pixelFormat());
+                EXPECT_TRUE(pImage->isInSIMDOptimizedFormat());
+                converter.allocateOutputImage(); // there is one already
+                EXPECT_EQ(pImage, converter.spOutputImage_.get());
+                continue;
+            }
+            EXPECT_EQ(nullptr, converter.spOutputImage_.get());
+        }
+    }
+}
+
+TEST_F(ConvertSIMDOptimizedTest, followThePixelExtentOfTheSource) {
+    ImageCPU image(ImageCPU::PIXEL_FORMAT_LUMINANCE8, pixels(-2, 1, 4, 2), PixelExtentInWorldSpace(2, 0.5f),
+                   ExtentInPixelSpace(4, 2));
+    std::memset(image.pixels(), 255, 8);
+    image.pixels()[7] = 0;
+    Road<ConvertToSIMDOptimized> road;
+    road.oSource_.setOutputPixelExtent(PixelExtentInWorldSpace(2, 0.5f));
+    // The columns -1 to 2 and the row 2 of pixels that are 2 wide and 0.5 high.
+    ImageCPU const& result = road.run(image, world(-2, 1, 6, 0.5f));
+    EXPECT_EQ(pixels(-1, 2, 3, 1), result.positionExtent());
+    EXPECT_EQ(PixelExtentInWorldSpace(2, 0.5f), result.pixelExtent());
+    EXPECT_NEAR(1.0f, *pixelAt(result, -1, 2), 1e-6f);
+    EXPECT_NEAR(1.0f, *pixelAt(result, 0, 2), 1e-6f);
+    EXPECT_EQ(0.0f, *pixelAt(result, 1, 2));
+}
+
 TEST_F(ConvertSIMDOptimizedTest, needAChannelCountAndAHint) {
+    ConvertToSIMDOptimized to;
+    ORVO_EXPECT_INTERNAL(to.allocateOutputImage(),
+                         "Not implemented: pixelFormat not supported in ImageFilter::allocateOutputImage()");
     ConvertFromSIMDOptimized converter;
     ORVO_EXPECT_INTERNAL(converter.prepareForRender(),
                          "Not implemented: pixelFormat not supported in ImageFilter::allocateOutputImage()");

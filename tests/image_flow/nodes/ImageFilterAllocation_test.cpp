@@ -1,8 +1,10 @@
+#include "orvo/core/exceptions/LogicalException.h"
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
 
 #include <cstring>
+#include <limits>
 
 namespace ORVO {
 
@@ -117,6 +119,28 @@ TEST_F(ImageFilterAllocationTest, aRegionThatNoImageHoldsIsRefused) {
     filter.computeRegionParameter().setValue(world(0, 0, 100000, 100000));
     ORVO_EXPECT_PARAMETER(filter.allocateOutputImage(), "Image size exceeds 4294967295 bytes");
     EXPECT_EQ(nullptr, filter.spOutputImage_.get());
+}
+
+TEST_F(ImageFilterAllocationTest, pixelsThatHaveNoSizeAreRefused) {
+    float const nan = std::numeric_limits<float>::quiet_NaN();
+    for (auto const& pixelExtent : {PixelExtentInWorldSpace(0, 1), PixelExtentInWorldSpace(1, 0),
+                                    PixelExtentInWorldSpace(-1, 1), PixelExtentInWorldSpace(nan, 1)}) {
+        TestFilter filter(0);
+        filter.setOutputPixelExtent(pixelExtent);
+        filter.computePixelExtents();
+        filter.computeRegionParameter().setValue(world(0, 0, 4, 4));
+        EXPECT_THROW(filter.allocateOutputImage(), LogicalException) << pixelExtent;
+        EXPECT_EQ(nullptr, filter.spOutputImage_.get());
+    }
+}
+
+TEST_F(ImageFilterAllocationTest, aRegionOfNoNumbersHasNoPixels) {
+    float const nan = std::numeric_limits<float>::quiet_NaN();
+    TestFilter filter(0);
+    filter.computeRegionParameter().setValue(world(nan, nan, nan, nan));
+    filter.allocateOutputImage();
+    EXPECT_EQ(0u, filter.spOutputImage_->numberOfPixels());
+    EXPECT_EQ(0u, filter.rangeToProcess().items);
 }
 
 TEST_F(ImageFilterAllocationTest, allocatesNothingWithoutAnOutputOrOnAnotherPlatform) {

@@ -375,6 +375,11 @@ TEST_F(ImageFilterTest, channelCountsComeFromTheFirstProducer) {
     filter.nForcedChannels_ = 0;
     ORVO_EXPECT_INTERNAL(filter.computeImageDescriptorInfo(ImageFilter::OUTPUT_PRECISION_8_BIT_INT),
                          "Enforce pOutput != NULL");
+    DataFlow::ConstOutput<ImageCPU> orphan("out", nullptr);
+    DataFlow::Connect(filter.in(), orphan);
+    ORVO_EXPECT_INTERNAL(filter.computeImageDescriptorInfo(ImageFilter::OUTPUT_PRECISION_8_BIT_INT),
+                         "Enforce pSource != NULL");
+    filter.disconnect();
     feed(filter, 0, first);
     feed(filter, 1, second);
     filter.computeImageDescriptorInfo(ImageFilter::OUTPUT_PRECISION_8_BIT_INT);

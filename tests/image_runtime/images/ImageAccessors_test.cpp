@@ -4,6 +4,7 @@
 #include "orvo/image_runtime/images/ImageCPU.h"
 #include "orvo/image_runtime/images/PixelStructures.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -48,6 +49,14 @@ TEST(ImageAccessors, AnswerForTheirImage) {
     }
     EXPECT_EQ(&made, &reader.image());
     EXPECT_EQ(&made, &writer.image());
+}
+
+TEST(ImageAccessors, HaveTheirOperationsInOrder) {
+    // The destructor stands last.
+    EXPECT_EQ(0, ORVO::Test::constSlotOf(&ImageAccessorBase::positionExtent));
+    EXPECT_EQ(1, ORVO::Test::constSlotOf(&ImageAccessorBase::position));
+    EXPECT_EQ(2, ORVO::Test::constSlotOf(&ImageAccessorBase::extent));
+    EXPECT_EQ(3, ORVO::Test::constSlotOf(&ImageAccessorBase::physicalWidth));
 }
 
 TEST(ImageReadAccessor, ReadsEachFormat) {
@@ -102,6 +111,17 @@ TEST(ImageReadAccessor, ReadsIndexZeroAtThePosition) {
         expectPixel(1, 2, 3, 4, reader.getRGBAFloat4PixelAt(position.x(), position.y()));
         expectPixel(5, 6, 7, 8, reader.getRGBAFloat4PixelAt(position.x(), position.y() + 1));
     }
+}
+
+TEST(ImageAccessors, ServeTheLastOfAllCoordinates) {
+    int const last = std::numeric_limits<int>::max();
+    ImageCPU made(ImageCPU::PIXEL_FORMAT_RGBA32F, rectangle(last - 1, last - 1, 2, 2),
+                  PixelExtentInWorldSpace(1, 1), ExtentInPixelSpace());
+    made.initializeToTransparentBlack();
+    ImageCPUWriteAccessor(made).writeRGBAFloatPixel4At(float4(0.25f, 0.5f, 0.75f, 1.0f), last, last);
+    expectPixel(0.25f, 0.5f, 0.75f, 1, ImageCPUReadAccessor(made).getRGBAFloat4PixelAt(last, last));
+    expectPixel(0, 0, 0, 0, ImageCPUReadAccessor(made).getRGBAFloat4PixelAt(last - 1, last));
+    EXPECT_EQ(0.25f, made.pixels_RGBA32F()[3].r);
 }
 
 TEST(ImageAccessors, RefuseOtherFormats) {

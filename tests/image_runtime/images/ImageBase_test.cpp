@@ -1,6 +1,7 @@
 #include "orvo/image_runtime/images/ImageBase.h"
 
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -33,6 +34,13 @@ TEST(ImageBase, IsEmptyWithPixelsOfOneByOneByDefault) {
     EXPECT_EQ(1.0f, image.pixelExtent().width());
     EXPECT_EQ(1.0f, image.pixelExtent().height());
     EXPECT_EQ(0u, image.numberOfPixels());
+}
+
+TEST(ImageBase, HasItsOperationsInOrder) {
+    // The destructor stands first.
+    EXPECT_EQ(2, ORVO::Test::constSlotOf(&ImageBase::capacityExtent));
+    EXPECT_EQ(3, ORVO::Test::slotOf(&ImageBase::initializeToTransparentBlack));
+    EXPECT_EQ(4, ORVO::Test::constSlotOf(&ImageBase::doWrite));
 }
 
 TEST(ImageBase, KeepsRectangleAndPixelExtent) {

@@ -1,9 +1,11 @@
 #include "orvo/image_runtime/images/ImageCPU.h"
 
 #include "orvo/image_runtime/images/PixelStructures.h"
+#include "tests/support/Expect.h"
 
 #include <gtest/gtest.h>
 
+#include <cstring>
 #include <sstream>
 #include <vector>
 
@@ -105,6 +107,12 @@ TEST(ImageCPUDump, AddsThreeLinesToThoseOfTheBase) {
     EXPECT_EQ(expected.str(), stream.str());
 }
 
+TEST(ImageCPUDump, IsRefusedForAnImageOfUndefinedFormat) {
+    std::ostringstream stream;
+    ORVO_EXPECT_INTERNAL(ImageCPU().doWrite(stream), "Not implemented: ePixelFormat in channelSizeBits().");
+    ORVO_EXPECT_INTERNAL(ImageCPU().writeFull(stream), "Not implemented: ePixelFormat in channelSizeBits().");
+}
+
 template <class Channel>
 void fill(ImageCPU& target, std::vector<Channel> const& values) {
     std::copy(values.begin(), values.end(), reinterpret_cast<Channel*>(target.pixels()));
@@ -138,6 +146,15 @@ TEST(ImageCPUDump, WritesFloatsWithTwoDecimals) {
     EXPECT_EQ("0.00 0.25 1.00 0.50  \n"
               "1.00 2.00 3.00 4.00  \n",
               dataOf(rgba, 9, 9));
+}
+
+TEST(ImageCPUDump, ReadsMemoryOfTheCallerAtAnyAddress) {
+    float const values[] = {0.0f, 0.25f, 1.0f};
+    unsigned char aPixels[sizeof(values) + 1] = {};
+    std::memcpy(aPixels + 1, values, sizeof(values));
+    ImageCPU const odd(ImageCPU::PIXEL_FORMAT_RGB32F, aPixels + 1, rectangle(0, 0, 1, 1), oUnit,
+                       ExtentInPixelSpace());
+    EXPECT_EQ("0.00 0.25 1.00  \n", dataOf(odd, 9, 9));
 }
 
 TEST(ImageCPUDump, IsBoundByItsLimitsAndByTheCapacity) {

@@ -5,6 +5,7 @@
 #include "orvo/core/utility/Integers.h"
 #include "orvo/image_runtime/images/PixelStructures.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -277,6 +278,34 @@ TEST(ImageCPU, ClearsItsWholeStorage) {
     made.initializeToTransparentBlack();
     EXPECT_TRUE(
         std::all_of(made.pixels(), made.pixels() + 128, [](unsigned char value) { return value == 0; }));
+}
+
+template <class Pixel>
+void expectSlots(std::ptrdiff_t slot, Pixel* (ImageCPU::*pMutable)(),
+                 Pixel const* (ImageCPU::*pConst)() const) {
+    EXPECT_EQ(slot, ORVO::Test::slotOf(pMutable));
+    EXPECT_EQ(slot + 1, ORVO::Test::constSlotOf(pConst));
+}
+
+TEST(ImageCPU, HasItsOperationsInOrderBehindThoseOfTheBase) {
+    expectSlots<PixelBGRA8>(5, &ImageCPU::pixels_BGRA8, &ImageCPU::pixels_BGRA8);
+    expectSlots<PixelBGR8>(7, &ImageCPU::pixels_BGR8, &ImageCPU::pixels_BGR8);
+    expectSlots<PixelRGB16F>(9, &ImageCPU::pixels_RGB16F, &ImageCPU::pixels_RGB16F);
+    expectSlots<PixelRGBA16F>(11, &ImageCPU::pixels_RGBA16F, &ImageCPU::pixels_RGBA16F);
+    expectSlots<PixelRGB32F>(13, &ImageCPU::pixels_RGB32F, &ImageCPU::pixels_RGB32F);
+    expectSlots<PixelRGBA32F>(15, &ImageCPU::pixels_RGBA32F, &ImageCPU::pixels_RGBA32F);
+    expectSlots<PixelRGB8>(17, &ImageCPU::pixels_RGB8, &ImageCPU::pixels_RGB8);
+    expectSlots<PixelRGBA8>(19, &ImageCPU::pixels_RGBA8, &ImageCPU::pixels_RGBA8);
+    expectSlots<PixelLuminance8>(21, &ImageCPU::pixels_Luminance8, &ImageCPU::pixels_Luminance8);
+    expectSlots<PixelLuminanceAlpha8>(23, &ImageCPU::pixels_LuminanceAlpha8,
+                                      &ImageCPU::pixels_LuminanceAlpha8);
+    expectSlots<PixelLuminance16F>(25, &ImageCPU::pixels_Luminance16F, &ImageCPU::pixels_Luminance16F);
+    expectSlots<PixelLuminanceAlpha16F>(27, &ImageCPU::pixels_LuminanceAlpha16F,
+                                        &ImageCPU::pixels_LuminanceAlpha16F);
+    expectSlots<PixelLuminance32F>(29, &ImageCPU::pixels_Luminance32F, &ImageCPU::pixels_Luminance32F);
+    expectSlots<PixelLuminanceAlpha32F>(31, &ImageCPU::pixels_LuminanceAlpha32F,
+                                        &ImageCPU::pixels_LuminanceAlpha32F);
+    expectSlots<unsigned char>(33, &ImageCPU::pixels, &ImageCPU::pixels);
 }
 
 TEST(ImageCPU, ReinterpretsItsFirstPixel) {

@@ -284,6 +284,37 @@ TEST_P(RowKernelsOf, EqualThePlainOnesAtEveryPlace) {
     comparePlaces(kernels().copyFloat, plain.copyFloat, awkwardFloats());
 }
 
+/// Rows between the places of their channels, as memory of a caller may lie.
+template <class Output, class Input>
+void compareOddPlaces(void (*kernel)(Output*, Input const*, std::size_t, StoreMode),
+                      void (*plain)(Output*, Input const*, std::size_t, StoreMode),
+                      std::vector<Input> const& source) {
+    constexpr std::size_t n = 131;
+    for (std::size_t nOutput = 0; nOutput < sizeof(Output); ++nOutput) {
+        for (std::size_t nInput = 0; nInput < sizeof(Input); ++nInput) {
+            alignas(64) unsigned char aInput[(n + 1) * sizeof(Input)];
+            std::memcpy(aInput + nInput, static_cast<void const*>(source.data()), n * sizeof(Input));
+            auto const* const pInput = reinterpret_cast<Input const*>(aInput + nInput);
+            alignas(64) unsigned char aExpected[(n + 1) * sizeof(Output)] = {};
+            plain(reinterpret_cast<Output*>(aExpected + nOutput), pInput, n, StoreMode::CACHED);
+            for (StoreMode const eStoreMode : {StoreMode::CACHED, StoreMode::STREAM}) {
+                alignas(64) unsigned char aOutput[(n + 1) * sizeof(Output)] = {};
+                kernel(reinterpret_cast<Output*>(aOutput + nOutput), pInput, n, eStoreMode);
+                ASSERT_EQ(0, std::memcmp(aExpected, aOutput, sizeof(aOutput))) << nOutput << " " << nInput;
+            }
+        }
+    }
+}
+
+TEST_P(RowKernelsOf, TakeRowsAtOddAddresses) {
+    RowKernels const& plain = rowKernels(InstructionSet::PLAIN);
+    compareOddPlaces(kernels().floatFromUInt8, plain.floatFromUInt8, codes<std::uint8_t>());
+    compareOddPlaces(kernels().floatFromUInt16, plain.floatFromUInt16, codes<std::uint16_t>());
+    compareOddPlaces(kernels().uInt8FromFloat, plain.uInt8FromFloat, awkwardFloats());
+    compareOddPlaces(kernels().uInt16FromFloat, plain.uInt16FromFloat, awkwardFloats());
+    compareOddPlaces(kernels().copyFloat, plain.copyFloat, awkwardFloats());
+}
+
 /// The same for the kernels of the accessors, which know no stretches and no store mode.
 template <class Output, class Input>
 void compareAccessorPlaces(void (*kernel)(Output*, Input const*, std::size_t),

@@ -23,16 +23,18 @@ struct VectorBounds {
         highest = Vector::max(v, highest);
     }
 
-    void reduceTo(ValueBounds& bounds) const {
-        float low[kLanes];
-        float high[kLanes];
-        Vector::store(low, lowest);
-        Vector::store(high, highest);
-        for (std::size_t i = 0; i < kLanes; ++i) {
-            bounds.fLowest = low[i] < bounds.fLowest ? low[i] : bounds.fLowest;
-            bounds.fHighest = high[i] > bounds.fHighest ? high[i] : bounds.fHighest;
-        }
+    ValueBounds reduced() const { return {Vector::lowest(lowest), Vector::highest(highest)}; }
+};
+
+/// Whether alpha is 1 in a stretch of pixels.
+struct Opacity {
+    Vector::Floats others = Vector::zero();
+
+    void include(Vector::Floats alpha) {
+        Vector::Floats const one = Vector::set(1.0F);
+        others = Vector::select(Vector::unequal(alpha, one), one, others);
     }
+    bool isOpaque() const { return Vector::highest(others) == 0.0F; }
 };
 
 /// The last pixels of a row, followed by copies of the last one, which change no bounds.
@@ -68,14 +70,16 @@ Vector::Floats luminanceOf(PremultipliedPixels const& pixels) {
     return Vector::add(sum, Vector::mul(pixels.alpha, Vector::zero()));
 }
 
-void luminanceFromRGBA(float const* pRGBA, float* pLuminance, float* pAlpha, std::size_t n,
+bool luminanceFromRGBA(float const* pRGBA, float* pLuminance, float* pAlpha, std::size_t n,
                        ValueBounds* pBounds) {
     VectorBounds bounds(*pBounds);
+    Opacity opacity;
     std::size_t x = 0;
     for (; x + kLanes <= n; x += kLanes) {
         PremultipliedPixels const pixels(pRGBA + 4 * x);
         Vector::Floats const luminance = luminanceOf(pixels);
         bounds.include(luminance);
+        opacity.include(pixels.alpha);
         Vector::store(pLuminance + x, luminance);
         Vector::store(pAlpha + x, pixels.alpha);
     }
@@ -85,19 +89,23 @@ void luminanceFromRGBA(float const* pRGBA, float* pLuminance, float* pAlpha, std
         PremultipliedPixels const pixels(block);
         Vector::Floats const luminance = luminanceOf(pixels);
         bounds.include(luminance);
+        opacity.include(pixels.alpha);
         Vector::storeFirst(pLuminance + x, luminance, static_cast<int>(n - x));
         Vector::storeFirst(pAlpha + x, pixels.alpha, static_cast<int>(n - x));
     }
-    bounds.reduceTo(*pBounds);
+    *pBounds = bounds.reduced();
+    return opacity.isOpaque();
 }
 
-void labFromRGBA(float const* pRGBA, float* const* apPlanes, std::size_t n, ValueBounds* pBounds) {
+bool labFromRGBA(float const* pRGBA, float* const* apPlanes, std::size_t n, ValueBounds* pBounds) {
     VectorBounds bounds(*pBounds);
+    Opacity opacity;
     std::size_t x = 0;
     for (; x + kLanes <= n; x += kLanes) {
         PremultipliedPixels pixels(pRGBA + 4 * x);
         LabVector::toLab(pixels.r, pixels.g, pixels.b);
         bounds.include(pixels.r);
+        opacity.include(pixels.alpha);
         Vector::store(apPlanes[0] + x, pixels.r);
         Vector::store(apPlanes[1] + x, pixels.g);
         Vector::store(apPlanes[2] + x, pixels.b);
@@ -109,13 +117,15 @@ void labFromRGBA(float const* pRGBA, float* const* apPlanes, std::size_t n, Valu
         PremultipliedPixels pixels(block);
         LabVector::toLab(pixels.r, pixels.g, pixels.b);
         bounds.include(pixels.r);
+        opacity.include(pixels.alpha);
         int const rest = static_cast<int>(n - x);
         Vector::storeFirst(apPlanes[0] + x, pixels.r, rest);
         Vector::storeFirst(apPlanes[1] + x, pixels.g, rest);
         Vector::storeFirst(apPlanes[2] + x, pixels.b, rest);
         Vector::storeFirst(apPlanes[3] + x, pixels.alpha, rest);
     }
-    bounds.reduceTo(*pBounds);
+    *pBounds = bounds.reduced();
+    return opacity.isOpaque();
 }
 
 // NaN is taken from the second operand.

@@ -81,25 +81,20 @@ struct DivideJob {
     float* pResult;         ///< receives a plane a channel, without the weight; 0 where the weight is 0
 };
 
-/// A stretch of pixels of a row that lie between the same two columns of the grid.
-struct PixelRun {
-    std::uint32_t nBegin;
-    std::uint32_t nEnd;
-    std::uint32_t nColumn;     ///< the left column
-    std::uint32_t nNextColumn; ///< the right one
-};
-
-/// Reading back one row of pixels.
+/// Reading back one row of pixels. The result must not overlap what is read.
 struct SliceJob {
     GridLayout const* pLayout;
     float const* pUpper; ///< the divided rows of the grid above and below the pixels
     float const* pLower;
     float fFraction; ///< how far the pixels are from the upper row
     float* pBlended; ///< room for nChannels planes and kSlack
-    PixelRun const* pRuns;
-    std::size_t nRuns;
-    float const* pFractions; ///< of each pixel, how far it is from the left column
-    float* apPixels[3];      ///< a row of each plane; the first gives the intensities, all receive the result
+    std::size_t nPixels;
+    std::int32_t const*
+        pLevels; ///< of each pixel, where its left column begins in a plane; the right one follows
+    std::uint32_t const* pEnds; ///< of each pixel, the first pixel behind those between the same columns
+    float const* pFractions;    ///< of each pixel, how far it is from the left column
+    float const* pIntensities;
+    float* apResults[3]; ///< a row of each channel
 };
 
 /// One row of the direct filter.
@@ -133,11 +128,11 @@ struct StoreStyle {
 /// Threads: free of state; any thread.
 struct GridKernels {
     /// Rows of n interleaved RGBA pixels, premultiplied and reduced to luminance and alpha; widens the
-    /// bounds.
-    void (*luminanceFromRGBA)(float const* pRGBA, float* pLuminance, float* pAlpha, std::size_t n,
+    /// bounds. Answers whether alpha is 1 throughout.
+    bool (*luminanceFromRGBA)(float const* pRGBA, float* pLuminance, float* pAlpha, std::size_t n,
                               ValueBounds* pBounds);
     /// The same to L, a, b (apPlanes[0..2]) and alpha (apPlanes[3]).
-    void (*labFromRGBA)(float const* pRGBA, float* const* apPlanes, std::size_t n, ValueBounds* pBounds);
+    bool (*labFromRGBA)(float const* pRGBA, float* const* apPlanes, std::size_t n, ValueBounds* pBounds);
     void (*splat)(SplatJob const& job);
     void (*blur)(BlurJob const& job);
     void (*divide)(DivideJob const& job);

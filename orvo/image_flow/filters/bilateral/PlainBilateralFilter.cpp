@@ -14,7 +14,6 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
-#include <cstring>
 #include <limits>
 #include <type_traits>
 
@@ -214,7 +213,6 @@ std::size_t PlainBilateralFilter::cellZ(float value) const {
     return clampedCell(cell, nGridDepth_);
 }
 
-template <class Pixel>
 PlainBilateralFilter::ImagePointer PlainBilateralFilter::makeGrid(ImageCPU const& working) const {
     ImagePointer spGrid =
         makeImage(working.pixelFormat(),
@@ -226,7 +224,7 @@ PlainBilateralFilter::ImagePointer PlainBilateralFilter::makeGrid(ImageCPU const
 
 PlainBilateralFilter::ImagePointer
 PlainBilateralFilter::constructDownsampled3DGrid(ImageCPU const& working) const {
-    ImagePointer spGrid = makeGrid<PixelLuminanceAlpha32F>(working);
+    ImagePointer spGrid = makeGrid(working);
     PixelLuminanceAlpha32F* const pGrid = spGrid->pixels_LuminanceAlpha32F();
     PixelLuminanceAlpha32F const* pPixel = working.pixels_LuminanceAlpha32F();
     for (std::size_t py = 0; py < heightOf(working); ++py) {
@@ -242,7 +240,7 @@ PlainBilateralFilter::constructDownsampled3DGrid(ImageCPU const& working) const 
 
 PlainBilateralFilter::ImagePointer
 PlainBilateralFilter::constructDownsampled3DGridLAB(ImageCPU const& working) const {
-    ImagePointer spGrid = makeGrid<PixelRGBA32F>(working);
+    ImagePointer spGrid = makeGrid(working);
     PixelRGBA32F* const pGrid = spGrid->pixels_RGBA32F();
     PixelRGBA32F const* pPixel = working.pixels_RGBA32F();
     for (std::size_t py = 0; py < heightOf(working); ++py) {
@@ -286,7 +284,7 @@ void PlainBilateralFilter::blurLine(ImageCPU const& source, ImageCPU& destinatio
 
 template <class Pixel>
 PlainBilateralFilter::ImagePointer PlainBilateralFilter::blurGrid(ImagePointer const& spGrid) const {
-    ImagePointer spScratch = makeGrid<Pixel>(*spGrid);
+    ImagePointer spScratch = makeGrid(*spGrid);
     for (std::size_t y = 0; y < nGridHeight_; ++y) {
         for (std::size_t z = 0; z < nGridDepth_; ++z) {
             blurLine<Pixel>(*spGrid, *spScratch, cellIndex(0, y, z), 1, nGridWidth_);
@@ -380,11 +378,13 @@ void PlainBilateralFilter::convertToRGB(ImageCPU const& working, ImageWriteAcces
     }
 }
 
-PlainBilateralFilter::ImagePointer
-PlainBilateralFilter::applyBruteForceFilterLuminance(ImageCPU const& working) const {
+// A tap is skipped by its place in memory alone: past the left or right edge it is in the neighbouring row.
+template <class Pixel, class Average>
+PlainBilateralFilter::ImagePointer PlainBilateralFilter::filterDirectly(ImageCPU const& working,
+                                                                        Average const& average) const {
     ImagePointer spResult = makeImage(working.pixelFormat(), working.positionExtent());
-    PixelLuminanceAlpha32F const* const pInput = working.pixels_LuminanceAlpha32F();
-    PixelLuminanceAlpha32F* const pOutput = spResult->pixels_LuminanceAlpha32F();
+    Pixel const* const pInput = pixelsOf<Pixel>(working);
+    Pixel* const pOutput = pixelsOf<Pixel>(*spResult);
     long long const width = working.capacityExtent().width();
     long long const count = width * working.extent().height();
     if (directFilterIsIdentity(fRangeSigma_, fSigmaX_, fSigmaY_)) {
@@ -393,27 +393,18 @@ PlainBilateralFilter::applyBruteForceFilterLuminance(ImageCPU const& working) co
     }
     long long const radiusX = radiusOf(fSigmaX_);
     long long const radiusY = radiusOf(fSigmaY_);
-    float const spatialFactor =
-        fSigmaX_ > 0.0F && fSigmaY_ > 0.0F ? 1.0F / (2.0F * fSigmaX_ * fSigmaY_) : 1.0F;
-    float const rangeFactor = fRangeSigma_ > 0.0F ? 1.0F / (2.0F * fRangeSigma_ * fRangeSigma_) : 1.0F;
     for (long long i = 0; i < count; ++i) {
-        float const c = pInput[i].l;
-        float sum = 0.0F;
-        float weight = 0.0F;
-        for (long long dy = -radiusY; dy <= radiusY; ++dy) {
-            for (long long dx = -radiusX; dx <= radiusX; ++dx) {
-                long long const tap = i + dy * width + dx;
-                if (tap < 0 || tap >= count) {
-                    continue;
+        auto const visitTaps = [&](auto const& visit) {
+            for (long long dy = -radiusY; dy <= radiusY; ++dy) {
+                for (long long dx = -radiusX; dx <= radiusX; ++dx) {
+                    long long const tap = i + dy * width + dx;
+                    if (tap >= 0 && tap < count) {
+                        visit(pInput[tap], static_cast<float>(dx * dx + dy * dy));
+                    }
                 }
-                float const v = pInput[tap].l;
-                float const ws = std::exp(-static_cast<float>(dx * dx + dy * dy) * spatialFactor);
-                float const wr = std::exp(-(c - v) * (c - v) * rangeFactor);
-                sum += wr * v * ws;
-                weight += wr * ws;
             }
-        }
-        pOutput[i] = {weight != 0.0F ? sum / weight : 0.0F, pInput[i].a};
+        };
+        pOutput[i] = average(pInput[i], visitTaps);
         if ((i + 1) % width == 0) {
             askCallback();
         }
@@ -422,43 +413,43 @@ PlainBilateralFilter::applyBruteForceFilterLuminance(ImageCPU const& working) co
 }
 
 PlainBilateralFilter::ImagePointer
+PlainBilateralFilter::applyBruteForceFilterLuminance(ImageCPU const& working) const {
+    float const spatialFactor =
+        fSigmaX_ > 0.0F && fSigmaY_ > 0.0F ? 1.0F / (2.0F * fSigmaX_ * fSigmaY_) : 1.0F;
+    float const rangeFactor = fRangeSigma_ > 0.0F ? 1.0F / (2.0F * fRangeSigma_ * fRangeSigma_) : 1.0F;
+    auto const average = [=](PixelLuminanceAlpha32F const& centre, auto const& visitTaps) {
+        float const c = centre.l;
+        float sum = 0.0F;
+        float weight = 0.0F;
+        visitTaps([&](PixelLuminanceAlpha32F const& tap, float squaredDistance) {
+            float const v = tap.l;
+            float const ws = std::exp(-squaredDistance * spatialFactor);
+            float const wr = std::exp(-(c - v) * (c - v) * rangeFactor);
+            sum += wr * v * ws;
+            weight += wr * ws;
+        });
+        return PixelLuminanceAlpha32F{weight != 0.0F ? sum / weight : 0.0F, centre.a};
+    };
+    return filterDirectly<PixelLuminanceAlpha32F>(working, average);
+}
+
+PlainBilateralFilter::ImagePointer
 PlainBilateralFilter::applyBruteForceFilterLAB(ImageCPU const& working) const {
-    ImagePointer spResult = makeImage(working.pixelFormat(), working.positionExtent());
-    PixelRGBA32F const* const pInput = working.pixels_RGBA32F();
-    PixelRGBA32F* const pOutput = spResult->pixels_RGBA32F();
-    long long const width = working.capacityExtent().width();
-    long long const count = width * working.extent().height();
-    if (directFilterIsIdentity(fRangeSigma_, fSigmaX_, fSigmaY_)) {
-        std::copy(pInput, pInput + count, pOutput);
-        return spResult;
-    }
-    long long const radiusX = radiusOf(fSigmaX_);
-    long long const radiusY = radiusOf(fSigmaY_);
     float const spatialFactor =
         fSigmaX_ > 0.0F && fSigmaY_ > 0.0F ? -1.0F / (fSigmaX_ * 2.0F * fSigmaY_) : -1.0F;
     float const rangeFactor = fRangeSigma_ > 0.0F ? -1.0F / (fRangeSigma_ * 2.0F * fRangeSigma_) : -1.0F;
-    for (long long i = 0; i < count; ++i) {
+    auto const average = [=](PixelRGBA32F const& centre, auto const& visitTaps) {
         PixelRGBA32F sum = {0.0F, 0.0F, 0.0F, 0.0F};
-        for (long long dy = -radiusY; dy <= radiusY; ++dy) {
-            for (long long dx = -radiusX; dx <= radiusX; ++dx) {
-                long long const tap = i + dy * width + dx;
-                if (tap < 0 || tap >= count) {
-                    continue;
-                }
-                PixelRGBA32F const& v = pInput[tap];
-                float const difference = pInput[i].r - v.r;
-                float const w = std::exp(difference * difference * rangeFactor) *
-                                std::exp(static_cast<float>(dx * dx + dy * dy) * spatialFactor);
-                sum += PixelRGBA32F{v.r * w, v.g * w, v.b * w, w};
-            }
-        }
+        visitTaps([&](PixelRGBA32F const& v, float squaredDistance) {
+            float const difference = centre.r - v.r;
+            float const w =
+                std::exp(difference * difference * rangeFactor) * std::exp(squaredDistance * spatialFactor);
+            sum += PixelRGBA32F{v.r * w, v.g * w, v.b * w, w};
+        });
         float const scale = sum.a != 0.0F ? 1.0F / sum.a : 0.0F;
-        pOutput[i] = {sum.r * scale, sum.g * scale, sum.b * scale, pInput[i].a};
-        if ((i + 1) % width == 0) {
-            askCallback();
-        }
-    }
-    return spResult;
+        return PixelRGBA32F{sum.r * scale, sum.g * scale, sum.b * scale, centre.a};
+    };
+    return filterDirectly<PixelRGBA32F>(working, average);
 }
 
 PixelLuminanceAlpha32F PlainBilateralFilter::sample3DGrid(PixelLuminanceAlpha32F const* pGrid,

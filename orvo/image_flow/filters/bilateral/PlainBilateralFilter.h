@@ -45,7 +45,6 @@ private:
 
     ImagePointer constructDownsampled3DGrid(ImageCPU const& working) const;
     ImagePointer constructDownsampled3DGridLAB(ImageCPU const& working) const;
-    template <class Pixel>
     ImagePointer makeGrid(ImageCPU const& working) const;
     template <class Pixel>
     ImagePointer blurGrid(ImagePointer const& spGrid) const;
@@ -60,6 +59,10 @@ private:
 
     ImagePointer applyBruteForceFilterLuminance(ImageCPU const& working) const;
     ImagePointer applyBruteForceFilterLAB(ImageCPU const& working) const;
+    /// What both share: `average` makes a pixel of the result from its centre and a function that visits the
+    /// taps around it, each with the square of its distance.
+    template <class Pixel, class Average>
+    ImagePointer filterDirectly(ImageCPU const& working, Average const& average) const;
 
     void writeLuminanceImage(ImageCPU const& working, ImageWriteAccessor& destination) const;
     void convertToRGB(ImageCPU const& working, ImageWriteAccessor& destination) const;

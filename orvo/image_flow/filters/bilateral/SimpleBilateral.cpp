@@ -12,7 +12,7 @@ namespace ORVO::ImageFlow::bilateral {
 
 namespace {
 
-float4 const kLuminanceWeights(0.39F, 0.5F, 0.11F, 0.0F);
+float4 const kDirectWeights(0.39F, 0.5F, 0.11F, 0.0F);
 
 /// The smaller of the two as unsigned numbers.
 long long unsignedMinimum(long long coordinate, long long limit) {
@@ -119,13 +119,14 @@ float4 SimpleBilateral::resultAt(PixelWindow const& window, int x) const {
                 difference.w = 0.0F;
                 distance = dot(difference, difference);
             } else {
-                distance = dot(difference, kLuminanceWeights);
-                float const grey = dot(sample, kLuminanceWeights);
+                distance = dot(difference, kDirectWeights);
+                float const grey = dot(sample, kDirectWeights);
                 sample = float4(grey, grey, grey, sample.w);
             }
             float const range = std::exp(distance * distance * -1.0F / (fRangeSigma_ * 2.0F * fRangeSigma_));
-            float const weight =
-                range * aSpatialWeights_[static_cast<std::size_t>(std::abs(i) * (nHalf_ + 1) + std::abs(j))];
+            std::size_t const nRow =
+                static_cast<std::size_t>(std::abs(i)) * (static_cast<std::size_t>(nHalf_) + 1);
+            float const weight = range * aSpatialWeights_[nRow + static_cast<std::size_t>(std::abs(j))];
             sum += weight * sample;
             total += weight;
         }

@@ -87,61 +87,106 @@ typename V::Floats valuesAt(float const* pColumn, typename V::Ints level) {
     }
 }
 
-/// Reads back up to kLanes pixels of a run.
+/// Where pixels stand on the intensity axis: two levels, counted from the first one in use, and how far the
+/// pixels are from the lower one.
+struct LevelPlaces {
+    Vector::Ints low;
+    Vector::Ints high;
+    Vector::Floats fraction;
+
+    LevelPlaces(GridLayout const& layout, SplatConstants const& constants, Vector::Floats value) {
+        Vector::Floats const first = Vector::set(static_cast<float>(kFirstLevel));
+        Vector::Floats const place = Vector::add(constants.cellsAlongAxis(value), first);
+        Vector::Floats const whole = Vector::floor(place);
+        fraction = Vector::sub(place, whole);
+        Vector::Floats const last = Vector::set(static_cast<float>(layout.nUsed - 1));
+        Vector::Floats const level =
+            Vector::min(Vector::max(Vector::sub(whole, first), Vector::zero()), last);
+        low = Vector::toInts(level);
+        high = Vector::toInts(Vector::min(Vector::add(level, Vector::set(1.0F)), last));
+    }
+};
+
+/// Reads back up to kLanes pixels between the same two columns.
 template <std::size_t kChannels, Lookup lookup>
-void slicePixels(SliceJob const& job, SplatConstants const& constants, PixelRun const& run, std::size_t pixel,
-                 int n) {
+void slicePixels(SliceJob const& job, SplatConstants const& constants, std::size_t pixel, int n) {
     GridLayout const& layout = *job.pLayout;
-    Vector::Floats const value = Vector::loadFirst(job.apPixels[0] + pixel, n);
-    // The whole part counts levels from the padding on.
-    Vector::Floats const place =
-        Vector::add(constants.cellsAlongAxis(value), Vector::set(static_cast<float>(kFirstLevel)));
-    Vector::Floats const whole = Vector::floor(place);
-    Vector::Floats const fractionZ = Vector::sub(place, whole);
+    LevelPlaces const places(layout, constants, Vector::loadFirst(job.pIntensities + pixel, n));
     Vector::Floats const fractionX = Vector::loadFirst(job.pFractions + pixel, n);
-    Vector::Floats const last = Vector::set(static_cast<float>(layout.nUsed - 1));
-    Vector::Floats const offset = Vector::sub(whole, Vector::set(static_cast<float>(kFirstLevel)));
-    Vector::Floats const low = Vector::min(Vector::max(offset, Vector::zero()), last);
-    Vector::Floats const high = Vector::min(Vector::add(low, Vector::set(1.0F)), last);
-    Vector::Ints const lowLevel = Vector::toInts(low);
-    Vector::Ints const highLevel = Vector::toInts(high);
 #pragma GCC unroll 4
     for (std::size_t channel = 0; channel < kChannels; ++channel) {
-        float const* const pPlane = job.pBlended + channel * planeFloats(layout);
-        float const* const pLeft = pPlane + run.nColumn * layout.nLevels;
-        float const* const pRight = pPlane + run.nNextColumn * layout.nLevels;
-        Vector::Floats const below = interpolate(valuesAt<lookup, Vector>(pLeft, lowLevel),
-                                                 valuesAt<lookup, Vector>(pRight, lowLevel), fractionX);
-        Vector::Floats const above = interpolate(valuesAt<lookup, Vector>(pLeft, highLevel),
-                                                 valuesAt<lookup, Vector>(pRight, highLevel), fractionX);
-        Vector::storeFirst(job.apPixels[channel] + pixel, interpolate(below, above, fractionZ), n);
+        float const* const pLeft = job.pBlended + channel * planeFloats(layout) + job.pLevels[pixel];
+        float const* const pRight = pLeft + layout.nLevels;
+        Vector::Floats const below = interpolate(valuesAt<lookup, Vector>(pLeft, places.low),
+                                                 valuesAt<lookup, Vector>(pRight, places.low), fractionX);
+        Vector::Floats const above = interpolate(valuesAt<lookup, Vector>(pLeft, places.high),
+                                                 valuesAt<lookup, Vector>(pRight, places.high), fractionX);
+        Vector::storeFirst(job.apResults[channel] + pixel, interpolate(below, above, places.fraction), n);
     }
 }
 
+/// Pixels begin .. end-1, as many at a time as lie between the same columns.
 template <std::size_t kChannels, Lookup lookup>
-void sliceRuns(SliceJob const& job) {
-    SplatConstants const constants(*job.pLayout);
-    for (std::size_t i = 0; i < job.nRuns; ++i) {
-        PixelRun const& run = job.pRuns[i];
-        for (std::size_t pixel = run.nBegin; pixel < run.nEnd; pixel += kLanes) {
-            std::size_t const rest = run.nEnd - pixel;
-            slicePixels<kChannels, lookup>(job, constants, run, pixel,
-                                           static_cast<int>(rest < kLanes ? rest : kLanes));
-        }
+void sliceRuns(SliceJob const& job, SplatConstants const& constants, std::size_t begin, std::size_t end) {
+    for (std::size_t pixel = begin; pixel < end;) {
+        std::size_t const runEnd = job.pEnds[pixel] < end ? job.pEnds[pixel] : end;
+        std::size_t const count = runEnd - pixel < kLanes ? runEnd - pixel : kLanes;
+        slicePixels<kChannels, lookup>(job, constants, pixel, static_cast<int>(count));
+        pixel += count;
     }
 }
 
-template <std::size_t kChannels>
-void sliceChannels(SliceJob const& job) {
-    if constexpr (Vector::kLookup > 0) {
-        if (job.pLayout->nUsed <= Vector::kLookup) {
-            return sliceRuns<kChannels, Lookup::PERMUTE>(job);
-        }
-        if (job.pLayout->nUsed <= 2 * Vector::kLookup) {
-            return sliceRuns<kChannels, Lookup::PERMUTE_TWICE>(job);
+/// kLanes pixels between columns that all fit into the two vectors of a lookup.
+template <std::size_t kChannels, class V>
+void sliceAcrossColumns(SliceJob const& job, SplatConstants const& constants, std::size_t pixel) {
+    GridLayout const& layout = *job.pLayout;
+    LevelPlaces const places(layout, constants, V::load(job.pIntensities + pixel));
+    typename V::Floats const fractionX = V::load(job.pFractions + pixel);
+    typename V::Ints const left = V::subInt(V::loadInts(job.pLevels + pixel), V::setInt(job.pLevels[pixel]));
+    typename V::Ints const right = V::addInt(left, V::setInt(static_cast<int>(layout.nLevels)));
+#pragma GCC unroll 4
+    for (std::size_t channel = 0; channel < kChannels; ++channel) {
+        float const* const p = job.pBlended + channel * planeFloats(layout) + job.pLevels[pixel];
+        typename V::Floats const below =
+            interpolate(V::lookupTwice(p, V::addInt(left, places.low)),
+                        V::lookupTwice(p, V::addInt(right, places.low)), fractionX);
+        typename V::Floats const above =
+            interpolate(V::lookupTwice(p, V::addInt(left, places.high)),
+                        V::lookupTwice(p, V::addInt(right, places.high)), fractionX);
+        V::store(job.apResults[channel] + pixel, interpolate(below, above, places.fraction));
+    }
+}
+
+/// As sliceRuns, but whole vectors of pixels where their columns allow it.
+template <std::size_t kChannels, Lookup lookup, class V = Vector>
+void sliceVectors(SliceJob const& job, SplatConstants const& constants) {
+    int const room = static_cast<int>(2 * (V::kLookup - job.pLayout->nLevels));
+    std::size_t pixel = 0;
+    for (; pixel + kLanes <= job.nPixels; pixel += kLanes) {
+        if (job.pLevels[pixel + kLanes - 1] - job.pLevels[pixel] <= room) {
+            sliceAcrossColumns<kChannels, V>(job, constants, pixel);
+        } else {
+            sliceRuns<kChannels, lookup>(job, constants, pixel, pixel + kLanes);
         }
     }
-    sliceRuns<kChannels, Lookup::GATHER>(job);
+    sliceRuns<kChannels, lookup>(job, constants, pixel, job.nPixels);
+}
+
+template <std::size_t kChannels, class V = Vector>
+void sliceChannels(SliceJob const& job) {
+    SplatConstants const constants(*job.pLayout);
+    if constexpr (V::kLookup > 0) {
+        if (job.pLayout->nLevels <= V::kLookup && V::kLookup > 8) {
+            return sliceVectors<kChannels, Lookup::PERMUTE>(job, constants);
+        }
+        if (job.pLayout->nUsed <= V::kLookup) {
+            return sliceRuns<kChannels, Lookup::PERMUTE>(job, constants, 0, job.nPixels);
+        }
+        if (job.pLayout->nUsed <= 2 * V::kLookup) {
+            return sliceRuns<kChannels, Lookup::PERMUTE_TWICE>(job, constants, 0, job.nPixels);
+        }
+    }
+    sliceRuns<kChannels, Lookup::GATHER>(job, constants, 0, job.nPixels);
 }
 
 void slice(SliceJob const& job) {

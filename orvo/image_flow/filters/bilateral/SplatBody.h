@@ -47,22 +47,23 @@ struct SplatConstants {
 
 /// A strip of pixels kLanes wide (or less at the right edge) and up to kStripRows high.
 struct Strip {
-    std::size_t nColumn;
+    alignas(64) float levels[kStripRows * kLanes]; ///< by `findLevels`
+    float const* apFirst[3];                       ///< its first pixel in each plane
+    std::size_t nPitch;
     std::size_t nColumns;
-    std::size_t nRow;
     std::size_t nRows;
-    int nLowest;  ///< the lowest level in it
-    int nHighest; ///< the highest one
-    float levels[kStripRows * kLanes];
+    std::uint32_t const* pColumns; ///< the grid column of each pixel column
+    int nLowest;                   ///< the lowest level in it, by `findLevels`
+    int nHighest;                  ///< the highest one
+
+    bool isWhole() const { return nColumns == kLanes; }
+    Vector::Floats pixels(std::size_t channel, std::size_t row) const {
+        return loadPixelsOf(apFirst[channel] + row * nPitch, static_cast<int>(nColumns));
+    }
 };
 
-Vector::Floats loadStrip(SplatJob const& job, Strip const& strip, std::size_t channel, std::size_t row) {
-    float const* const p = job.apPlanes[channel] + (strip.nRow + row) * job.nPitch + strip.nColumn;
-    return loadPixelsOf(p, static_cast<int>(strip.nColumns));
-}
-
 /// Finds the level of each pixel. Lanes beyond the right edge get a level that no bin has.
-void findLevels(SplatJob const& job, SplatConstants const& constants, Strip& strip) {
+void findLevels(SplatConstants const& constants, Strip& strip) {
     float beyond[kLanes] = {};
     for (std::size_t i = strip.nColumns; i < kLanes; ++i) {
         beyond[i] = 1.0F;
@@ -71,21 +72,13 @@ void findLevels(SplatJob const& job, SplatConstants const& constants, Strip& str
     Vector::Floats lowest = constants.lastLevel;
     Vector::Floats highest = Vector::zero();
     for (std::size_t row = 0; row < strip.nRows; ++row) {
-        Vector::Floats const level = constants.levelOf(loadStrip(job, strip, 0, row));
+        Vector::Floats const level = constants.levelOf(strip.pixels(0, row));
         lowest = Vector::min(lowest, Vector::select(isBeyond, lowest, level));
         highest = Vector::max(highest, Vector::select(isBeyond, highest, level));
         Vector::store(strip.levels + row * kLanes, Vector::select(isBeyond, Vector::set(-1.0F), level));
     }
-    float low[kLanes];
-    float high[kLanes];
-    Vector::store(low, lowest);
-    Vector::store(high, highest);
-    for (std::size_t i = 1; i < kLanes; ++i) {
-        low[0] = low[i] < low[0] ? low[i] : low[0];
-        high[0] = high[i] > high[0] ? high[i] : high[0];
-    }
-    strip.nLowest = static_cast<int>(low[0]);
-    strip.nHighest = static_cast<int>(high[0]);
+    strip.nLowest = static_cast<int>(Vector::lowest(lowest));
+    strip.nHighest = static_cast<int>(Vector::highest(highest));
 }
 
 /// Adds what was summed up for one grid column: kBins levels of each channel, then of the weight.
@@ -100,12 +93,31 @@ void addToColumn(float* pColumn, std::size_t stride, Vector::Floats sums) {
     }
 }
 
-/// Sums up the pixels of kBins levels of a strip, without scattered stores: each lane stands for a pixel
-/// column and each vector for a level and a channel, and a pixel is added to its level under a mask. Turned
-/// over, a vector then holds all levels and channels of one pixel column, and the vectors of a grid column
-/// are added.
+/// Turned over, a vector holds all levels and channels of one pixel column; those of a grid column are added.
 template <std::size_t kChannels>
-void splatGroup(SplatJob const& job, Strip const& strip, int firstLevel) {
+void addColumns(SplatJob const& job, Strip const& strip, int firstLevel, Vector::Floats (&sums)[kLanes]) {
+    constexpr std::size_t kBins = kLanes / (kChannels + 1);
+    Vector::transpose(sums);
+    std::size_t const stride = splatStride(*job.pLayout);
+    float* const pCells = job.pCells + 4 + firstLevel;
+    std::uint32_t const* const pColumns = strip.pColumns;
+    Vector::Floats sum = sums[0];
+    for (std::size_t i = 1; i < strip.nColumns; ++i) {
+        if (pColumns[i] == pColumns[i - 1]) {
+            sum = Vector::add(sum, sums[i]);
+        } else {
+            addToColumn<kBins>(pCells + pColumns[i - 1] * (kChannels + 1) * stride, stride, sum);
+            sum = sums[i];
+        }
+    }
+    addToColumn<kBins>(pCells + pColumns[strip.nColumns - 1] * (kChannels + 1) * stride, stride, sum);
+}
+
+/// Sums up the pixels of kBins levels of a strip, without scattered stores: each lane stands for a pixel
+/// column and each vector for a level and a channel, and a pixel is added to its level under a mask. The
+/// levels of a row come from a function, which is given the intensities.
+template <std::size_t kChannels, class LevelsOf>
+void splatGroup(SplatJob const& job, Strip const& strip, int firstLevel, LevelsOf const& levelsOf) {
     constexpr std::size_t kBins = kLanes / (kChannels + 1);
     Vector::Floats sums[kLanes];
     Vector::Floats bins[kBins];
@@ -119,12 +131,12 @@ void splatGroup(SplatJob const& job, Strip const& strip, int firstLevel) {
     }
     Vector::Floats const one = Vector::set(1.0F);
     for (std::size_t row = 0; row < strip.nRows; ++row) {
-        Vector::Floats const level = Vector::load(strip.levels + row * kLanes);
         Vector::Floats values[kChannels];
 #pragma GCC unroll 4
         for (std::size_t channel = 0; channel < kChannels; ++channel) {
-            values[channel] = loadStrip(job, strip, channel, row);
+            values[channel] = strip.pixels(channel, row);
         }
+        Vector::Floats const level = levelsOf(row, values[0]);
 #pragma GCC unroll 16
         for (std::size_t bin = 0; bin < kBins; ++bin) {
             Vector::Mask const isHere = Vector::equal(level, bins[bin]);
@@ -136,57 +148,80 @@ void splatGroup(SplatJob const& job, Strip const& strip, int firstLevel) {
             sums[kChannels * kBins + bin] = Vector::addWhere(sums[kChannels * kBins + bin], isHere, one);
         }
     }
-    Vector::transpose(sums);
-    std::size_t const stride = splatStride(*job.pLayout);
-    float* const pCells = job.pCells + 4 + firstLevel;
-    std::uint32_t const* const pColumns = job.pColumns + strip.nColumn;
-    Vector::Floats sum = sums[0];
-    for (std::size_t i = 1; i < strip.nColumns; ++i) {
-        if (pColumns[i] == pColumns[i - 1]) {
-            sum = Vector::add(sum, sums[i]);
-        } else {
-            addToColumn<kBins>(pCells + pColumns[i - 1] * (kChannels + 1) * stride, stride, sum);
-            sum = sums[i];
-        }
-    }
-    addToColumn<kBins>(pCells + pColumns[strip.nColumns - 1] * (kChannels + 1) * stride, stride, sum);
+    addColumns<kChannels>(job, strip, firstLevel, sums);
 }
 
-/// Adds the pixels one by one.
+/// Adds the pixels of levels below a limit one by one.
 template <std::size_t kChannels>
-void scatterStrip(SplatJob const& job, Strip const& strip) {
+void scatterStrip(SplatJob const& job, Strip const& strip, float limit) {
     std::size_t const stride = splatStride(*job.pLayout);
     for (std::size_t row = 0; row < strip.nRows; ++row) {
-        std::size_t const offset = (strip.nRow + row) * job.nPitch + strip.nColumn;
         for (std::size_t i = 0; i < strip.nColumns; ++i) {
-            float* const pColumn = job.pCells + job.pColumns[strip.nColumn + i] * (kChannels + 1) * stride;
-            float* const pCell = pColumn + 4 + static_cast<int>(strip.levels[row * kLanes + i]);
+            float const level = strip.levels[row * kLanes + i];
+            if (level >= limit) {
+                continue;
+            }
+            float* const pCell =
+                job.pCells + strip.pColumns[i] * (kChannels + 1) * stride + 4 + static_cast<int>(level);
             for (std::size_t channel = 0; channel < kChannels; ++channel) {
-                pCell[channel * stride] += job.apPlanes[channel][offset + i];
+                pCell[channel * stride] += strip.apFirst[channel][row * strip.nPitch + i];
             }
             pCell[kChannels * stride] += 1.0F;
         }
     }
 }
 
+/// A strip in one go, where one group holds all levels that numbers fall into; what is no number is added
+/// afterwards.
+template <std::size_t kChannels>
+void splatWhole(SplatJob const& job, SplatConstants const& constants, Strip& strip) {
+    Vector::Floats lowest = constants.lastLevel;
+    splatGroup<kChannels>(job, strip, static_cast<int>(kFirstLevel), [&](std::size_t, Vector::Floats value) {
+        Vector::Floats const level = constants.levelOf(value);
+        lowest = Vector::min(lowest, level);
+        return level;
+    });
+    float const first = static_cast<float>(kFirstLevel);
+    if (Vector::lowest(lowest) < first) {
+        findLevels(constants, strip);
+        scatterStrip<kChannels>(job, strip, first);
+    }
+}
+
+/// A strip group by group of the levels that are found in it, or pixel by pixel where they spread far.
+template <std::size_t kChannels>
+void splatGroups(SplatJob const& job, SplatConstants const& constants, Strip& strip) {
+    constexpr int kBins = static_cast<int>(kLanes / (kChannels + 1));
+    findLevels(constants, strip);
+    if (strip.nHighest - strip.nLowest >= kMaximalGroups * kBins) {
+        scatterStrip<kChannels>(job, strip, static_cast<float>(job.pLayout->nDepth));
+        return;
+    }
+    for (int level = strip.nLowest; level <= strip.nHighest; level += kBins) {
+        splatGroup<kChannels>(job, strip, level, [&strip](std::size_t row, Vector::Floats) {
+            return Vector::load(strip.levels + row * kLanes);
+        });
+    }
+}
+
 template <std::size_t kChannels>
 void splatChannels(SplatJob const& job) {
-    constexpr int kBins = static_cast<int>(kLanes / (kChannels + 1));
     SplatConstants const constants(*job.pLayout);
+    bool const oneGroup = job.pLayout->nUsed <= kLanes / (kChannels + 1);
     Strip strip;
+    strip.nPitch = job.nPitch;
     for (std::size_t row = job.nFirstRow; row < job.nEndRow; row += kStripRows) {
-        strip.nRow = row;
         strip.nRows = job.nEndRow - row < kStripRows ? job.nEndRow - row : kStripRows;
         for (std::size_t column = 0; column < job.nColumns; column += kLanes) {
-            strip.nColumn = column;
             strip.nColumns = job.nColumns - column < kLanes ? job.nColumns - column : kLanes;
-            findLevels(job, constants, strip);
-            if (strip.nHighest - strip.nLowest >= kMaximalGroups * kBins) {
-                scatterStrip<kChannels>(job, strip);
-                continue;
+            strip.pColumns = job.pColumns + column;
+            for (std::size_t channel = 0; channel < kChannels; ++channel) {
+                strip.apFirst[channel] = job.apPlanes[channel] + row * job.nPitch + column;
             }
-            for (int level = strip.nLowest; level <= strip.nHighest; level += kBins) {
-                splatGroup<kChannels>(job, strip, level);
+            if (oneGroup && strip.isWhole()) {
+                splatWhole<kChannels>(job, constants, strip);
+            } else {
+                splatGroups<kChannels>(job, constants, strip);
             }
         }
     }

@@ -36,6 +36,17 @@ struct Vector {
     /// Both give b where either is NaN.
     static Floats min(Floats a, Floats b) { return _mm256_min_ps(a, b); }
     static Floats max(Floats a, Floats b) { return _mm256_max_ps(a, b); }
+    /// Of all lanes.
+    static float lowest(Floats v) {
+        __m128 const four = _mm_min_ps(_mm256_castps256_ps128(v), _mm256_extractf128_ps(v, 1));
+        __m128 const pairs = _mm_min_ps(four, _mm_movehl_ps(four, four));
+        return _mm_cvtss_f32(_mm_min_ss(pairs, _mm_shuffle_ps(pairs, pairs, 1)));
+    }
+    static float highest(Floats v) {
+        __m128 const four = _mm_max_ps(_mm256_castps256_ps128(v), _mm256_extractf128_ps(v, 1));
+        __m128 const pairs = _mm_max_ps(four, _mm_movehl_ps(four, four));
+        return _mm_cvtss_f32(_mm_max_ss(pairs, _mm_shuffle_ps(pairs, pairs, 1)));
+    }
     static Mask less(Floats a, Floats b) { return _mm256_cmp_ps(a, b, _CMP_LT_OQ); }
     static Mask equal(Floats a, Floats b) { return _mm256_cmp_ps(a, b, _CMP_EQ_OQ); }
     static Mask unequal(Floats a, Floats b) { return _mm256_cmp_ps(a, b, _CMP_NEQ_UQ); }
@@ -65,6 +76,7 @@ struct Vector {
     static Floats toFloats(Ints v) { return _mm256_cvtepi32_ps(v); }
     /// Whole numbers to integers; for magnitudes below 2^31.
     static Ints toInts(Floats v) { return _mm256_cvtps_epi32(v); }
+    static Ints loadInts(int const* p) { return _mm256_loadu_si256(reinterpret_cast<__m256i const*>(p)); }
     static void storeInts(int* p, Ints v) { _mm256_storeu_si256(reinterpret_cast<__m256i*>(p), v); }
 
     /// The floats of p at indices 0 .. 7.

@@ -35,6 +35,9 @@ struct Vector {
     /// Both give b where either is NaN.
     static Floats min(Floats a, Floats b) { return _mm512_min_ps(a, b); }
     static Floats max(Floats a, Floats b) { return _mm512_max_ps(a, b); }
+    /// Of all lanes.
+    static float lowest(Floats v) { return _mm512_reduce_min_ps(v); }
+    static float highest(Floats v) { return _mm512_reduce_max_ps(v); }
     static Mask less(Floats a, Floats b) { return _mm512_cmp_ps_mask(a, b, _CMP_LT_OQ); }
     static Mask equal(Floats a, Floats b) { return _mm512_cmp_ps_mask(a, b, _CMP_EQ_OQ); }
     static Mask unequal(Floats a, Floats b) { return _mm512_cmp_ps_mask(a, b, _CMP_NEQ_UQ); }
@@ -66,6 +69,7 @@ struct Vector {
     static Floats toFloats(Ints v) { return _mm512_cvtepi32_ps(v); }
     /// Whole numbers to integers; for magnitudes below 2^31.
     static Ints toInts(Floats v) { return _mm512_cvtps_epi32(v); }
+    static Ints loadInts(int const* p) { return _mm512_loadu_si512(p); }
     static void storeInts(int* p, Ints v) { _mm512_storeu_si512(p, v); }
 
     /// The floats of p at indices 0 .. 15.

@@ -45,6 +45,15 @@ struct Vector {
     /// Both give b where either is NaN.
     static Floats min(Floats a, Floats b) { return _mm_min_ps(a, b); }
     static Floats max(Floats a, Floats b) { return _mm_max_ps(a, b); }
+    /// Of all lanes.
+    static float lowest(Floats v) {
+        Floats const pairs = _mm_min_ps(v, _mm_movehl_ps(v, v));
+        return _mm_cvtss_f32(_mm_min_ss(pairs, _mm_shuffle_ps(pairs, pairs, 1)));
+    }
+    static float highest(Floats v) {
+        Floats const pairs = _mm_max_ps(v, _mm_movehl_ps(v, v));
+        return _mm_cvtss_f32(_mm_max_ss(pairs, _mm_shuffle_ps(pairs, pairs, 1)));
+    }
     static Mask less(Floats a, Floats b) { return _mm_cmplt_ps(a, b); }
     static Mask equal(Floats a, Floats b) { return _mm_cmpeq_ps(a, b); }
     static Mask unequal(Floats a, Floats b) { return _mm_cmpneq_ps(a, b); }

@@ -92,6 +92,15 @@ TEST(LabTransform, LabConstantDependsOnTheSignOfL) {
     EXPECT_NEAR(-y, LabToXYZ(float4(-0.5F, 0.0F, 0.0F, 1.0F)).y, 1e-7);
 }
 
+TEST(LabTransform, ThresholdOfTheInverseIsComparedInDoublePrecision) {
+    // This L gives an fy whose cube is the float 0.008856F, which lies above the double 0.008856: the cube
+    // stays. The line would give 0.00885604.
+    float const fy = 0.206893042F;
+    ASSERT_EQ(0.008856F, fy * fy * fy);
+    ASSERT_EQ(fy, (0.0799959302F + 0.16F) / 1.16F);
+    EXPECT_EQ(0.008856F, LabToXYZ(float4(0.0799959302F, 0.0F, 0.0F, 1.0F)).y);
+}
+
 TEST(LabTransform, LineOfTheInverseMayTurnNegative) {
     // fy = 0.16001 / 1.16 is just above 0.13793103, and fz = fy - 0.05 below it: (|fz| - 0.13793103) / 7.787
     // < 0.
