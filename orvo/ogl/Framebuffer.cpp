@@ -33,12 +33,12 @@ unsigned attachedTexture(unsigned attachmentIndex) noexcept {
 
 Framebuffer::Framebuffer() : Object(GL_FRAMEBUFFER) {
     aNames_.reserve(1);
-    aNames_.push_back(Internal::ContextNames::createFramebuffer());
+    aNames_.push_back(Internal::ContextNames::create(ContextName::Kind::framebuffer, 1));
 }
 
 Framebuffer::~Framebuffer() {
     for (ContextName const& name : aNames_)
-        Internal::ContextNames::destroyFramebuffer(name);
+        Internal::ContextNames::destroy(name);
 }
 
 ContextName const* Framebuffer::nameHere() const noexcept {
@@ -49,7 +49,7 @@ ContextName const* Framebuffer::nameHere() const noexcept {
 
 unsigned Framebuffer::objectID() const {
     ContextName const* const pName = nameHere();
-    return pName != nullptr ? pName->nName_ : 0;
+    return pName != nullptr ? pName->name() : 0;
 }
 
 unsigned Framebuffer::getBoundID() const {
@@ -68,8 +68,8 @@ void Framebuffer::bind() {
                                      [pContext](ContextName const& n) { return n.pContext_ == pContext; }),
                       aNames_.end());
         aNames_.reserve(aNames_.size() + 1);
-        aNames_.push_back(Internal::ContextNames::createFramebuffer());
-        nName = aNames_.back().nName_;
+        aNames_.push_back(Internal::ContextNames::create(ContextName::Kind::framebuffer, 1));
+        nName = aNames_.back().name();
     }
     epoxy_glBindFramebuffer(GL_FRAMEBUFFER, nName);
 }

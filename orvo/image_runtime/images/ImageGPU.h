@@ -189,7 +189,7 @@ private:
     void uploadRectangle(PositionExtentInPixelSpace const& targetPositionExtent, unsigned format,
                          unsigned type, void const* pPixels, unsigned rowLength);
     void requireInside(PositionExtentInPixelSpace const& targetPositionExtent) const;
-    void returnTexture();
+    void returnTexture() noexcept;
 
     TexturePool* pPool_ = nullptr;
     OGL::Texture2D* pTexture_ = nullptr;

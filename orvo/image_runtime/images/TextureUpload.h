@@ -28,6 +28,7 @@ class ORVO_API TextureUpload {
 public:
     /// Bands that may be in flight before a query is used again.
     static constexpr std::size_t nQueryObject_ = 16;
+    /// Texture names kept for client storage.
     static constexpr std::size_t nClientTex_ = 4;
 
     TextureUpload() noexcept;

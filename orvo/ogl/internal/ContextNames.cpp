@@ -5,6 +5,7 @@
 #include <mutex>
 #include <vector>
 
+#include "orvo/core/Check.h"
 #include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/GL.h"
@@ -27,9 +28,49 @@ Orphans& orphans() {
     return *pOrphans;
 }
 
+using Kind = ContextName::Kind;
+
+void generate(ContextName& name) noexcept {
+    auto const nNames = static_cast<GLsizei>(name.nNames_);
+    switch (name.eKind_) {
+    case Kind::framebuffer:
+        epoxy_glGenFramebuffers(nNames, name.aNames_.data());
+        break;
+    case Kind::query:
+        epoxy_glGenQueries(nNames, name.aNames_.data());
+        break;
+    case Kind::texture:
+        glGenTextures(nNames, name.aNames_.data());
+        break;
+    }
+}
+
 void deleteHere(ContextName const& name) noexcept {
-    glDeleteFramebuffers(1, &name.nName_);
+    auto const nNames = static_cast<GLsizei>(name.nNames_);
+    switch (name.eKind_) {
+    case Kind::framebuffer:
+        glDeleteFramebuffers(nNames, name.aNames_.data());
+        break;
+    case Kind::query:
+        epoxy_glDeleteQueries(nNames, name.aNames_.data());
+        break;
+    case Kind::texture:
+        glDeleteTextures(nNames, name.aNames_.data());
+        break;
+    }
     Sentinel::destroy(name.pSync_);
+}
+
+char const* failureOf(Kind eKind) noexcept {
+    switch (eKind) {
+    case Kind::query:
+        return "The queries could not be created";
+    case Kind::texture:
+        return "The texture names could not be created";
+    case Kind::framebuffer:
+        break;
+    }
+    return "The framebuffer could not be created";
 }
 
 /// Takes the names out that are kept for the given context.
@@ -50,19 +91,24 @@ bool ContextName::isOfCurrentContext() const noexcept {
     return NativeContext::currentHandle() == pContext_ && (pSync_ == nullptr || Sentinel::isAlive(pSync_));
 }
 
-ContextName ContextNames::createFramebuffer() {
+ContextName ContextNames::create(Kind eKind, std::size_t nNames) {
+    ORVO_CHECK(nNames <= ContextName::nMaximum_);
     ORVO_OGL_REQUIRE_CONTEXT();
     deleteOrphans();
-    ContextName name{NativeContext::currentHandle(), Sentinel::create(), 0};
-    epoxy_glGenFramebuffers(1, &name.nName_);
-    if (name.nName_ == 0) {
+    ContextName name;
+    name.eKind_ = eKind;
+    name.nNames_ = nNames;
+    name.pContext_ = NativeContext::currentHandle();
+    name.pSync_ = Sentinel::create();
+    generate(name);
+    if (name.name() == 0) {
         Sentinel::destroy(name.pSync_);
-        ORVO_OGL_FAIL("The framebuffer could not be created", GL_OUT_OF_MEMORY);
+        ORVO_OGL_FAIL(failureOf(eKind), GL_OUT_OF_MEMORY);
     }
     return name;
 }
 
-void ContextNames::destroyFramebuffer(ContextName const& name) noexcept {
+void ContextNames::destroy(ContextName const& name) noexcept {
     if (name.isOfCurrentContext()) {
         deleteHere(name);
         return;
