@@ -1,5 +1,6 @@
 #include "orvo/ogl/Program.h"
 
+#include <atomic>
 #include <functional>
 #include <map>
 #include <string>
@@ -140,6 +141,8 @@ void Program::link(bool bReleaseShaders) {
     if (nLinked == GL_FALSE)
         ORVO_OGL_FAIL(sFailure, 0);
     readUniforms();
+    static std::atomic<std::uint64_t> nLinks{0};
+    nLink_ = ++nLinks;
     pDetails_->bLinked_ = true;
 }
 

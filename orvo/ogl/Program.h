@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <memory>
 
 #include "orvo/ogl/GLSLObject.h"
@@ -79,6 +80,10 @@ public:
     void setUniformMatrix3_Unsafe(char const* pName, float const* pValues, unsigned char transpose);
     void setUniformMatrix4_Unsafe(char const* pName, float const* pValues, unsigned char transpose);
 
+    /// A number that no other link of any program has; 0 before the first link that succeeds. Locations of
+    /// uniforms hold for as long as it stays.
+    std::uint64_t linkNumber() const noexcept { return nLink_; }
+
     /// Whether the driver has programs of the shading language.
     static bool isSupported();
 
@@ -91,6 +96,7 @@ private:
     int verifiedLocation(char const* pName, unsigned nType) const;
 
     std::unique_ptr<Details> pDetails_;
+    std::uint64_t nLink_ = 0;
 };
 
 } // namespace ORVO::OGL

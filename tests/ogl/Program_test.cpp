@@ -3,6 +3,7 @@
 #include <epoxy/gl.h>
 
 #include <array>
+#include <cstdint>
 #include <cstring>
 #include <functional>
 #include <memory>
@@ -90,6 +91,21 @@ TEST_F(ProgramTest, IsCompiledLinkedAndEnabled) {
     program.disable();
     glGetIntegerv(GL_CURRENT_PROGRAM, &nCurrent);
     EXPECT_EQ(0, nCurrent);
+}
+
+TEST_F(ProgramTest, NumbersEveryLink) {
+    Program program;
+    EXPECT_EQ(0U, program.linkNumber());
+    load(program, "void main() { gl_FragColor = vec4(1.0); }");
+    program.link(false);
+    std::uint64_t const nFirst = program.linkNumber();
+    EXPECT_NE(0U, nFirst);
+    program.link(true);
+    EXPECT_LT(nFirst, program.linkNumber());
+    Program other;
+    load(other, "void main() { gl_FragColor = vec4(1.0); }");
+    other.link(true);
+    EXPECT_LT(program.linkNumber(), other.linkNumber());
 }
 
 TEST_F(ProgramTest, TakesAStageInPiecesWithAndWithoutLengths) {

@@ -101,10 +101,8 @@ private:
 
     void lookUpUniforms(OGL::Program const& program);
     void bindInput(ImageGPU const& image, InputUniforms const& uniforms, OGL::Program& program);
-    void setInputUniforms(ImageGPU const& image, InputUniforms const& uniforms, OGL::Program& program,
-                          unsigned unit);
     void draw(OGL::Program& program);
-    void unbindInputs();
+    void releaseUnits();
 
     std::vector<InputUniforms> aInputUniforms_;
     int iOutOffset_;

@@ -81,6 +81,8 @@ protected:
     bool hasPixelsToDraw() const;
     /// Binds the controller's framebuffer and attaches the output image to it.
     void attachOutput();
+    /// Makes what the texture of a new image has beyond the image transparent black.
+    void clearBeyondNewImage();
     /// Throws as renderAndTearDown() if the framebuffer is not complete.
     void requireCompleteFramebuffer() const;
     /// Takes the output image off the framebuffer and unbinds that.
