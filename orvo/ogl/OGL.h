@@ -7,6 +7,7 @@
 #include "orvo/ogl/ExceptionOGL.h"
 #include "orvo/ogl/Extension.h"
 #include "orvo/ogl/ExtensionManager.h"
+#include "orvo/ogl/Fence.h"
 #include "orvo/ogl/Framebuffer.h"
 #include "orvo/ogl/FunctionTable.h"
 #include "orvo/ogl/GLSLObject.h"

@@ -2,6 +2,10 @@
 
 #include "orvo/core/Check.h"
 #include "orvo/filter_graph/filters/Bilateral.h"
+#include "orvo/filter_graph/filters/Premultiply.h"
+#include "orvo/filter_graph/filters/Scale15_1_to_16.h"
+#include "orvo/filter_graph/filters/Scale16_to_15_1.h"
+#include "orvo/filter_graph/filters/Unpremultiply.h"
 #include "orvo/filter_graph/impl/FilterEquality.h"
 #include "orvo/filter_graph/impl/FilterFactory.h"
 #include "orvo/filter_graph/internal/ImageFlowFilter.h"
@@ -12,6 +16,8 @@
 
 #include <algorithm>
 #include <memory>
+#include <string>
+#include <utility>
 #include <vector>
 
 namespace ORVO::FilterGraph {
@@ -20,6 +26,36 @@ namespace {
 
 IFilter::Identifier imageFlowIdentifier(char const* name) {
     return {name, ImageFlow::Library::imageFlowNamespace(), ImageFlow::Library::norvaneVendor(), 1};
+}
+
+/// "scaleUp<n>channel".
+template <int nChannels>
+class ScaleUp : public Internal::Filters::Scale15_1_to_16 {
+public:
+    static std::string nodeName() { return "scaleUp" + std::to_string(nChannels) + "channel"; }
+    // A result of fewer than three channels would be widened to R, G, B, which has no place for an alpha.
+    ScaleUp() : Scale15_1_to_16(nodeName().c_str(), nChannels == 2 ? 4 : nChannels) {}
+};
+
+/// "scaleDown<n>channel".
+template <int nChannels>
+class ScaleDown : public Internal::Filters::Scale16_to_15_1 {
+public:
+    static std::string nodeName() { return "scaleDown" + std::to_string(nChannels) + "channel"; }
+    ScaleDown() : Scale16_to_15_1(nodeName().c_str(), nChannels == 2 ? 4 : nChannels) {}
+};
+
+template <class Node>
+std::shared_ptr<IFilter> shaderFilter(std::string const& name) {
+    return std::make_shared<Internal::ImageFlowFilter<Node>>(
+        IFilter::Identifier(name, "ORVO", ImageFlow::Library::norvaneVendor(), 1), ORVO_TARGET_GL);
+}
+
+template <int... nChannels>
+void appendScalingFilters(std::vector<std::shared_ptr<IFilter>>& prototypes,
+                          std::integer_sequence<int, nChannels...>) {
+    (prototypes.push_back(shaderFilter<ScaleUp<nChannels>>(ScaleUp<nChannels>::nodeName())), ...);
+    (prototypes.push_back(shaderFilter<ScaleDown<nChannels>>(ScaleDown<nChannels>::nodeName())), ...);
 }
 
 std::vector<std::shared_ptr<IFilter>> standardPrototypes() {
@@ -31,6 +67,9 @@ std::vector<std::shared_ptr<IFilter>> standardPrototypes() {
         imageFlowIdentifier("ConvertToSIMDOptimized"), ORVO_TARGET_CPU));
     prototypes.push_back(std::make_shared<Internal::ImageFlowFilter<ConvertFromSIMDOptimized>>(
         imageFlowIdentifier("ConvertFromSIMDOptimized"), ORVO_TARGET_CPU));
+    prototypes.push_back(shaderFilter<Internal::Filters::Premultiply>("premultiply"));
+    prototypes.push_back(shaderFilter<Internal::Filters::Unpremultiply>("unpremultiply"));
+    appendScalingFilters(prototypes, std::integer_sequence<int, 1, 2, 3, 4>());
     return prototypes;
 }
 

@@ -12,18 +12,9 @@ ClientImageSource::ClientImageSource()
 ClientImageSource::~ClientImageSource() = default;
 
 void ClientImageSource::noteContent(ImageCPU const* pImage, std::uint64_t contentStamp) {
-    void const* const pPixels = pImage ? pImage->pixels() : nullptr;
-    PositionExtentInPixelSpace const rect = pImage ? pImage->positionExtent() : PositionExtentInPixelSpace();
-    bool const bSame = contentStamp != 0 && contentStamp == iLastStamp_ && pImage == pLastImage_ &&
-                       pPixels == pLastPixels_ && rect == oLastRect_;
-    if (bSame) {
-        return;
+    if (oWatch_.mayHaveChanged(pImage, pImage ? pImage->pixels() : nullptr, contentStamp)) {
+        oChange_.setValue(oChange_.value() + 1);
     }
-    oChange_.setValue(oChange_.value() + 1);
-    pLastImage_ = pImage;
-    pLastPixels_ = pPixels;
-    oLastRect_ = rect;
-    iLastStamp_ = contentStamp;
 }
 
 } // namespace ORVO::FilterGraph::Internal

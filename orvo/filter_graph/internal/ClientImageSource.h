@@ -3,8 +3,8 @@
 #include <cstdint>
 
 #include "orvo/core/Export.h"
-#include "orvo/core/spaces/PositionExtentInPixelSpace.h"
 #include "orvo/data_flow/parameters/Parameter.h"
+#include "orvo/filter_graph/internal/ContentWatch.h"
 #include "orvo/image_flow/sources/ImageCPUInput.h"
 
 namespace ORVO::FilterGraph::Internal {
@@ -26,10 +26,7 @@ public:
 
 private:
     DataFlow::Parameter<unsigned long long> oChange_;
-    ImageCPU const* pLastImage_ = nullptr;
-    void const* pLastPixels_ = nullptr;
-    PositionExtentInPixelSpace oLastRect_;
-    std::uint64_t iLastStamp_ = 0;
+    ContentWatch oWatch_;
 };
 
 } // namespace ORVO::FilterGraph::Internal

@@ -1,16 +1,11 @@
 #include "orvo/filter_graph/internal/GraphExecutable.h"
 
-#include <limits>
+#include <optional>
 
 #include "orvo/core/Check.h"
-#include "orvo/core/exceptions/CPURuntimeException.h"
-#include "orvo/core/exceptions/ExceptionBase.h"
-#include "orvo/core/exceptions/ResourceException.h"
 #include "orvo/core/memory/TrackedNew.h"
 #include "orvo/core/spaces/PixelExtentInWorldSpace.h"
 #include "orvo/data_flow/connectors/Connect.h"
-#include "orvo/data_flow/connectors/Outputs.h"
-#include "orvo/filter_graph/impl/FilterGraphLibrary.h"
 #include "orvo/filter_graph/impl/IAdapter.h"
 #include "orvo/filter_graph/impl/ImageDescriptor.h"
 #include "orvo/filter_graph/impl/Input.h"
@@ -22,13 +17,17 @@
 #include "orvo/filter_graph/internal/ImageFlowFilterExecutable.h"
 #include "orvo/filter_graph/internal/OutputAdapter.h"
 #include "orvo/filter_graph/internal/OutputAdapterExecutable.h"
+#include "orvo/filter_graph/internal/ScopedGraphContext.h"
 #include "orvo/image_flow/ImageFlowLibrary.h"
 #include "orvo/image_flow/controllers/Bedding.h"
 #include "orvo/image_flow/controllers/ImageFlowController.h"
+#include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/ConvertFromSIMDOptimized.h"
 #include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
+#include "orvo/image_flow/filters/GPU2CPU.h"
 #include "orvo/image_flow/graph/DFSPostStackVisitor.h"
 #include "orvo/image_flow/nodes/ImageFilter.h"
+#include "orvo/ogl/ContextOffscreen.h"
 
 namespace ORVO::FilterGraph::Internal {
 
@@ -43,18 +42,9 @@ constexpr std::size_t kFormSIMD = 1;
 constexpr std::size_t kFormCPU = 2;
 constexpr std::size_t kForms = 10;
 
-constexpr double kNoTimeout = std::numeric_limits<double>::infinity();
-constexpr double kTailInterval =
-    1e-4; // seconds between two looks at a frame whose end is a few instructions away
-
 template <typename Converter>
 std::shared_ptr<ImageFilter> makeConverter() {
     return std::shared_ptr<ImageFilter>(ORVO_NEW Converter(), ImageNodeDeleter());
-}
-
-/// The converters between host memory and OpenGL memory come with the OpenGL nodes.
-[[noreturn]] void refuseOpenGL() {
-    throw ResourceException(__FILE__, __LINE__, "Images in OpenGL memory are not supported by this build");
 }
 
 } // namespace
@@ -69,10 +59,18 @@ GraphExecutable::GraphExecutable(IFilter* pGraph, OptimizationOptions const& opt
     }
     if (context) {
         ORVO_CHECK(!ORVO::ImageFlow::Library::cpuOnlyMode());
-        refuseOpenGL();
+        spContext_ = std::make_shared<OGL::ContextOffscreen>(context);
+        spBedding_ = std::make_shared<Bedding>(*spContext_, *spController_);
+    } else {
+        spBedding_ = std::make_shared<Bedding>(*spController_);
     }
-    spBedding_ = std::make_shared<Bedding>(*spController_);
-    buildGraphExecutable();
+    try {
+        ScopedGraphContext const current(spContext_);
+        buildGraphExecutable();
+    } catch (...) {
+        freeNodes();
+        throw;
+    }
 }
 
 GraphExecutable::~GraphExecutable() {
@@ -84,6 +82,18 @@ GraphExecutable::~GraphExecutable() {
     } catch (...) {
         // The controller joins its frame in any case when it dies.
     }
+    freeNodes();
+}
+
+void GraphExecutable::freeNodes() noexcept {
+    std::optional<ScopedGraphContext> oCurrent;
+    try {
+        oCurrent.emplace(spContext_);
+    } catch (...) {
+        // The host has destroyed the context that ours shares with. What lived in it is gone.
+    }
+    aFilterExecutables_.clear();
+    aConverters_.clear();
 }
 
 // ---- Building
@@ -154,8 +164,11 @@ OutputConnector* GraphExecutable::bringToOutputAdapter(IFilterExecutable& execut
     }
     bool const bFromGL = executable.getOutputTargetPlatform() == ORVO_TARGET_GL;
     bool const bToGL = outputExecutable.getInputTargetPlatform() == ORVO_TARGET_GL;
-    if (bFromGL != bToGL) {
-        refuseOpenGL();
+    if (!bFromGL && bToGL) {
+        return appendImageFlowConverter(makeConverter<CPU2GPU>(), pOutput);
+    }
+    if (bFromGL && !bToGL) {
+        return appendImageFlowConverter(makeConverter<GPU2CPU>(), pOutput);
     }
     return pOutput;
 }
@@ -213,21 +226,25 @@ OutputConnector* GraphExecutable::checkTargetsAndConnect(Filter* pSrcFilter, Out
     ORVO_CHECK(pOriginal == pSrcConnector, "(*pConvertedOutputsVec)[nOriginalOutputIndex] == pSrcConnector");
 
     OutputConnector* pConnector = pSrcConnector;
+    // One converter serves all consumers that want a form.
+    auto const convertTo = [&](std::size_t form, auto makeNode) {
+        OutputConnector*& pForm = (*pConvertedOutputsVec)[form];
+        if (!pForm) {
+            pForm = appendImageFlowConverter(makeNode(), pConnector);
+        }
+        pConnector = pForm;
+    };
     if (srcSIMD && !dstSIMD) {
-        OutputConnector*& pPlain = (*pConvertedOutputsVec)[kFormCPU];
-        if (!pPlain) {
-            pPlain = appendImageFlowConverter(makeConverter<ConvertFromSIMDOptimized>(), pConnector);
-        }
-        pConnector = pPlain;
+        convertTo(kFormCPU, makeConverter<ConvertFromSIMDOptimized>);
     } else if (!srcSIMD && dstSIMD) {
-        OutputConnector*& pSIMD = (*pConvertedOutputsVec)[kFormSIMD];
-        if (!pSIMD) {
-            pSIMD = appendImageFlowConverter(makeConverter<ConvertToSIMDOptimized>(), pConnector);
-        }
-        pConnector = pSIMD;
+        convertTo(kFormSIMD, makeConverter<ConvertToSIMDOptimized>);
     }
-    if ((srcTarget == ORVO_TARGET_GL) != (dstTarget == ORVO_TARGET_GL)) {
-        refuseOpenGL();
+    bool const bFromGL = srcTarget == ORVO_TARGET_GL;
+    bool const bToGL = dstTarget == ORVO_TARGET_GL;
+    if (!bFromGL && bToGL) {
+        convertTo(kFormGL, makeConverter<CPU2GPU>);
+    } else if (bFromGL && !bToGL) {
+        convertTo(kFormCPU, makeConverter<GPU2CPU>);
     }
     makeDataFlowConnection(pConnector, pDstConnector);
     return pConnector;
@@ -336,239 +353,6 @@ void GraphExecutable::returnStuff() {
     for (IFilterExecutable* const pExecutable : aExecutablesInOrder_) {
         pExecutable->returnStuff();
     }
-}
-
-// ---- Frames
-
-void GraphExecutable::setIntermediateBufferPrecision() {
-    if (options_.processingMode() != OptimizationOptions::FULL_OPTIMIZATION) {
-        return;
-    }
-    for (auto iNode = spController_->nodesBegin(); iNode != spController_->nodesEnd(); ++iNode) {
-        ImageFilter* const iff = (*iNode)->asImageFilter();
-        ORVO_CHECK(iff, "iff!=0");
-        ImageFilter::teOutputPrecisionHint hint = ImageFilter::OUTPUT_PRECISION_DEFAULT;
-        switch (static_cast<int>(options_.intermediateBufferPrecision())) {
-        case OptimizationOptions::INTERMEDIATE_PRECISION_DEFAULT:
-            continue;
-        case OptimizationOptions::INTERMEDIATE_PRECISION_16_BIT_FLOAT:
-            hint = ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT;
-            break;
-        case OptimizationOptions::INTERMEDIATE_PRECISION_32_BIT_FLOAT:
-            hint = ImageFilter::OUTPUT_PRECISION_32_BIT_FLOAT;
-            break;
-        default:
-            ORVO_FAIL("Not implemented: This intermediate buffer precision is not supported\n");
-        }
-        auto& parameter = iff->outputPrecisionHintParameter();
-        if (parameter.value() == ImageFilter::OUTPUT_PRECISION_DEFAULT) {
-            parameter.setValue(hint);
-        }
-    }
-}
-
-void GraphExecutable::settleLastFrame() {
-    waitForRunningFrame();
-    try {
-        spController_->checkException();
-    } catch (...) {
-        // Saved by a frame whose end nobody asked for. It must not come out of the next one.
-        bLastFrameBroken_ = true;
-    }
-    if (bCancelled_.exchange(false)) {
-        bLastFrameBroken_ = true;
-    }
-    if (bLastFrameBroken_) {
-        // A node that threw counts as running until it is flushed, a cancelled task group runs no slices
-        // until it is reset, and what some nodes hold belongs to a frame of which the others know nothing.
-        spBedding_->wait(kNoTimeout, kTailInterval);
-        spController_->flushGraph();
-        bLastFrameBroken_ = false;
-    }
-}
-
-void GraphExecutable::prepareNodes() {
-    setIntermediateBufferPrecision();
-    spController_->setNodeImageDescriptorInfo(true);
-}
-
-void GraphExecutable::prepareCaches() {
-    bool const bKeepNothing = options_.cachingMode() == OptimizationOptions::CACHING_OFF;
-    if (!bKeepNothing) {
-        spBedding_->setDirtyState();
-    }
-    for (auto iNode = spController_->nodesBegin(); iNode != spController_->nodesEnd(); ++iNode) {
-        if (bKeepNothing || (*iNode)->isDirty()) {
-            (*iNode)->flushOutputs();
-        }
-    }
-    if (bKeepNothing) {
-        spBedding_->setDirtyState();
-        return;
-    }
-    for (ImageFilter* const pNode : aFanOutNodes_) {
-        shareAmongOutputs(*pNode);
-    }
-}
-
-// One consumer of a clean node may have left its image where it was, another may have taken its share along.
-// The node does not run as long as one output holds data, so the consumer whose output is empty would wait
-// for it forever.
-void GraphExecutable::shareAmongOutputs(ImageFilter& node) {
-    using CPUOutput = DataFlow::ConstOutput<ORVO::ImageCPU>;
-    CPUOutput* pFull = nullptr;
-    bool bShareable = true;
-    bool bAnyData = false;
-    for (std::size_t iOutput = 0; iOutput < node.numberOfOutputs(); ++iOutput) {
-        OutputConnector* const pOutput = node.output(iOutput);
-        auto* const pTyped = dynamic_cast<CPUOutput*>(pOutput);
-        bShareable = bShareable && pTyped;
-        bAnyData = bAnyData || pOutput->hasData();
-        if (pTyped && pTyped->hasData()) {
-            pFull = pTyped;
-        }
-    }
-    if (!bAnyData) {
-        return;
-    }
-    if (!bShareable || !pFull) {
-        node.flushOutputs();
-        return;
-    }
-    for (std::size_t iOutput = 0; iOutput < node.numberOfOutputs(); ++iOutput) {
-        OutputConnector* const pOutput = node.output(iOutput);
-        if (!pOutput->hasData()) {
-            static_cast<CPUOutput*>(pOutput)->cloneDataFrom(*pFull);
-        }
-    }
-}
-
-void GraphExecutable::allocateOutputImages() {
-    // A node that does not run keeps what was allocated for it, and would write a later frame of another size
-    // into it.
-    for (ImageFilter* const pNode : aNodesProducersFirst_) {
-        pNode->setColor(DataFlow::Node::COLOR_NOT_VISITED);
-    }
-    for (auto iNode = aNodesProducersFirst_.rbegin(); iNode != aNodesProducersFirst_.rend(); ++iNode) {
-        ImageFilter* const iff = *iNode;
-        bool const bRuns =
-            iNode == aNodesProducersFirst_.rbegin() || iff->color() == DataFlow::Node::COLOR_DISCOVERED;
-        if (!bRuns) {
-            continue;
-        }
-        iff->allocateOutputImage();
-        for (std::size_t iInput = 0; iInput < iff->numberOfImageInputs(); ++iInput) {
-            OutputConnector const* const pProducerOutput = iff->imageInput(iInput)->connectedOutput();
-            if (!pProducerOutput->hasData()) {
-                pProducerOutput->node()->setColor(DataFlow::Node::COLOR_DISCOVERED);
-            }
-        }
-    }
-}
-
-void GraphExecutable::processFrame() {
-    settleLastFrame();
-    ORVO_CHECK(pOutput_, "pOutputAdapter");
-    bProcessingComplete_.store(false, std::memory_order_release);
-    bLastFrameBroken_ = true;
-    prepareNodes();
-    prepareCaches();
-    spBedding_->process();
-    bLastFrameBroken_ = false;
-    bProcessingComplete_.store(true, std::memory_order_release);
-    returnStuff();
-}
-
-void* GraphExecutable::asyncProcessFrame() {
-    settleLastFrame();
-    ORVO_CHECK(pOutput_, "pOutputAdapter");
-    bProcessingComplete_.store(false, std::memory_order_release);
-    bLastFrameBroken_ = true;
-    spController_->registerProcessingCompletedCallback(internalCompletionCallback, this);
-    prepareNodes();
-    prepareCaches();
-    if (Library::getInitializationOptions().getAllocationMode() == 1) {
-        allocateOutputImages();
-    }
-    bFrameOut_ = true;
-    try {
-        spBedding_->processAsync();
-    } catch (...) {
-        bFrameOut_ = false;
-        throw;
-    }
-    bLastFrameBroken_ = false;
-    return this;
-}
-
-void GraphExecutable::cancelFrame() {
-    bCancelled_.store(true);
-    spController_->cancelProcess();
-}
-
-bool GraphExecutable::waitForFrame(double timeout, double interval) {
-    bool const bEnded = spController_->wait(timeout, interval);
-    if (bEnded) {
-        bFrameOut_ = false;
-    }
-    return bEnded;
-}
-
-void GraphExecutable::waitForRunningFrame() {
-    if (!bFrameOut_) {
-        return;
-    }
-    ORVO_CHECK(oCallbackThread_.load() != std::this_thread::get_id(),
-               "The completion callback must not change the frame that it ends");
-    bProcessingComplete_.wait(false, std::memory_order_acquire);
-    // Completion is recorded a moment before the frame's last step.
-    spController_->wait(kNoTimeout, kTailInterval);
-    bFrameOut_ = false;
-}
-
-void GraphExecutable::sleep(double seconds) { spController_->sleep(seconds); }
-
-void GraphExecutable::checkException() {
-    try {
-        spController_->checkException();
-    } catch (...) {
-        bLastFrameBroken_ = true;
-        throw;
-    }
-}
-
-void GraphExecutable::setCompletionCallback(bool (*callback)(void*)) { pCompletionCallback_.store(callback); }
-
-bool GraphExecutable::internalCompletionCallback(void* self) {
-    auto* const pExecutable = static_cast<GraphExecutable*>(self);
-    try {
-        pExecutable->returnStuff();
-        pExecutable->callCompletionCallback();
-    } catch (ExceptionBase const& exception) {
-        pExecutable->spController_->saveException(exception.clone());
-    } catch (...) {
-        pExecutable->spController_->saveException(
-            ORVO_NEW CPURuntimeException(CPURuntimeException::CONDITION_UNKNOWN));
-    }
-    // The host may destroy the frame's results, but not this object, as soon as it sees this.
-    pExecutable->bProcessingComplete_.store(true, std::memory_order_release);
-    pExecutable->bProcessingComplete_.notify_all();
-    return true;
-}
-
-void GraphExecutable::callCompletionCallback() {
-    auto* const pCallback = pCompletionCallback_.load();
-    if (!pCallback) {
-        return;
-    }
-    oCallbackThread_.store(std::this_thread::get_id());
-    try {
-        pCallback(this);
-    } catch (...) {
-        oCallbackThread_.store(std::thread::id());
-        throw;
-    }
-    oCallbackThread_.store(std::thread::id());
 }
 
 } // namespace ORVO::FilterGraph::Internal

@@ -25,6 +25,7 @@ class OutputConnector;
 
 namespace ORVO::OGL {
 class Context;
+class ContextOffscreen;
 } // namespace ORVO::OGL
 
 namespace ORVO::FilterGraph {
@@ -42,8 +43,12 @@ class OutputAdapter;
 /// frames and carries regions.
 ///
 /// One target serves the whole graph and is taken from the processing mode. Converter nodes bridge what
-/// differs: the layout that a node wants its pixels in, and the place where the client's images live. Images
-/// in OpenGL memory, and graphs that run there, are refused by this build (ResourceException).
+/// differs: the layout that a node wants its pixels in, and the place where the client's images live.
+///
+/// With a context the graph has a hidden context of its own that shares with it. Nodes are built, run and
+/// freed in that one, and whatever context the host has current is current again after each call. What a
+/// frame draws into a client's texture is drawn before anything that the host's context, current at
+/// `processFrame`, is given afterwards; at the end of an asynchronous frame it is complete.
 ///
 /// What a frame may keep of the one before: with `cachingMode` 0 nothing. With any other mode the results of
 /// the nodes that are not dirty, where dirty is a node one of whose parameters changed, a source whose image
@@ -127,6 +132,8 @@ private:
     using ConvertedOutputs = std::vector<DataFlow::OutputConnector*>;
 
     void buildGraphExecutable();
+    /// Frees filter executables and converters with the graph's context current.
+    void freeNodes() noexcept;
     /// Connects the node of `pFilter` to those of its consumers; the sink, where it feeds the output adapter.
     ImageFilter* connectConsumers(Filter* pFilter, IFilterExecutable& executable,
                                   ConvertedOutputs& convertedOutputs);
@@ -159,12 +166,14 @@ private:
     /// Allocates the output image of each node that the frame will run, on this thread.
     void allocateOutputImages();
     void returnStuff();
+    /// Whether frames draw into a client's texture.
+    bool drawsIntoTexture() const;
     static bool internalCompletionCallback(void* self);
     void callCompletionCallback();
 
     OutputAdapter* pOutput_;
     OptimizationOptions options_;
-    // The offscreen context of the OpenGL road stands here: it outlives the controller.
+    std::shared_ptr<OGL::ContextOffscreen> spContext_; // null in CPU-only use; outlives the controller
     std::shared_ptr<ImageFlowController> spController_;
     std::shared_ptr<Bedding> spBedding_;
     std::map<Filter*, std::shared_ptr<IFilterExecutable>> aFilterExecutables_;

@@ -5,6 +5,7 @@
 #include "orvo/filter_graph/impl/Input.h"
 #include "orvo/filter_graph/impl/Output.h"
 #include "orvo/filter_graph/internal/InputAdapterExecutableCPU.h"
+#include "orvo/filter_graph/internal/InputAdapterExecutableGL.h"
 
 namespace ORVO::FilterGraph::Internal {
 
@@ -76,9 +77,14 @@ std::shared_ptr<Filter> InputAdapter::clone() {
 std::shared_ptr<IFilterExecutable> InputAdapter::buildFilterExecutable(TargetPlatform,
                                                                        GraphExecutable& graphExecutable) {
     // What the source is made for follows from where the image lives, not from the target of the graph.
-    if (getImageDescriptor().type() == ORVO_TARGET_CPU)
+    switch (getImageDescriptor().type()) {
+    case ORVO_TARGET_GL:
+        return std::make_shared<InputAdapterExecutableGL>(graphExecutable, *this);
+    case ORVO_TARGET_CPU:
         return std::make_shared<InputAdapterExecutableCPU>(graphExecutable, *this);
-    ORVO_FAIL_PARAMETER("false");
+    default:
+        ORVO_FAIL_PARAMETER("false");
+    }
 }
 
 } // namespace ORVO::FilterGraph::Internal

@@ -35,6 +35,16 @@ constexpr StandardFilter standardFilters[] = {
     {"LABToRGBCPU", "ImageFlow", "Norvane", "InputImage", false},
     {"ConvertToSIMDOptimized", "ImageFlow", "Norvane", "input", false},
     {"ConvertFromSIMDOptimized", "ImageFlow", "Norvane", "input", false},
+    {"premultiply", "ORVO", "Norvane", "src", false},
+    {"unpremultiply", "ORVO", "Norvane", "src", false},
+    {"scaleUp1channel", "ORVO", "Norvane", "src", false},
+    {"scaleUp2channel", "ORVO", "Norvane", "src", false},
+    {"scaleUp3channel", "ORVO", "Norvane", "src", false},
+    {"scaleUp4channel", "ORVO", "Norvane", "src", false},
+    {"scaleDown1channel", "ORVO", "Norvane", "src", false},
+    {"scaleDown2channel", "ORVO", "Norvane", "src", false},
+    {"scaleDown3channel", "ORVO", "Norvane", "src", false},
+    {"scaleDown4channel", "ORVO", "Norvane", "src", false},
 };
 
 std::string alreadyExists(StandardFilter const& filter) {

@@ -253,27 +253,40 @@ public:
     void clear() override {}
 };
 
-constexpr char const* kNoOpenGL = "Images in OpenGL memory are not supported by this build";
-
-TEST_F(GraphExecutableTest, RefusesAnOutputInOpenGLMemory) {
+TEST_F(GraphExecutableTest, AnOutputInOpenGLMemoryGetsAnUpload) {
     TextureHandle texture;
     spSink_->setImage(&texture);
     Connect(spSource_, spSink_);
-    ORVO_EXPECT_RESOURCE(build(), kNoOpenGL);
+    build();
+    EXPECT_EQ(wires(), (Wires{"ImageCPUInput -> CPU2GPU"}));
+    EXPECT_EQ(sinkName(), "CPU2GPU");
 }
 
-TEST_F(GraphExecutableTest, RefusesToBringHostMemoryToAnOpenGLFilter) {
-    class HardwareGain : public GainNode {
-    public:
-        HardwareGain() { inputTarget_ = ORVO_TARGET_GL; }
-        bool willRunInHardware() override { return true; }
-    };
+// A SIMD output that goes to a texture gets the one conversion of its layout, with no upload behind it.
+TEST_F(GraphExecutableTest, ASIMDOutputInOpenGLMemoryGetsNoUpload) {
+    TextureHandle texture;
+    spSink_->setImage(&texture);
+    FilterPtr const spGain = makeFilter<SIMDGainNode>();
+    Connect(spSource_, spGain);
+    Connect(spGain, spSink_);
+    build();
+    EXPECT_EQ(sinkName(), "ConvertFromSIMDOptimized");
+}
+
+/// A filter in host memory whose input is on OpenGL, for the wiring alone.
+class HardwareGain : public GainNode {
+public:
+    HardwareGain() { inputTarget_ = ORVO_TARGET_GL; }
+    bool willRunInHardware() override { return true; }
+};
+
+TEST_F(GraphExecutableTest, AnUploadNeedsAnInputThatTakesTextures) {
     ImageFlowFilter<HardwareGain> filter(IFilter::Identifier("gl", "test", "ORVO", 1), ORVO_TARGET_GL);
     filter.initialize();
     FilterPtr const spGain = filter.clone();
     Connect(spSource_, spGain);
     Connect(spGain, spSink_);
-    ORVO_EXPECT_RESOURCE(build(OptimizationOptions()), kNoOpenGL);
+    ORVO_EXPECT_INTERNAL(build(OptimizationOptions()), "pDstConnector->canConnect(pSrcConnector)");
 }
 
 /// A generator that says that it runs in OpenGL, so that a whole graph of that mode can be built.

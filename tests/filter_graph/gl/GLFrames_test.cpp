@@ -1,0 +1,387 @@
+// Frames of processors on OpenGL: synchronous and asynchronous, one after the other, on several contexts,
+// with every call of OpenGL failing in turn.
+#include <atomic>
+#include <thread>
+
+#include "orvo/filter_graph/filters/StandardFilters.h"
+#include "orvo/filter_graph/impl/FilterFactory.h"
+#include "orvo/image_runtime/TexturePool.h"
+#include "orvo/ogl/NativeContext.h"
+#include "tests/support/Expect.h"
+#include "tests/support/gl/GLFrameTest.h"
+
+namespace ORVO::FilterGraph {
+namespace {
+
+using namespace ORVO::Test;
+
+constexpr int kWidth = 9;
+constexpr int kHeight = 6;
+constexpr double kLong = 60.0; // seconds, far beyond what any frame here takes
+constexpr float kStep = 1.0f / 255.0f;
+
+/// host memory -> add -> host memory, or textures.
+struct Chain {
+    Chain(ImageBase* pInput, ImageBase* pOutput, OGL::Context const* pContext)
+        : spSource_(makeGLSource(pInput)),
+          spSink_(makeGLSink(pOutput)),
+          spProcessor_(createProcessor(spSink_, pContext)) {
+        Connect(spSource_, spAdd_);
+        Connect(spAdd_, spSink_);
+        add(10);
+    }
+
+    void add(int steps) { setParameter(*spAdd_, "value", static_cast<float>(steps) * kStep); }
+
+    SourcePtr spSource_;
+    FilterPtr spAdd_ = makeAddShader();
+    SinkPtr spSink_;
+    std::shared_ptr<IProcessor> spProcessor_;
+};
+
+class GLFramesTest : public GLFrameTest {};
+
+TEST_F(GLFramesTest, NewValuesReachTheShader) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    for (int steps : {10, 20, 0, 50}) {
+        chain.add(steps);
+        chain.spProcessor_->processFrame(glOptions());
+        EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), steps));
+    }
+}
+
+TEST_F(GLFramesTest, NewPixelsInPlaceAreSeen) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    for (std::uint8_t const fill : {std::uint8_t(0), std::uint8_t(40), std::uint8_t(7)}) {
+        std::fill(input.bytes().begin(), input.bytes().end(), fill);
+        chain.spProcessor_->processFrame(glOptions());
+        EXPECT_EQ(output.bytes(),
+                  std::vector<std::uint8_t>(output.bytes().size(), static_cast<std::uint8_t>(fill + 10)));
+    }
+}
+
+TEST_F(GLFramesTest, AStampedTextureIsNotDrawnAgain) {
+    TextureImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    ByteImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    input.handle()->setContentStamp(1);
+    chain.spProcessor_->processFrame(glOptions());
+    // The stamp vouches for what is not so: the result stays what it was.
+    input.write(std::vector<std::uint8_t>(4 * kWidth * kHeight, 0));
+    chain.spProcessor_->processFrame(glOptions());
+    EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 10));
+    input.handle()->setContentStamp(2);
+    chain.spProcessor_->processFrame(glOptions());
+    EXPECT_EQ(output.bytes(), std::vector<std::uint8_t>(output.bytes().size(), 10));
+}
+
+TEST_F(GLFramesTest, AFrameOfAnUnchangedGraphMakesNothingNew) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    for (int frame = 0; frame < 3; ++frame) { // fills the pool
+        chain.spProcessor_->processFrame(glOptions());
+    }
+    ObjectCounts const before = GLHooks::objects();
+    std::uint64_t const nLinks = GLHooks::calls("glLinkProgram");
+    std::uint64_t const nTextures = GLHooks::calls("glGenTextures");
+    for (int steps = 0; steps < 20; ++steps) {
+        chain.add(steps);
+        chain.spProcessor_->processFrame(glOptions());
+        ASSERT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), steps));
+    }
+    EXPECT_EQ(GLHooks::calls("glLinkProgram"), nLinks);
+    EXPECT_EQ(GLHooks::calls("glGenTextures"), nTextures);
+    EXPECT_EQ(GLHooks::objects(), before);
+}
+
+TEST_F(GLFramesTest, TheHostsStateAndContextAreAsTheyWere) {
+    TextureImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    TextureImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    GLState const before = GLState::capture();
+    void* const pHandle = host().handle();
+    chain.spProcessor_->processFrame(glOptions());
+    EXPECT_EQ(before.differencesTo(GLState::capture()), "");
+    EXPECT_EQ(OGL::NativeContext::currentHandle(), pHandle);
+}
+
+TEST_F(GLFramesTest, RunWithNoContextCurrent) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    {
+        Chain chain(input.handle(), output.handle(), context());
+        host().release();
+        chain.spProcessor_->processFrame(glOptions());
+        EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 10));
+        EXPECT_EQ(OGL::NativeContext::currentHandle(), nullptr);
+        chain.add(20);
+        chain.spProcessor_->asyncProcessFrame(glOptions());
+        ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+        EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 20));
+    } // the graph dies with no context current
+    EXPECT_EQ(OGL::NativeContext::currentHandle(), nullptr);
+}
+
+TEST_F(GLFramesTest, RunUnderAForeignContext) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    auto const pForeign = host().another(false);
+    pForeign->makeCurrent();
+    chain.spProcessor_->processFrame(glOptions());
+    EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 10));
+    EXPECT_EQ(OGL::NativeContext::currentHandle(), pForeign->handle());
+    host().makeCurrent();
+}
+
+TEST_F(GLFramesTest, ATextureIsRefusedUnderAForeignContext) {
+    TextureImage image(0, 0, kWidth, kHeight);
+    auto const pForeign = host().another(false);
+    pForeign->makeCurrent();
+    bool bThrown = false;
+    try {
+        image.handle()->setPixelStorage(&image.texture());
+    } catch (InternalException const& exception) {
+        bThrown = true;
+        std::string const sText = exception.message();
+        EXPECT_EQ(sText.rfind("Current context of value ", 0), 0u) << sText;
+        EXPECT_NE(sText.find(" does not share with any context used to initialize image_runtime"),
+                  std::string::npos);
+    }
+    EXPECT_TRUE(bThrown);
+    host().makeCurrent();
+    EXPECT_EQ(image.handle()->getPixelStorage(), &image.texture());
+}
+
+TEST_F(GLFramesTest, TwoProcessorsOnTwoContextsOfAGroup) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    ByteImage outputA(0, 0, kWidth, kHeight);
+    ByteImage outputB(0, 0, kWidth, kHeight);
+    auto const pSecond = host().another(true);
+    pSecond->makeCurrent();
+    auto const pSecondContext = OGL::Context::adoptCurrent();
+    host().makeCurrent();
+    {
+        Chain a(input.handle(), outputA.handle(), context());
+        Chain b(input.handle(), outputB.handle(), pSecondContext.get());
+        for (int steps = 1; steps < 4; ++steps) {
+            a.add(steps);
+            b.add(2 * steps);
+            a.spProcessor_->asyncProcessFrame(glOptions());
+            ASSERT_EQ(a.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+            b.spProcessor_->processFrame(glOptions());
+            EXPECT_EQ(outputA.bytes(), plus(pattern(kWidth, kHeight), steps));
+            EXPECT_EQ(outputB.bytes(), plus(pattern(kWidth, kHeight), 2 * steps));
+        }
+    }
+}
+
+// ---- Asynchronous frames
+
+std::atomic<int> nCallbacks{0};
+
+bool countCallback(void*) {
+    ++nCallbacks;
+    return true;
+}
+
+TEST_F(GLFramesTest, AsynchronousFramesDrawIntoTextures) {
+    TextureImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    TextureImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    chain.spProcessor_->processFrame(glOptions());
+    nCallbacks = 0;
+    chain.spProcessor_->setCompletionCallback(countCallback);
+    for (int steps = 0; steps < 20; ++steps) {
+        chain.add(steps);
+        chain.spProcessor_->asyncProcessFrame(glOptions());
+        while (chain.spProcessor_->frameStatus() == IProcessorBase::FRAME_RUNNING) {
+            std::this_thread::yield();
+        }
+        ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+        ASSERT_EQ(output.read(), plus(pattern(kWidth, kHeight), steps));
+    }
+    EXPECT_EQ(nCallbacks, 20);
+}
+
+TEST_F(GLFramesTest, CancelledFramesLeaveTheNextOneRight) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    chain.spProcessor_->processFrame(glOptions());
+    for (int frame = 0; frame < 50; ++frame) {
+        chain.add(frame % 40);
+        chain.spProcessor_->asyncProcessFrame(glOptions());
+        chain.spProcessor_->cancelFrame();
+        if (frame % 3 == 0) {
+            ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+        }
+        if (frame % 5 == 0) {
+            chain.spProcessor_->processFrame(glOptions());
+            ASSERT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), frame % 40));
+        }
+    }
+    ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+}
+
+// ---- Failures
+
+TEST_F(GLFramesTest, EveryCallThatFailsLeavesTheNextFrameRight) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    TextureImage texture(0, 0, kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    for (ImageBase* const pOutput :
+         {static_cast<ImageBase*>(output.handle()), static_cast<ImageBase*>(texture.handle())}) {
+        int nFailed = 0;
+        for (std::uint64_t n = 1;; ++n) {
+            // A new processor each time, so that building fails in turn, too.
+            Chain chain(input.handle(), pOutput, context());
+            TexturePool::Instance()->clearAll();
+            bool bFired = false;
+            {
+                GLCallFailure const failure(n);
+                try {
+                    chain.spProcessor_->processFrame(glOptions());
+                } catch (ExceptionBase const&) {
+                    ++nFailed;
+                } catch (std::bad_alloc const&) {
+                    ++nFailed;
+                }
+                bFired = failure.hasFired();
+            }
+            drainErrors();
+            std::fill(output.bytes().begin(), output.bytes().end(), std::uint8_t(1));
+            texture.write(output.bytes());
+            chain.spProcessor_->processFrame(glOptions());
+            std::vector<std::uint8_t> const aResult =
+                pOutput == output.handle() ? output.bytes() : texture.read();
+            ASSERT_EQ(aResult, plus(pattern(kWidth, kHeight), 10)) << "after failed call " << n;
+            if (!bFired) {
+                break;
+            }
+        }
+        EXPECT_GT(nFailed, 5);
+    }
+}
+
+TEST_F(GLFramesTest, TheGraphOutlivesTheHostsContext) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    auto const pSecond = host().another(true);
+    pSecond->makeCurrent();
+    auto const pSecondContext = OGL::Context::adoptCurrent();
+    Chain chain(input.handle(), output.handle(), pSecondContext.get());
+    chain.spProcessor_->processFrame(glOptions());
+    host().makeCurrent();
+    pSecond->destroyContext();
+    chain.add(30);
+    chain.spProcessor_->processFrame(glOptions());
+    EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 30));
+}
+
+// ---- Precision and scales
+
+TEST_F(GLFramesTest, IntermediatePrecisionKeepsWhatEightBitsLose) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.bytes() = pattern(kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    SourcePtr const spSource = makeGLSource(input.handle());
+    FilterPtr const spUp = makeAddShader("up");
+    FilterPtr const spDown = makeAddShader("down");
+    SinkPtr const spSink = makeGLSink(output.handle());
+    Connect(spSource, spUp);
+    Connect(spUp, spDown);
+    Connect(spDown, spSink);
+    // Beyond white and back: 8-bit intermediates are clamped at white.
+    setParameter(*spUp, "value", 1.0f);
+    setParameter(*spDown, "value", -1.0f);
+    auto const spProcessor = createProcessor(spSink, context());
+    OptimizationOptions options = glOptions();
+    spProcessor->processFrame(options);
+    EXPECT_EQ(output.bytes(), std::vector<std::uint8_t>(output.bytes().size(), 0));
+    options.setIntermediateBufferPrecision(OptimizationOptions::INTERMEDIATE_PRECISION_16_BIT_FLOAT);
+    spProcessor->processFrame(options);
+    EXPECT_EQ(output.bytes(), pattern(kWidth, kHeight));
+}
+
+TEST_F(GLFramesTest, AnUnknownIntermediatePrecisionFailsAtTheLaunch) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    ByteImage output(0, 0, kWidth, kHeight);
+    Chain chain(input.handle(), output.handle(), context());
+    OptimizationOptions options = glOptions();
+    options.setIntermediateBufferPrecision(static_cast<OptimizationOptions::eIntermediateBufferPrecision>(3));
+    ORVO_EXPECT_INTERNAL(chain.spProcessor_->processFrame(options),
+                         "Not implemented: This intermediate buffer precision is not supported\n");
+    chain.spProcessor_->processFrame(glOptions());
+    EXPECT_EQ(output.bytes(), std::vector<std::uint8_t>(output.bytes().size(), 10));
+}
+
+TEST_F(GLFramesTest, TexturesOnTheScaleOf32768AreScaledUpAndDown) {
+    insertStandardFilters();
+    constexpr auto kFormat = OGL::Texture::INTERNAL_FORMAT_RGBA16;
+    constexpr auto kType = ImageDescriptor::CHANNEL_TYPE_UINT15_1;
+    TextureImage input(0, 0, 3, 1, kFormat, kType);
+    TextureImage output(0, 0, 3, 1, kFormat, kType);
+    input.write16({0, 16384, 32768, 32768, 1, 2, 3, 4, 30000, 20000, 10000, 32768});
+    SourcePtr const spSource = makeGLSource(input.handle());
+    SinkPtr const spSink = makeGLSink(output.handle());
+    Connect(spSource, spSink);
+    {
+        auto const spProcessor = createProcessor(spSink, context());
+        spProcessor->processFrame(glOptions());
+        std::vector<std::uint16_t> const aResult = output.read16();
+        std::vector<std::uint16_t> const aExpected = input.read16();
+        for (std::size_t i = 0; i < aExpected.size(); ++i) {
+            EXPECT_NEAR(aResult[i], aExpected[i], 1) << i;
+        }
+    }
+    removeStandardFilters();
+}
+
+/// One texel through a standard filter, with intermediates of 8 bits.
+std::vector<std::uint8_t> through(char const* name, std::vector<std::uint8_t> const& aTexel,
+                                  OGL::Context const* pContext) {
+    ByteImage input(0, 0, 1, 1);
+    input.bytes() = aTexel;
+    ByteImage output(0, 0, 1, 1);
+    SourcePtr const spSource = makeGLSource(input.handle());
+    FilterPtr const spFilter = FilterFactory::Instance()->create({name, "ORVO", "Norvane"});
+    SinkPtr const spSink = makeGLSink(output.handle());
+    Connect(spSource, spFilter);
+    Connect(spFilter, spSink);
+    createProcessor(spSink, pContext)->processFrame(glOptions());
+    return output.bytes();
+}
+
+TEST_F(GLFramesTest, PremultiplyAndUnpremultiply) {
+    using Texel = std::vector<std::uint8_t>;
+    insertStandardFilters();
+    EXPECT_EQ(through("premultiply", {200, 100, 50, 51}, context()), (Texel{40, 20, 10, 51}));
+    EXPECT_EQ(through("premultiply", {200, 100, 50, 255}, context()), (Texel{200, 100, 50, 255}));
+    EXPECT_EQ(through("premultiply", {200, 100, 50, 0}, context()), (Texel{0, 0, 0, 0}));
+    EXPECT_EQ(through("unpremultiply", {40, 20, 10, 51}, context()), (Texel{200, 100, 50, 51}));
+    EXPECT_EQ(through("unpremultiply", {200, 100, 50, 0}, context()), (Texel{0, 0, 0, 0}));
+    // 50 * 0.5000076 = 25.0004, 100 * 1.999969 = 199.9969: half and twice to the nearest byte.
+    EXPECT_EQ(through("scaleDown4channel", {100, 50, 10, 200}, context()), (Texel{50, 25, 5, 100}));
+    EXPECT_EQ(through("scaleUp4channel", {100, 50, 10, 120}, context()), (Texel{200, 100, 20, 240}));
+    removeStandardFilters();
+}
+
+} // namespace
+} // namespace ORVO::FilterGraph
