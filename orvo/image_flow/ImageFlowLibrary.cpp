@@ -2,17 +2,24 @@
 
 #include "orvo/core/Check.h"
 #include "orvo/core/CoreLibrary.h"
+#include "orvo/core/exceptions/ResourceException.h"
 #include "orvo/core/memory/TrackedNew.h"
 #include "orvo/data_flow/DataFlowLibrary.h"
 #include "orvo/data_flow/librarian/NodeLibrarian.h"
 #include "orvo/data_flow/librarian/NodeMetaData.h"
+#include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
 #include "orvo/image_flow/sources/ImageCPUInput.h"
+#include "orvo/image_flow/sources/ImageGPUInput.h"
+#include "orvo/image_flow/sources/ImageGPUOutput.h"
 #include "orvo/image_runtime/ImageRuntimeLibrary.h"
+#include "orvo/ogl/Context.h"
+#include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/OGLLibrary.h"
+#include "orvo/ogl/ScopedContextWrapper.h"
 
 #include <algorithm>
 #include <cstdint>
@@ -36,6 +43,12 @@ Node* createOnCPU(NodeTargetType target) {
     return target == DataFlow::NODE_TARGET_GPU ? nullptr : ORVO_NEW CPUNode();
 }
 
+/// A node type that runs on the GPU alone.
+template <typename GPUNode>
+Node* createOnGPU(NodeTargetType target) {
+    return target == DataFlow::NODE_TARGET_GPU ? ORVO_NEW GPUNode() : nullptr;
+}
+
 /// A node type with one class for every target.
 template <typename AnyNode>
 Node* createOnAny(NodeTargetType /*target*/) {
@@ -50,6 +63,9 @@ struct NodeType {
 
 /// The node types in the order of their registration.
 constexpr NodeType aNodeTypes[] = {
+    {"CPU2GPU", "CPU2GPU", createOnAny<CPU2GPU>},
+    {"ImageGPUInput", "ImageGPUInput", createOnGPU<ImageGPUInput>},
+    {"ImageGPUOutput", "ImageGPUOutput", createOnGPU<ImageGPUOutput>},
     {"FastBilateralFilter", "NRVN Fast Bilateral", createOnCPU<FastBilateralFilterCPUNode>},
     {"RGBToLABCPU", "NRVN ORVO RGB2LAB", createOnCPU<RGBToLABCPU>},
     {"LABToRGBCPU", "NRVN ORVO LAB2RGB", createOnCPU<LABToRGBCPU>},
@@ -89,13 +105,32 @@ void checkLowerLayers() {
     ORVO_CHECK(OGL::Library::isInitialized());
 }
 
+/// Throws where the driver of the first context lacks what the nodes of the GPU need.
+void checkDriver() {
+    OGL::ScopedContextWrapper const wrapper;
+    ImageRuntime::Library::initializationContextList().front()->makeCurrent();
+    auto const* const pManager = OGL::ExtensionManager::Instance();
+    ORVO_CHECK(pManager != nullptr, "pManager != 0");
+    if (pManager->majorVersion() == 1 && pManager->minorVersion() < 5) {
+        throw ResourceException(__FILE__, __LINE__, "Minimum OpenGL Version (1.5) not supported.");
+    }
+    if (!pManager->isSupported(OGL::EXTENSION_EXT_FRAMEBUFFER_OBJECT)) {
+        throw ResourceException(__FILE__, __LINE__, "Framebuffer Object Extension not supported.");
+    }
+    if (!pManager->supportsNonPowerOfTwoTextures()) {
+        throw ResourceException(__FILE__, __LINE__, "Non power of two textures not supported.");
+    }
+}
+
 } // namespace
 
-void Library::initialize(bool /*checkGPU*/) {
+void Library::initialize(bool checkGPU) {
     ORVO_CHECK(!bInitialized, "ImageFlow already initialized");
     checkLowerLayers();
     // A driver is there to be checked only where the runtime was given a context.
-    ORVO_CHECK(cpuOnlyMode());
+    if (!cpuOnlyMode() && checkGPU) {
+        checkDriver();
+    }
     if (NodeLibrarian::exists()) {
         registerNodeTypes(*NodeLibrarian::Instance());
     }

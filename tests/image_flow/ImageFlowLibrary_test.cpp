@@ -6,11 +6,14 @@
 #include "orvo/data_flow/DataFlowLibrary.h"
 #include "orvo/data_flow/librarian/NodeLibrarian.h"
 #include "orvo/data_flow/librarian/NodeMetaData.h"
+#include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
 #include "orvo/image_flow/sources/ImageCPUInput.h"
+#include "orvo/image_flow/sources/ImageGPUInput.h"
+#include "orvo/image_flow/sources/ImageGPUOutput.h"
 #include "orvo/image_runtime/ImageRuntimeLibrary.h"
 #include "orvo/image_runtime/VideoMemoryConfiguration.h"
 #include "orvo/ogl/Context.h"
@@ -101,6 +104,9 @@ struct Row {
 };
 
 Row const aRows[] = {
+    {"CPU2GPU", "CPU2GPU", &typeid(CPU2GPU), &typeid(CPU2GPU)},
+    {"ImageGPUInput", "ImageGPUInput", nullptr, &typeid(ImageGPUInput)},
+    {"ImageGPUOutput", "ImageGPUOutput", nullptr, &typeid(ImageGPUOutput)},
     {"FastBilateralFilter", "NRVN Fast Bilateral", &typeid(FastBilateralFilterCPUNode), nullptr},
     {"RGBToLABCPU", "NRVN ORVO RGB2LAB", &typeid(RGBToLABCPU), nullptr},
     {"LABToRGBCPU", "NRVN ORVO LAB2RGB", &typeid(LABToRGBCPU), nullptr},

@@ -208,6 +208,11 @@ void Controller::launchFrame() {
 }
 
 void Controller::processFrameFunction() {
+    pullFrame();
+    notifyOfCompletion();
+}
+
+bool Controller::pullFrame() {
     // A cancel that came after the launch stays: the frame then pulls nothing.
     teControllerStatus eStopped = CONTROLLER_STOPPED;
     eStatus_.compare_exchange_strong(eStopped, CONTROLLER_RUNNING, std::memory_order_acq_rel);
@@ -217,10 +222,11 @@ void Controller::processFrameFunction() {
             processRecursive(pSink_);
         }
         stop();
+        return true;
     } catch (...) {
         saveCurrentException();
+        return false;
     }
-    notifyOfCompletion();
 }
 
 void Controller::notifyOfCompletion() {

@@ -190,6 +190,11 @@ protected:
     /// Throws InternalException "producerOutput", "producer", or "Graph contains a cycle".
     void processRecursive(Node* pNode);
 
+    /// Body of the asynchronous frame without its completion: pulls the sink and saves every exception
+    /// instead of throwing it. True if there was none. For overrides of processFrameFunction() that undo
+    /// something before they call notifyOfCompletion().
+    bool pullFrame();
+
     /// If the frame was cancelled: flushGraph(), then makes the controller ready for the next frame.
     /// Throws InternalException "bGraphFlushed".
     void resetIfCancelled();

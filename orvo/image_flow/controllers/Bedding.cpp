@@ -7,6 +7,10 @@ namespace ORVO {
 
 Bedding::Bedding(ImageFlowController& controller) : pController_(&controller) {}
 
+Bedding::Bedding(OGL::Context const& context, ImageFlowController& controller) : pController_(&controller) {
+    setContextGPU_DEPRECATED_1_0(context);
+}
+
 Bedding::~Bedding() = default;
 
 void Bedding::process() {
@@ -52,6 +56,16 @@ void Bedding::propagateROIs(PositionExtentInWorldSpace const& region) {
 void Bedding::setDirtyState() {
     ORVO_ENFORCE(pController_);
     pController_->setDirtyState();
+}
+
+OGL::Context const* Bedding::contextGPU() const {
+    ORVO_ENFORCE(pController_);
+    return static_cast<ImageFlowController const*>(pController_)->contextGPU();
+}
+
+void Bedding::setContextGPU_DEPRECATED_1_0(OGL::Context const& context) {
+    ORVO_ENFORCE(pController_);
+    pController_->setContextGPU(context);
 }
 
 void Bedding::plantMasterTree(ImageFilter& sink) {

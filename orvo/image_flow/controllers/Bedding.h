@@ -4,6 +4,10 @@
 
 namespace ORVO {
 
+namespace OGL {
+class Context;
+}
+
 class ImageFilter;
 class ImageFlowController;
 class PositionExtentInWorldSpace;
@@ -17,6 +21,8 @@ class PositionExtentInWorldSpace;
 class ORVO_API Bedding {
 public:
     explicit Bedding(ImageFlowController& controller);
+    /// The same, and gives the controller its OpenGL context; see `ImageFlowController::setContextGPU`.
+    Bedding(OGL::Context const& context, ImageFlowController& controller);
     virtual ~Bedding();
 
     Bedding(Bedding const&) = delete;
@@ -34,6 +40,10 @@ public:
     void propagatePixelExtents();
     void propagateROIs(PositionExtentInWorldSpace const& region);
     void setDirtyState();
+
+    /// The context that frames run in; null if there is none.
+    OGL::Context const* contextGPU() const;
+    void setContextGPU_DEPRECATED_1_0(OGL::Context const& context);
 
     /// Makes `sink` the node that frames are pulled from.
     void plantMasterTree(ImageFilter& sink);

@@ -1,6 +1,8 @@
 #include "orvo/image_flow/controllers/ImageFlowController.h"
 
 #include "orvo/core/Check.h"
+#include "orvo/core/memory/TrackedNew.h"
+#include "orvo/core/utility/SharedPtr.h"
 #include "orvo/data_flow/connectors/InputConnector.h"
 #include "orvo/data_flow/connectors/OutputConnector.h"
 #include "orvo/image_flow/graph/DFSPostStackVisitor.h"
@@ -8,9 +10,18 @@
 #include "orvo/image_flow/graph/PropagatePixelExtentVisitor.h"
 #include "orvo/image_flow/graph/SetDirtyStateVisitor.h"
 #include "orvo/image_flow/nodes/ImageFilter.h"
+#include "orvo/image_runtime/images/ImageGPU.h"
+#include "orvo/ogl/Context.h"
+#include "orvo/ogl/ExceptionOGL.h"
+#include "orvo/ogl/Framebuffer.h"
+#include "orvo/ogl/ScopedContextWrapper.h"
+#include "orvo/ogl/TextureState.h"
+#include "orvo/ogl/TextureUnit.h"
+#include "orvo/ogl/internal/GL.h"
 
 #include <cstddef>
 #include <deque>
+#include <memory>
 
 namespace ORVO {
 
@@ -68,23 +79,174 @@ Hint hintOf(ImageCPU::tePixelFormat format) {
     ORVO_FAIL("Not implemented: ImageCPU Pixel format not supported");
 }
 
+Hint hintOf(ImageGPU::tePixelFormat format) {
+    // The formats run through the four precisions, in the hints' order, once for each kind of channels.
+    ORVO_CHECK(format >= ImageGPU::PIXEL_FORMAT_RGBA8 && format < ImageGPU::PIXEL_FORMAT_UNDEFINED,
+               "Not implemented: ImageGPU Pixel format not supported");
+    return static_cast<Hint>(format % 4);
+}
+
+Hint hintOfSink(ImageFilter const& sink) {
+    void const* const pData = sink.imageOutput()->data();
+    if (sink.getOutputTargetPlatform() == ORVO_TARGET_GL) {
+        auto const* const imGPU = static_cast<ImageGPU const*>(pData);
+        ORVO_CHECK(imGPU != nullptr, "imGPU != NULL");
+        return hintOf(imGPU->pixelFormat());
+    }
+    return hintOf(static_cast<ImageCPU const*>(pData)->pixelFormat());
+}
+
+/// Reads the current context's errors until there are none; whether there was one.
+bool drainErrors() {
+    // A context that is lost answers with an error for ever.
+    constexpr int nMaximumErrors = 64;
+    bool const bError = glGetError() != GL_NO_ERROR;
+    for (int i = 0; bError && i < nMaximumErrors && glGetError() != GL_NO_ERROR; ++i) {
+    }
+    return bError;
+}
+
+void sweepErrors() {
+    if (drainErrors()) {
+        throw OGL::ExceptionOGL(__FILE__, __LINE__, "Processing failure due to OpenGL error", GL_NO_ERROR);
+    }
+}
+
+/// What the preparation of a frame changes in the current context, put back at the end of a scope.
+class FrameState {
+public:
+    FrameState() : nUnit_(OGL::TextureState::activeTextureUnit()) {
+        OGL::TextureState::setActiveTextureUnit(0);
+        bEnabled2D_ = glIsEnabled(GL_TEXTURE_2D) == GL_TRUE;
+        OGL::TextureState::setActiveTextureUnit(nUnit_);
+    }
+    ~FrameState() {
+        try {
+            OGL::TextureUnit const& unit = OGL::TextureUnit::Unit(0);
+            if (bEnabled2D_) {
+                unit.enable2D();
+            } else {
+                unit.disable2D();
+            }
+            OGL::TextureState::setActiveTextureUnit(nUnit_);
+        } catch (...) { // The context went away during the frame, and its state with it.
+        }
+    }
+    FrameState(FrameState const&) = delete;
+    FrameState& operator=(FrameState const&) = delete;
+
+private:
+    unsigned nUnit_;
+    bool bEnabled2D_;
+};
+
 } // namespace
 
-ImageFlowController::ImageFlowController() : pVisitor_(nullptr) {}
+ImageFlowController::ImageFlowController()
+    : pVisitor_(nullptr), pContextGPU_(nullptr), pFramebuffer_(nullptr) {}
 
-ImageFlowController::~ImageFlowController() { cancelAndJoin(); }
+ImageFlowController::~ImageFlowController() {
+    cancelAndJoin();
+    if (pContextGPU_ == nullptr || pFramebuffer_ == nullptr) {
+        return;
+    }
+    OGL::ScopedContextWrapper const wrapper;
+    try {
+        pContextGPU_->makeCurrent();
+    } catch (...) { // The framebuffer then leaves its name to the context's end.
+    }
+    ORVODeleter<OGL::Framebuffer>{}(pFramebuffer_);
+}
+
+void ImageFlowController::setContextGPU(OGL::Context const& context) {
+    OGL::ScopedContextWrapper const wrapper;
+    context.makeCurrent();
+    auto* const pFramebuffer = ORVO_NEW OGL::Framebuffer();
+    ORVODeleter<OGL::Framebuffer>{}(pFramebuffer_);
+    pFramebuffer_ = pFramebuffer;
+    pContextGPU_ = &context;
+}
+
+OGL::Context const* ImageFlowController::contextGPU() const { return pContextGPU_; }
+
+OGL::Framebuffer* ImageFlowController::framebuffer() { return pFramebuffer_; }
+
+OGL::Framebuffer const* ImageFlowController::framebuffer() const { return pFramebuffer_; }
+
+void ImageFlowController::prepareOGLForProcess() {
+    if (pContextGPU_ == nullptr) {
+        return;
+    }
+    pContextGPU_->makeCurrent();
+    OGL::TextureState::setActiveTextureUnit(0);
+    OGL::TextureUnit::Unit(0).enable2D();
+}
 
 void ImageFlowController::process() {
-    // The running frame reads what is set here.
+    // The running frame reads what is set here, and may hold the context.
     joinFrame();
-    setNodeImageDescriptorInfo(false);
-    Controller::process();
+    OGL::ScopedContextWrapper const wrapper;
+    if (pContextGPU_ == nullptr) {
+        setNodeImageDescriptorInfo(false);
+        Controller::process();
+        return;
+    }
+    pContextGPU_->makeCurrent();
+    FrameState const state;
+    prepareOGLForProcess();
+    sweepErrors();
+    try {
+        setNodeImageDescriptorInfo(false);
+        Controller::process();
+    } catch (...) {
+        // What it left pending would fail the next frame.
+        drainErrors();
+        throw;
+    }
+    sweepErrors();
 }
 
 void ImageFlowController::processAsync() {
     joinFrame();
     setNodeImageDescriptorInfo(false);
     Controller::processAsync();
+}
+
+void ImageFlowController::processFrameFunction() {
+    {
+        // Gone before the completion, whose callback may launch the next frame on another thread.
+        OGL::ScopedContextWrapper const wrapper;
+        if (pContextGPU_ == nullptr) {
+            pullFrame();
+        } else {
+            pContextGPU_->makeCurrent();
+            FrameState const state;
+            prepareOGLForProcess();
+            if (!pullFrame()) {
+                // The exception tells more than the error, which wait() would report in its place.
+                drainErrors();
+            }
+        }
+    }
+    notifyOfCompletion();
+}
+
+bool ImageFlowController::wait(double timeout, double interval) {
+    OGL::ScopedContextWrapper const wrapper;
+    if (!Controller::wait(timeout, interval)) {
+        // The frame still holds the context.
+        return false;
+    }
+    if (pContextGPU_ != nullptr) {
+        pContextGPU_->makeCurrent();
+        sweepErrors();
+    }
+    return true;
+}
+
+void ImageFlowController::sleep(double seconds) {
+    OGL::ScopedContextWrapper const wrapper;
+    Controller::sleep(seconds);
 }
 
 void ImageFlowController::setImageSink(ImageFilter& sink) { setSinkNode(&sink); }
@@ -251,9 +413,7 @@ void ImageFlowController::setNodeImageDescriptorInfo(bool fromSink) {
     for (ImageFilter* iff : filtersProducersFirst()) {
         ORVO_CHECK(iff != nullptr, "iff!=0");
         ORVO_CHECK(bSinkHasData, "(pSink->imageOutput()->hasData()) == true");
-        ORVO_CHECK(pSink->getOutputTargetPlatform() != ORVO_TARGET_GL,
-                   "Not implemented: ImageGPU Pixel format not supported");
-        iff->computeImageDescriptorInfo(hintOf(static_cast<ImageCPU const*>(pOutput->data())->pixelFormat()));
+        iff->computeImageDescriptorInfo(hintOfSink(*pSink));
     }
 }
 

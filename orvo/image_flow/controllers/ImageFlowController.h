@@ -8,6 +8,11 @@
 
 namespace ORVO {
 
+namespace OGL {
+class Context;
+class Framebuffer;
+} // namespace OGL
+
 class ImageFilter;
 class Visitor;
 
@@ -17,19 +22,52 @@ class Visitor;
 /// sources, then each node's compute region), `setNodeImageDescriptorInfo(true)` where the sink's output is
 /// bound, `setDirtyState`, then `process` or `processAsync`.
 ///
+/// Graphs with nodes of the GPU run in an OpenGL context, which `setContextGPU` names: it is current on the
+/// thread of a frame for the length of the frame, with texture unit 0 active and its 2D texturing enabled.
+/// Afterwards what was current before is current again, and unit and enable are as they were. Without a
+/// context a frame makes no OpenGL call.
+///
 /// All walks keep their stack on the heap and are linear in nodes and connections, so graphs may be of any
 /// depth. Failures are `InternalException`s with the stated texts.
 ///
-/// Threads: walks, wiring and `process` by one thread at a time, between frames.
+/// Threads: walks, wiring and `process` by one thread at a time, between frames. While an asynchronous frame
+/// runs, its context is current on the frame's thread and must be on no other; it is released before the
+/// completion callback.
 class ORVO_API ImageFlowController : public DataFlow::Controller {
 public:
     ImageFlowController();
     ~ImageFlowController() override;
 
-    /// `setNodeImageDescriptorInfo(false)`, then a synchronous frame.
+    /// `setNodeImageDescriptorInfo(false)`, then a synchronous frame. Throws `OGL::ExceptionOGL` "Processing
+    /// failure due to OpenGL error" (with the code 0) for an OpenGL error that is pending before the frame,
+    /// which then is not run, or after it. Whatever is thrown, no error is pending afterwards.
     void process() override;
     /// `setNodeImageDescriptorInfo(false)`, then an asynchronous frame.
     void processAsync() override;
+    /// As the base's. If that collected the frame, throws `OGL::ExceptionOGL` "Processing failure due to
+    /// OpenGL error" (with the code 0) for an OpenGL error that the frame left behind, which is pending no
+    /// longer then.
+    bool wait(double timeout, double interval) override;
+    /// As the base's; what is current on the thread stays so.
+    void sleep(double seconds) override;
+    /// The base's in the context. A context that cannot be made current is the frame's failure.
+    void processFrameFunction() override;
+
+    /// \name The OpenGL context
+    /// @{
+
+    /// Names the context that frames run in, which stays the caller's and must outlive the controller, and
+    /// makes a framebuffer in it in place of the former one. What is current stays so. Between frames. Throws
+    /// `OGL::ExceptionOGL` where the context cannot be made current or gives no framebuffer; the controller
+    /// is as it was then.
+    void setContextGPU(OGL::Context const& context);
+    /// The context; null before `setContextGPU`.
+    OGL::Context const* contextGPU() const;
+    /// The framebuffer that the nodes of the GPU share, which stays the controller's; null before
+    /// `setContextGPU`. A node binds it, attaches its image, and takes both back at its end.
+    OGL::Framebuffer* framebuffer();
+    OGL::Framebuffer const* framebuffer() const;
+    /// @}
 
     /// Makes `sink` the node that walks and frames start from; it stays the caller's.
     void setImageSink(ImageFilter& sink);
@@ -70,12 +108,15 @@ public:
     /// format from its first input's image.
     ///
     /// Throws "Enforce pSink != NULL" without a sink, "iff!=0" where a node is no image node,
-    /// "(pSink->imageOutput()->hasData()) == true" where the sink's output holds no image, and "Not
-    /// implemented: ImageCPU Pixel format not supported" for BGR8, BGRA8, half and undefined formats of that
-    /// image.
+    /// "(pSink->imageOutput()->hasData()) == true" where the sink's output holds no image, "Not implemented:
+    /// ImageCPU Pixel format not supported" for BGR8, BGRA8, half and undefined formats of that image, and
+    /// "Not implemented: ImageGPU Pixel format not supported" for the undefined one.
     void setNodeImageDescriptorInfo(bool fromSink);
 
 protected:
+    /// If there is a context: makes it current, with texture unit 0 active and its 2D texturing enabled.
+    /// Throws `OGL::ExceptionOGL`.
+    void prepareOGLForProcess();
     /// The depth-first walk from one node, with the visitor and the colours as they stand.
     void depthFirstVisit(DataFlow::Node* node);
 
@@ -85,6 +126,8 @@ private:
     std::vector<ImageFilter*> filtersProducersFirst();
 
     Visitor* pVisitor_;
+    OGL::Context const* pContextGPU_;
+    OGL::Framebuffer* pFramebuffer_;
 };
 
 } // namespace ORVO

@@ -8,8 +8,12 @@
 #include "orvo/data_flow/parameters/Parameter.h"
 #include "orvo/image_runtime/images/ImageCPU.h"
 
-/// The connectors of host-memory images and the parameters of their formats. They are instantiated once, in
-/// the library.
+namespace ORVO {
+class ImageGPU;
+}
+
+/// The connectors of images and the parameters of host-memory formats. They are instantiated once, in the
+/// library. Those who use connectors of `ImageGPU` include its header themselves.
 namespace ORVO::DataFlow {
 
 extern template class ORVO_API ConstDataPointer<ImageCPU>;
@@ -19,6 +23,14 @@ extern template class ORVO_API Output<ImageCPU>;
 extern template class ORVO_API InputTemplate<ImageCPU>;
 extern template class ORVO_API ConstInput<ImageCPU>;
 extern template class ORVO_API Input<ImageCPU>;
+
+extern template class ORVO_API ConstDataPointer<ImageGPU>;
+extern template class ORVO_API OutputTemplate<ImageGPU>;
+extern template class ORVO_API ConstOutput<ImageGPU>;
+extern template class ORVO_API Output<ImageGPU>;
+extern template class ORVO_API InputTemplate<ImageGPU>;
+extern template class ORVO_API ConstInput<ImageGPU>;
+extern template class ORVO_API Input<ImageGPU>;
 
 } // namespace ORVO::DataFlow
 

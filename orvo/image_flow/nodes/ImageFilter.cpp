@@ -5,6 +5,7 @@
 #include "orvo/core/utility/SharedPtr.h"
 #include "orvo/image_flow/controllers/ImageFlowController.h"
 #include "orvo/image_runtime/BlankSIMDOptimizedImageCPU.h"
+#include "orvo/image_runtime/images/ImageGPU.h"
 
 #include <algorithm>
 #include <cstdint>
@@ -20,16 +21,38 @@ using DataFlow::InputConnector;
 using DataFlow::OutputConnector;
 
 using ImageOutput = DataFlow::OutputTemplate<ImageCPU>;
+using ImageOutputGPU = DataFlow::OutputTemplate<ImageGPU>;
 
 bool hasPixels(PositionExtentInPixelSpace const& region) {
     return region.extent().isDefined() && region.extent().width() > 0 && region.extent().height() > 0;
 }
 
 /// The pixels of the image that its storage has room for.
-PositionExtentInPixelSpace storedRegion(ImageCPU const& image) {
+PositionExtentInPixelSpace storedRegion(ImageBase const& image) {
     ExtentInPixelSpace const capacity = image.capacityExtent();
     return {image.position(), ExtentInPixelSpace(std::min(image.extent().width(), capacity.width()),
                                                  std::min(image.extent().height(), capacity.height()))};
+}
+
+/// The image under the address that a connector of its platform keeps.
+void const* dataOf(ImageBase* pImage, TargetPlatform target) {
+    if (target == ORVO_TARGET_CPU) {
+        return static_cast<ImageCPU*>(pImage);
+    }
+    return target == ORVO_TARGET_GL ? static_cast<ImageGPU*>(pImage) : nullptr;
+}
+
+/// A further output of a node on the platform; null where there is no class for it.
+OutputConnector* newOutput(TargetPlatform target, std::string const& name, DataFlow::Node* pNode) {
+    if (target == ORVO_TARGET_CPU) {
+        return ORVO_NEW DataFlow::ConstOutput<ImageCPU>(name, pNode);
+    }
+    return target == ORVO_TARGET_GL ? ORVO_NEW DataFlow::ConstOutput<ImageGPU>(name, pNode) : nullptr;
+}
+
+template <typename Output>
+void share(OutputConnector& from, OutputConnector& to) {
+    static_cast<Output&>(to).setData(static_cast<Output&>(from).dataPointer());
 }
 
 } // namespace
@@ -99,7 +122,7 @@ void ImageFilter::setBoundOutputImage(ImageBase* image) {
     ImageBase* const p = image;
     ORVO_CHECK(p == nullptr || outputTarget_ == p->targetPlatform(), "outputTarget_ == p->targetPlatform()");
     // The connectors keep the address of the typed object.
-    void const* const pData = outputTarget_ == ORVO_TARGET_CPU ? static_cast<ImageCPU*>(p) : nullptr;
+    void const* const pData = dataOf(p, outputTarget_);
     // An image taken earlier may be the one that was bound until now.
     spOutputImage_.reset();
     bPreparedForRender_ = false;
@@ -137,6 +160,17 @@ bool ImageFilter::takeBoundOutputImage() {
     return true;
 }
 
+ImageGPU* ImageFilter::boundOutputImageGPU() const {
+    if (pImageOutput_ == nullptr || !pImageOutput_->bound()) {
+        return nullptr;
+    }
+    auto* const pBoundImage = const_cast<ImageGPU*>(static_cast<ImageGPU const*>(pImageOutput_->data()));
+    ORVO_ENFORCE(pBoundImage);
+    ORVO_CHECK(isInside(oOutputRegionInPixels_, storedRegion(*pBoundImage)),
+               "Compute region lies outside the bound output image");
+    return pBoundImage;
+}
+
 bool ImageFilter::isInside(PositionExtentInPixelSpace const& inner, PositionExtentInPixelSpace const& outer) {
     if (!hasPixels(inner)) {
         return true;
@@ -158,6 +192,9 @@ bool ImageFilter::hasOutputImage() const {
 
 void ImageFilter::allocateOutputImage() {
     updateOutputRegionInPixels();
+    if (outputTarget_ == ORVO_TARGET_GL) {
+        boundOutputImageGPU();
+    }
     if (outputTarget_ != ORVO_TARGET_CPU || pImageOutput_ == nullptr || takeBoundOutputImage()) {
         return;
     }
@@ -235,10 +272,14 @@ void ImageFilter::internalProcess() {
 
 void ImageFilter::postProcess() {
     for (OutputConnector* pClone : aClonedImageOutputs_) {
-        ORVO_CHECK(outputTarget_ == ORVO_TARGET_CPU, "false");
-        if (!pClone->bound()) {
-            static_cast<ImageOutput*>(pClone)->setData(
-                static_cast<ImageOutput*>(pImageOutput_)->dataPointer());
+        ORVO_CHECK(outputTarget_ == ORVO_TARGET_CPU || outputTarget_ == ORVO_TARGET_GL, "false");
+        if (pClone->bound()) {
+            continue;
+        }
+        if (outputTarget_ == ORVO_TARGET_CPU) {
+            share<ImageOutput>(*pImageOutput_, *pClone);
+        } else {
+            share<ImageOutputGPU>(*pImageOutput_, *pClone);
         }
     }
     Node::postProcess();
@@ -288,12 +329,12 @@ OutputConnector const* ImageFilter::clonedImageOutput(std::size_t iImageOutput) 
 
 OutputConnector* ImageFilter::cloneImageOutput() {
     ORVO_ENFORCE(pImageOutput_);
-    if (outputTarget_ != ORVO_TARGET_CPU) {
-        return nullptr;
-    }
     aClonedImageOutputs_.reserve(aClonedImageOutputs_.size() + 1);
     std::unique_ptr<OutputConnector, ORVODeleter<OutputConnector>> upClone(
-        ORVO_NEW DataFlow::ConstOutput<ImageCPU>(pImageOutput_->name(), this));
+        newOutput(outputTarget_, pImageOutput_->name(), this));
+    if (upClone == nullptr) {
+        return nullptr;
+    }
     if (pImageOutput_->bound()) {
         upClone->setBoundData(pImageOutput_->data());
     }

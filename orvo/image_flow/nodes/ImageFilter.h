@@ -22,6 +22,7 @@ namespace ORVO {
 
 class ImageBase;
 class ImageFlowController;
+class ImageGPU;
 
 /// The node of the image layer: every image source, sink and algorithm derives from it. It adds to
 /// `DataFlow::Node` the geometry of a frame, the platforms of input and output, the output image in the
@@ -132,6 +133,8 @@ public:
     /// format of input 0's image or of hint and channel count. 32-bit float images are in the SIMD-optimised
     /// layout. New pixels are not cleared. A node without an image output allocates nothing.
     ///
+    /// On the GPU the subclass makes the image.
+    ///
     /// Throws "Compute region lies outside the bound output image" (nothing is written then), "Not
     /// implemented: Data type not supported in ImageFilter::allocateOutputImage()" for hints above 3 and "Not
     /// implemented: pixelFormat not supported in ImageFilter::allocateOutputImage()" for channel counts
@@ -165,8 +168,8 @@ public:
     DataFlow::OutputConnector* clonedImageOutput(std::size_t iImageOutput);
     DataFlow::OutputConnector const* clonedImageOutput(std::size_t iImageOutput) const;
     /// A further output, owned by the node, that bears the true output's name, shares its object after each
-    /// run and is bound to the same image if that is bound. Null, and nothing happens, where the output does
-    /// not live on the CPU. Throws "Enforce pImageOutput_ != NULL".
+    /// run and is bound to the same image if that is bound. Null, and nothing happens, where the output lives
+    /// neither on the CPU nor on the GPU. Throws "Enforce pImageOutput_ != NULL".
     DataFlow::OutputConnector* cloneImageOutput();
     /// @}
 
@@ -212,7 +215,8 @@ public:
 protected:
     /// Adds an input that carries images; it stays the subclass's.
     void addImageInput(DataFlow::InputConnector* input);
-    /// Sets the true image output; it stays the subclass's. On the CPU it is an `OutputTemplate<ImageCPU>`.
+    /// Sets the true image output; it stays the subclass's. On the CPU it is an `OutputTemplate<ImageCPU>`,
+    /// on the GPU an `OutputTemplate<ImageGPU>`.
     void setImageOutput(DataFlow::OutputConnector* output);
     bool preparedForRender() const;
     std::shared_ptr<InputOutputImagePixelExtentSet> const& spPixelExtentSet() const;
@@ -230,6 +234,10 @@ protected:
     /// region lies outside the bound output image" and "Enforce pBoundImage != NULL", and leaves the node
     /// without an image then.
     bool takeBoundOutputImage();
+    /// The image that is bound on the image output of a node of the GPU; null if the output is not bound.
+    /// `oOutputRegionInPixels_` must be up to date. Throws "Compute region lies outside the bound output
+    /// image" and "Enforce pBoundImage != NULL".
+    ImageGPU* boundOutputImageGPU() const;
     /// Whether `spOutputImage_` holds an image that covers `oOutputRegionInPixels_`.
     bool hasOutputImage() const;
 

@@ -1,4 +1,5 @@
 #include "orvo/image_flow/nodes/ImageFilter.h"
+#include "orvo/image_runtime/images/ImageGPU.h"
 
 namespace ORVO::DataFlow {
 
@@ -9,6 +10,14 @@ template class Output<ImageCPU>;
 template class InputTemplate<ImageCPU>;
 template class ConstInput<ImageCPU>;
 template class Input<ImageCPU>;
+
+template class ConstDataPointer<ImageGPU>;
+template class OutputTemplate<ImageGPU>;
+template class ConstOutput<ImageGPU>;
+template class Output<ImageGPU>;
+template class InputTemplate<ImageGPU>;
+template class ConstInput<ImageGPU>;
+template class Input<ImageGPU>;
 
 } // namespace ORVO::DataFlow
 
