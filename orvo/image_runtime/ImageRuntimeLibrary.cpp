@@ -2,11 +2,20 @@
 
 #include "orvo/core/Check.h"
 #include "orvo/core/CoreLibrary.h"
-#include "orvo/core/exceptions/ResourceException.h"
+#include "orvo/core/memory/TrackedNew.h"
+#include "orvo/image_runtime/LateReturns.h"
+#include "orvo/image_runtime/ShaderManagerOGL.h"
+#include "orvo/image_runtime/TexturePool.h"
+#include "orvo/ogl/Context.h"
+#include "orvo/ogl/ExtensionManager.h"
+#include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/OGLLibrary.h"
+#include "orvo/ogl/ScopedContextWrapper.h"
 
 #include <algorithm>
 #include <memory>
+#include <sstream>
+#include <utility>
 
 namespace ORVO::ImageRuntime {
 
@@ -21,18 +30,48 @@ void enforceLowerLayers() {
     ORVO_CHECK(OGL::Library::isInitialized());
 }
 
-/// One record of the list. Pools and shader managers belong to contexts, so that a null context has neither.
-Library::DeviceObject createDeviceObject(OGL::Context const* pContext) {
-    if (pContext) {
-        throw ResourceException(__FILE__, __LINE__, "OpenGL contexts are not supported by this version.");
-    }
-    return Library::DeviceObject{nullptr, nullptr, nullptr};
+[[noreturn]] void failForeignContext() {
+    std::ostringstream text;
+    text << "Current context of value " << OGL::NativeContext::currentHandle()
+         << " does not share with any context used to initialize image_runtime";
+    ORVO_FAIL(text.str());
 }
 
 } // namespace
 
+void Library::fill(DeviceObject& deviceObject, VideoMemory::Configuration const& configuration) {
+    if (!deviceObject.pContext_)
+        return;
+    deviceObject.pContext_->makeCurrent();
+    if (OGL::ExtensionManager::Instance()->supportsNonPowerOfTwoTextures()) {
+        TexturePool::Configuration pool;
+        pool.setVideoMemoryListener(configuration.videoMemoryListener());
+        pool.setMaximumFreelistSize(configuration.maximumTexturePoolSize());
+        pool.setContext(deviceObject.pContext_);
+        pool.setProhibitReuseLargerTextures(configuration.prohibitReuseLargerTextures());
+        deviceObject.pTPool_ = ORVO_NEW TexturePool(pool);
+    }
+    deviceObject.pSMOGL_ = ORVO_NEW ShaderManagerOGL;
+}
+
+void Library::destroy(std::vector<DeviceObject>* pvDeviceObject) noexcept {
+    for (DeviceObject const& deviceObject : *pvDeviceObject) {
+        try {
+            if (deviceObject.pContext_)
+                deviceObject.pContext_->makeCurrent();
+        } catch (...) {
+            // The host has destroyed the context, and what was made in it is gone with it.
+        }
+        trackedDelete(deviceObject.pTPool_);
+        trackedDelete(deviceObject.pSMOGL_);
+    }
+    delete pvDeviceObject;
+    LateReturns::clear();
+}
+
 void Library::initialize(std::vector<OGL::Context const*> const& vpContext,
-                         VideoMemory::Configuration const&) {
+                         VideoMemory::Configuration const& configuration) {
+    OGL::ScopedContextWrapper const restore;
     enforceLowerLayers();
     ORVO_CHECK(!vpContext.empty(), "vpContext.size()");
     ORVO_CHECK(!pvDeviceObject_);
@@ -41,9 +80,13 @@ void Library::initialize(std::vector<OGL::Context const*> const& vpContext,
                    std::find(vpContext.begin(), vpContext.end(), nullptr) == vpContext.end(),
                "vpContext.size() == 1");
 
-    auto pvDeviceObject = std::make_unique<std::vector<DeviceObject>>();
+    // What was made for the first contexts goes again if a later one fails.
+    std::unique_ptr<std::vector<DeviceObject>, void (*)(std::vector<DeviceObject>*)> pvDeviceObject(
+        new std::vector<DeviceObject>, [](std::vector<DeviceObject>* p) { destroy(p); });
+    pvDeviceObject->reserve(vpContext.size());
     for (OGL::Context const* pContext : vpContext) {
-        pvDeviceObject->push_back(createDeviceObject(pContext));
+        pvDeviceObject->push_back(DeviceObject{pContext, nullptr, nullptr});
+        fill(pvDeviceObject->back(), configuration);
     }
     pvDeviceObject_ = pvDeviceObject.release();
 }
@@ -53,9 +96,10 @@ void Library::initialize(OGL::Context const* pContext, VideoMemory::Configuratio
 }
 
 void Library::terminate() {
+    OGL::ScopedContextWrapper const restore;
     enforceLowerLayers();
-    delete pvDeviceObject_;
-    pvDeviceObject_ = nullptr;
+    if (pvDeviceObject_)
+        destroy(std::exchange(pvDeviceObject_, nullptr));
 }
 
 bool Library::isInitialized() { return pvDeviceObject_ != nullptr; }
@@ -72,13 +116,24 @@ std::vector<OGL::Context const*> Library::initializationContextList() {
 
 TexturePool* Library::texturePool() {
     ORVO_ENFORCE(pvDeviceObject_);
-    // A record without a pool ends the search, and without a context there is no other record.
-    return pvDeviceObject_->front().pTPool_;
+    for (DeviceObject const& deviceObject : *pvDeviceObject_) {
+        if (!deviceObject.pTPool_)
+            return nullptr;
+        if (deviceObject.pContext_->isSharingWithCurrentContext())
+            return deviceObject.pTPool_;
+    }
+    failForeignContext();
 }
 
 ShaderManagerOGL* Library::shaderManager() {
     ORVO_ENFORCE(pvDeviceObject_);
-    return pvDeviceObject_->front().pSMOGL_;
+    for (DeviceObject const& deviceObject : *pvDeviceObject_) {
+        if (!deviceObject.pSMOGL_)
+            return nullptr;
+        if (deviceObject.pContext_->isSharingWithCurrentContext())
+            return deviceObject.pSMOGL_;
+    }
+    failForeignContext();
 }
 
 AutoInitializer::AutoInitializer(std::vector<OGL::Context const*> const& vpContext,

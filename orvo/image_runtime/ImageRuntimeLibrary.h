@@ -16,13 +16,15 @@ class ShaderManagerOGL;
 namespace ImageRuntime {
 
 /// Static entry of the image runtime: started once a process with the OpenGL contexts that the host will work
-/// in, a single null context meaning that there are none and all work is done on the CPU.
+/// in, of which each gets a texture pool and a shader manager; a single null context means that there are
+/// none and all work is done on the CPU.
 ///
 /// Start Core::Library and OGL::Library first:
 ///
 ///     Core::AutoInitializer core;
 ///     OGL::AutoInitializer ogl;
-///     ImageRuntime::AutoInitializer runtime(nullptr, VideoMemory::Configuration());
+///     std::unique_ptr<OGL::Context> pContext = OGL::Context::adoptCurrent();
+///     ImageRuntime::AutoInitializer runtime(pContext.get(), VideoMemory::Configuration());
 ///
 /// Threads: initialize() and terminate() while nothing else uses the library; the queries from any thread.
 class ORVO_API Library {
@@ -30,24 +32,29 @@ public:
     /// What the library holds for one context. All three are null for the single null context.
     struct DeviceObject {
         OGL::Context const* pContext_; ///< not owned; outlives the library's use.
-        TexturePool* pTPool_;          ///< owned by the library.
+        TexturePool* pTPool_;          ///< owned by the library; null if textures have to be powers of two.
         ShaderManagerOGL* pSMOGL_;     ///< owned by the library.
     };
 
-    /// Starts the library.
-    /// @param vpContext the contexts, at least one; a null context only as the single one. Not owned.
-    /// @param configuration what the texture pools are made with.
+    /// Starts the library: makes each context current in turn for its pool and its manager. The context that
+    /// is current stays so.
+    /// @param vpContext the contexts, at least one; a null context only as the single one. Not owned; they
+    ///        outlive the library's use.
+    /// @param configuration what the texture pools are made with. Its listener outlives the library's use.
     /// @throws InternalException, in this order, "Core::Library::isInitialized()",
     ///         "OGL::Library::isInitialized()", "vpContext.size()" (an empty list), "!pvDeviceObject_"
-    ///         (started already), "vpContext.size() == 1" (a null context beside others).
-    /// @throws ResourceException "OpenGL contexts are not supported by this version." for any context that is
-    ///         not null. Whatever is thrown, the library stays as it was.
+    ///         (started already), "vpContext.size() == 1" (a null context beside others); then as a context's
+    ///         makeCurrent() throws, ExceptionOGL for what the driver refuses, and "Enforce gc != NULL" for a
+    ///         context that, made current, leaves none current. Whatever is thrown, the library stays as it
+    ///         was.
     static void initialize(std::vector<OGL::Context const*> const& vpContext,
                            VideoMemory::Configuration const& configuration);
     /// The same with a list of one.
     static void initialize(OGL::Context const* pContext, VideoMemory::Configuration const& configuration);
 
-    /// Stops the library; does nothing more if it is not started.
+    /// Stops the library: destroys the pools and managers, each with its context current. A context that the
+    /// host has destroyed before is passed over. The context that is current stays so. Does nothing more if
+    /// the library is not started.
     /// @throws InternalException "Core::Library::isInitialized()" or "OGL::Library::isInitialized()".
     static void terminate();
 
@@ -58,14 +65,20 @@ public:
     /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started.
     static std::vector<OGL::Context const*> initializationContextList();
 
-    /// The texture pool that serves the current context; null where there is none. Not for the caller to
+    /// The texture pool of the first context that shares with the current one; null where the library was
+    /// started without a context, and where the contexts up to that one have none. Not for the caller to
     /// delete.
-    /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started.
+    /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started, "Current
+    ///         context of value <handle> does not share with any context used to initialize image_runtime"
+    ///         (the handle is 0 where none is current).
     static TexturePool* texturePool();
 
-    /// The shader manager that serves the current context; null where there is none. Not for the caller to
+    /// The shader manager of the first context that shares with the current one; null where the library was
+    /// started without a context, and where the contexts up to that one have none. Not for the caller to
     /// delete.
-    /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started.
+    /// @throws InternalException "Enforce pvDeviceObject_ != NULL" if the library is not started, "Current
+    ///         context of value <handle> does not share with any context used to initialize image_runtime"
+    ///         (the handle is 0 where none is current).
     static ShaderManagerOGL* shaderManager();
 
     /// Kept for hosts that know them: the library neither reads nor writes them.
@@ -73,6 +86,9 @@ public:
     static bool bInterpretedIntrinsicsRegistered_;
 
 private:
+    static void fill(DeviceObject& deviceObject, VideoMemory::Configuration const& configuration);
+    static void destroy(std::vector<DeviceObject>* pvDeviceObject) noexcept;
+
     static std::vector<DeviceObject>* pvDeviceObject_;
 };
 

@@ -55,8 +55,13 @@ private:
 
     Entries::iterator findFree(unsigned sizeInBytes);
     Entries::iterator append(unsigned sizeInBytes);
-    void beginQuery(Entry& entry) noexcept;
+    /// Begins the query of an entry that is not yet in the queue, unless somebody else's is active. A failed
+    /// one throws ExceptionOGL and leaves the entry's buffer free.
+    void beginQuery(Entry& entry);
     void enforceBudget();
+    void remove(Entries::iterator entry) noexcept;
+    bool isQueueQuery(unsigned nQuery) const noexcept;
+    static bool isOfCurrentContext(Entry const& entry) noexcept;
 
     Entries oEntries_;
     std::size_t nPBOBytes_ = 0;

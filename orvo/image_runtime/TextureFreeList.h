@@ -29,57 +29,53 @@ public:
         }
     };
 
-    /// A texture with the bytes that it is counted with.
-    struct Entry {
-        TextureT* pTexture_;
-        std::size_t nBytes_;
-    };
-
-    bool empty() const noexcept { return oEntries_.empty(); }
-    std::size_t size() const noexcept { return oEntries_.size(); }
+    bool empty() const noexcept { return oNodes_.empty(); }
+    std::size_t size() const noexcept { return oNodes_.size(); }
 
     /// Puts a texture behind all others. Strong guarantee: if memory fails, the list is as it was.
-    void pushBack(Key const& key, Entry const& entry) {
-        oEntries_.push_back(Node{entry, {}});
-        auto const node = std::prev(oEntries_.end());
+    void pushBack(Key const& key, TextureT* pTexture) {
+        oNodes_.push_back(Node{pTexture, oIndex_.end()});
+        auto const node = std::prev(oNodes_.end());
         try {
-            // Equal keys stay in the order in which they came.
+            // Equal keys stay in the order in which they come.
             node->oPlace_ = oIndex_.emplace(key, node);
         } catch (...) {
-            oEntries_.pop_back();
+            oNodes_.pop_back();
             throw;
         }
     }
 
-    /// The oldest texture with this key, which stays in the list; null if there is none.
-    TextureT* firstMatch(Key const& key) const {
-        auto const place = oIndex_.find(key);
-        return place != oIndex_.end() ? oIndex_.lower_bound(key)->second->oEntry_.pTexture_ : nullptr;
+    /// Takes the oldest texture with this key out of the list, after the given code has seen it; if that
+    /// throws, the texture stays. Null if there is none.
+    template <typename Prepare>
+    TextureT* takeFirstMatch(Key const& key, Prepare const& prepare) {
+        auto const place = oIndex_.lower_bound(key);
+        if (place == oIndex_.end() || key < place->first)
+            return nullptr;
+        prepare(*place->second->pTexture_);
+        return take(place->second);
     }
 
-    /// Takes the oldest texture with this key out of the list, which must hold one.
-    Entry takeFirstMatch(Key const& key) noexcept { return take(oIndex_.lower_bound(key)->second); }
-
-    /// Takes the oldest texture out of the list, which must not be empty.
-    Entry takeFront() noexcept { return take(oEntries_.begin()); }
+    /// Takes the oldest texture out of the list; null if it is empty.
+    TextureT* takeFront() noexcept { return oNodes_.empty() ? nullptr : take(oNodes_.begin()); }
 
 private:
     struct Node;
     using Nodes = std::list<Node>;
     using Index = std::multimap<Key, typename Nodes::iterator>;
     struct Node {
-        Entry oEntry_;
+        TextureT* pTexture_;
         typename Index::iterator oPlace_;
     };
 
-    Entry take(typename Nodes::iterator node) noexcept {
-        Entry const entry = node->oEntry_;
+    TextureT* take(typename Nodes::iterator node) noexcept {
+        TextureT* const pTexture = node->pTexture_;
         oIndex_.erase(node->oPlace_);
-        oEntries_.erase(node);
-        return entry;
+        oNodes_.erase(node);
+        return pTexture;
     }
 
-    Nodes oEntries_;
+    Nodes oNodes_;
     Index oIndex_;
 };
 

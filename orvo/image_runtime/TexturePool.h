@@ -117,8 +117,8 @@ public:
     /// one that the driver has done with and that is less than 65 pixels larger each way, else a new one, its
     /// sizes rounded up to multiples of 64 and its rows to multiples of 32 bytes. Not told to the listener.
     /// @throws InternalException "pixelDataSize: Unknown type <name>" for a type that is neither bytes,
-    ///         shorts, halves nor floats, "No internal format has <channels> channels of type <name>";
-    ///         ParameterException "Texture size is too large"; ExceptionOGL.
+    ///         shorts, halves nor floats; ParameterException "No internal format fits the format and type"
+    ///         (as for two channels of halves), "Texture size is too large"; ExceptionOGL.
     OGL::TextureRECT* getClientStorageTextureRECTFromPool(unsigned width, unsigned height,
                                                           OGL::Texture::Format format,
                                                           OGL::Texture::Type type);
@@ -174,7 +174,32 @@ private:
 
     /// Makes the hidden context current. @throws InternalException "spContext_.get()"; ExceptionOGL.
     void prepareOpenGLContext();
+    /// Runs the code with the hidden context current, and makes the caller's current again.
+    template <typename Code>
+    void inHiddenContext(Code const& code);
+
+    std::size_t sizeToUse(unsigned nPixels, bool exact) const noexcept;
+    template <typename TextureT, typename Prepare, typename Make>
+    TextureT* get(TextureFreeList<TextureT>& oFreeList, typename TextureFreeList<TextureT>::Key const& key,
+                  Prepare const& prepare, Make const& make);
+    template <typename TextureT>
+    void put(TextureFreeList<TextureT>& oFreeList, TextureT* pTexture);
+    OGL::TextureRECT* makeClientStorageTexture(std::size_t nWidth, std::size_t nHeight,
+                                               OGL::Texture::InternalFormat format);
+
     void enforceMaximumPoolSize();
+    bool isOverBudget() const noexcept;
+    std::size_t evictionTarget() const noexcept;
+    /// The loop of eviction; the hidden context is current.
+    void evict();
+    /// Deletes the oldest texture of a list, if there is one; its bytes.
+    template <typename TextureT>
+    std::size_t deleteFront(TextureFreeList<TextureT>& oFreeList) noexcept;
+    void deleteFrontOfClientStorage() noexcept;
+    /// Deletes all textures of a list; their bytes.
+    template <typename TextureT>
+    std::size_t deleteAll(TextureFreeList<TextureT>& oFreeList) noexcept;
+    void deleteAllClientStorage() noexcept;
 
     TextureFreeList<OGL::Texture1D> oFreeList1D_;
     TextureFreeList<OGL::Texture2D> oFreeList2D_;

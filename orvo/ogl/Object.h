@@ -32,6 +32,9 @@ public:
     virtual unsigned getBoundID() const = 0;
     /// Whether this object is bound to its target now.
     bool isBound() const;
+    /// Whether a context of the share group in which the object was made is current: only then does its name
+    /// mean this object, and is it deleted with it. False if none is current.
+    bool isShareGroupCurrent() const noexcept;
 
 protected:
     explicit Object(unsigned nTarget) noexcept;
@@ -39,8 +42,6 @@ protected:
     void setObjectID(unsigned nName) noexcept { nName_ = nName; }
     /// Remembers the current context's share group. Throws ExceptionOGL.
     void joinShareGroup();
-    /// Whether a context of that group is current: only then is the name to be deleted.
-    bool isShareGroupCurrent() const noexcept;
 
 private:
     unsigned nTarget_;
