@@ -1,7 +1,9 @@
 #include "orvo/image_runtime/images/ImageGPU.h"
 
 #include "orvo/core/Check.h"
+#include "orvo/core/memory/TrackedNew.h"
 #include "orvo/image_runtime/GLStateUtils.h"
+#include "orvo/image_runtime/ImageRuntimeLibrary.h"
 #include "orvo/image_runtime/TexturePool.h"
 #include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/Texture2D.h"
@@ -129,13 +131,25 @@ ImageGPU::~ImageGPU() {
 }
 
 void ImageGPU::returnTexture() noexcept {
+    TexturePool* pPool = nullptr;
     try {
-        TexturePool& pool = requiredPool();
+        pPool = TexturePool::Instance();
         bindDefault();
-        pool.returnTexture2DToPool(pTexture_);
     } catch (...) {
         // No context is current, or one that no pool serves: a destructor lets nothing out.
+    }
+    if (!ImageRuntime::Library::isInitialized()) {
+        trackedDelete(pTexture_);
+        return;
+    }
+    if (!pPool) {
         TexturePool::returnTexture2DLater(pTexture_);
+        return;
+    }
+    try {
+        pPool->returnTexture2DToPool(pTexture_);
+    } catch (...) {
+        // The texture is the pool's already, which failed to keep to its budget.
     }
 }
 

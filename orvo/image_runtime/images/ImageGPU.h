@@ -172,7 +172,7 @@ public:
     // ParameterException "The texture unit does not exist".
 
     void bind_DEPRECATED_2_0(int unit) const;
-    /// @throws ExceptionOGL for a unit that serves shaders alone.
+    /// Nothing is switched on a unit that serves shaders alone.
     void enable_DEPRECATED_2_0(int unit) const;
     /// @throws InternalException "Texture target is not enabled..can't disable texture" if it is not enabled
     ///         on the unit; not asked for a unit of -1.

@@ -21,6 +21,12 @@ void activate(int unit) {
     OGL::TextureState::setActiveTextureUnit(static_cast<unsigned>(unit));
 }
 
+/// Whether the active unit has a switch for texturing: those beyond fixed function serve shaders alone.
+bool canSwitch() {
+    return static_cast<int>(OGL::TextureState::activeTextureUnit()) <
+           OGL::Internal::integerState(GL_MAX_TEXTURE_UNITS);
+}
+
 } // namespace
 
 void ImageGPU::bind_DEPRECATED_2_0(int unit) const {
@@ -32,22 +38,21 @@ void ImageGPU::bind_DEPRECATED_2_0(int unit) const {
 void ImageGPU::enable_DEPRECATED_2_0(int unit) const {
     OGL::Texture2D const& texture = requiredTexture();
     activate(unit);
-    glEnable(texture.target());
-    ORVO_OGL_THROW_ON_ERROR("The texture could not be enabled");
+    if (canSwitch())
+        glEnable(texture.target());
 }
 
 void ImageGPU::disable_DEPRECATED_2_0(int unit) const {
     OGL::Texture2D const& texture = requiredTexture();
     if (unit == -1) {
         activate(unit);
-        glDisable(texture.target());
+        if (canSwitch())
+            glDisable(texture.target());
         return;
     }
     ScopedActiveTextureUnitRestore const restore;
     activate(unit);
-    // Units beyond those of fixed function serve shaders alone: to ask them is an error.
-    bool const bFixedFunction = unit < OGL::Internal::integerState(GL_MAX_TEXTURE_UNITS);
-    ORVO_CHECK(bFixedFunction && glIsEnabled(texture.target()) == GL_TRUE,
+    ORVO_CHECK(canSwitch() && glIsEnabled(texture.target()) == GL_TRUE,
                "Texture target is not enabled..can't disable texture");
     glDisable(texture.target());
 }
