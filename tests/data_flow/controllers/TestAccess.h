@@ -21,6 +21,14 @@ struct TestAccess {
 
     static void createLibrarian() { NodeLibrarian::Create(); }
     static void destroyLibrarian() { NodeLibrarian::Destroy(); }
+
+    struct DeleteLibrarian {
+        void operator()(NodeLibrarian* pLibrarian) const { delete pLibrarian; }
+    };
+    /// A librarian that is not the one of the process.
+    static std::unique_ptr<NodeLibrarian, DeleteLibrarian> makeLoneLibrarian() {
+        return std::unique_ptr<NodeLibrarian, DeleteLibrarian>(new NodeLibrarian);
+    }
 };
 
 } // namespace ORVO::DataFlow::internal

@@ -10,6 +10,7 @@
 #include "tests/data_flow/controllers/TestAccess.h"
 #include "tests/support/DataFlowLayers.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -93,6 +94,10 @@ NodeMetaData key(std::string const& name, std::uint32_t iVersion) {
 }
 
 } // namespace
+
+TEST(NodeFactorySlotsTest, CreatesThroughTheSlotAfterTheDestructor) {
+    EXPECT_EQ(2, slotOf(&NodeFactory::create));
+}
 
 // Creating nodes
 
@@ -260,6 +265,22 @@ TEST_F(NodeLibrarianTest, ClearAllFreesEverythingAndTheCatalogueWorksOn) {
     librarian.clearAll();
 }
 
+TEST_F(NodeLibrarianTest, ClearAllFreesTheFactoriesInTheOrderOfTheCatalogue) {
+    struct Logging : NamedFactory {
+        Logging(std::string const& sName, std::vector<std::string>& aEnded)
+            : NamedFactory(sName), sName_(sName), aEnded_(aEnded) {}
+        ~Logging() override { aEnded_.push_back(sName_); }
+        std::string sName_;
+        std::vector<std::string>& aEnded_;
+    };
+    std::vector<std::string> aEnded;
+    for (char const* const pName : {"z", "a", "m"}) {
+        librarian.add(ORVO_NEW Logging(pName, aEnded), ORVO_NEW NodeMetaData(pName, "s", "v", "", ""));
+    }
+    librarian.clearAll();
+    EXPECT_EQ((std::vector<std::string>{"a", "m", "z"}), aEnded);
+}
+
 // The singleton
 
 TEST_F(NodeLibrarianTest, SecondLibrarianIsRefused) {
@@ -279,6 +300,11 @@ TEST(NodeLibrarianLifeTest, ThereIsNoneBeforeCreateAndAfterDestroy) {
     TestAccess::destroyLibrarian();
     EXPECT_FALSE(NodeLibrarian::exists());
     ORVO_EXPECT_INTERNAL(NodeLibrarian::Instance(), "Enforce gpSingleton_ != NULL");
+}
+
+TEST(NodeLibrarianLifeTest, ClientIDsNeedTheLibrarianOfTheProcess) {
+    auto const pLone = TestAccess::makeLoneLibrarian();
+    ORVO_EXPECT_INTERNAL(pLone->createNodeByClientID("id", NODE_TARGET_CPU), "Enforce gpSingleton_ != NULL");
 }
 
 TEST(NodeLibrarianLifeTest, DestroyFreesWhatWasRegistered) {

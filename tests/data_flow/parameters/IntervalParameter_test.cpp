@@ -1,5 +1,6 @@
 #include "orvo/data_flow/parameters/IntervalParameter.h"
 
+#include "tests/data_flow/parameters/ParameterFlags.h"
 #include "tests/data_flow/parameters/ParameterSamples.h"
 #include "tests/support/Expect.h"
 
@@ -11,21 +12,9 @@
 namespace {
 
 using namespace ORVO::DataFlow;
+using ORVO::Test::expectAllFlags;
 using ORVO::Test::Samples;
-
-void setAllClean(ParameterBase& oParameter) {
-    oParameter.setClean();
-    oParameter.setCleanSimpleCaching();
-    oParameter.setCleanGlyphcast();
-}
-
-bool anyFlag(ParameterBase const& oParameter) {
-    return oParameter.isDirty() || oParameter.isDirtySimpleCaching() || oParameter.isDirtyGlyphcast();
-}
-
-bool allFlags(ParameterBase const& oParameter) {
-    return oParameter.isDirty() && oParameter.isDirtySimpleCaching() && oParameter.isDirtyGlyphcast();
-}
+using ORVO::Test::setAllClean;
 
 template <typename T>
 class IntervalParameterTest : public testing::Test {};
@@ -43,7 +32,7 @@ TYPED_TEST(IntervalParameterTest, HasBoundsBesideItsValue) {
     EXPECT_EQ("name", oParameter.name());
     EXPECT_EQ("text", oParameter.description());
     EXPECT_TRUE(oParameter.datatype() == typeid(T));
-    EXPECT_TRUE(allFlags(oParameter));
+    expectAllFlags(oParameter, true);
     IntervalParameter<T> const oShort(Samples<T>::first(), Samples<T>::second(), Samples<T>::first(), "name");
     EXPECT_EQ("", oShort.description());
     auto const spCreated = IntervalParameter<T>::create(Samples<T>::first(), Samples<T>::first(),
@@ -67,7 +56,7 @@ TYPED_TEST(IntervalParameterTest, ClonesItsBounds) {
     EXPECT_TRUE(oClone.upperBound() == Samples<T>::second());
     EXPECT_EQ("name", oClone.name());
     EXPECT_EQ("text", oClone.description());
-    EXPECT_TRUE(allFlags(oClone));
+    expectAllFlags(oClone, true);
     std::shared_ptr<ParameterBase> const spRenamed = oParameter.clone("other");
     EXPECT_EQ("other", spRenamed->name());
     EXPECT_TRUE(spRenamed->isInterval());
@@ -92,7 +81,7 @@ TYPED_TEST(IntervalParameterTest, TakesTheBoundsOfAnIntervalWithoutAFlag) {
     oParameter.setValueFromParameter(oSource);
     EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::second());
     EXPECT_TRUE(oParameter.upperBound() == Samples<T>::second());
-    EXPECT_FALSE(anyFlag(oParameter));
+    expectAllFlags(oParameter, false);
 }
 
 TYPED_TEST(IntervalParameterTest, KeepsItsBoundsWhenTheSourceHasNone) {
@@ -104,7 +93,7 @@ TYPED_TEST(IntervalParameterTest, KeepsItsBoundsWhenTheSourceHasNone) {
     EXPECT_TRUE(oParameter.value() == Samples<T>::second());
     EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::first());
     EXPECT_TRUE(oParameter.upperBound() == Samples<T>::first());
-    EXPECT_TRUE(allFlags(oParameter));
+    expectAllFlags(oParameter, true);
 }
 
 TYPED_TEST(IntervalParameterTest, RefusesAnotherTypeAndKeepsItsBounds) {
@@ -115,7 +104,7 @@ TYPED_TEST(IntervalParameterTest, RefusesAnotherTypeAndKeepsItsBounds) {
     ORVO_EXPECT_INTERNAL(oParameter.setValueFromParameter(oForeign), "isOfType<T>()");
     EXPECT_TRUE(oParameter.value() == Samples<T>::first());
     EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::first());
-    EXPECT_FALSE(anyFlag(oParameter));
+    expectAllFlags(oParameter, false);
 }
 
 TEST(IntervalParameterValueTest, BoundsAreNotEnforced) {
@@ -157,7 +146,7 @@ TEST(IntervalParameterValueTest, CopiesTakeBoundsAndFlagsOver) {
         EXPECT_EQ(0, pCopy->lowerBound());
         EXPECT_EQ(2, pCopy->upperBound());
         EXPECT_EQ("name", pCopy->name());
-        EXPECT_FALSE(anyFlag(*pCopy));
+        expectAllFlags(*pCopy, false);
     }
 }
 
