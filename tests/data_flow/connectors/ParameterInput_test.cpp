@@ -118,6 +118,16 @@ TEST_F(ParameterInputTest, NullParametersAreRefused) {
     EXPECT_EQ(0u, oNode_.numberOfInputs());
 }
 
+TEST_F(ParameterInputTest, AParameterThatMakesNoInputIsRefused) {
+    struct Closed : Parameter<float> {
+        Closed() : Parameter<float>(1.0f, "closed") {}
+        InputConnector* createProxyConnector(Node*) override { return nullptr; }
+    };
+    Closed oClosed;
+    ORVO_EXPECT_INTERNAL(oNode_.convertToConnector(&oClosed), "Enforce pInput != NULL");
+    EXPECT_EQ(0u, oNode_.numberOfInputs());
+}
+
 TEST_F(ParameterInputTest, AFailedConversionLeavesTheNodeAsItWas) {
     {
         ORVO::Core::AllocationFailure oFailure(1);

@@ -7,7 +7,9 @@
 #include <gtest/gtest.h>
 
 #include <memory>
+#include <ostream>
 #include <sstream>
+#include <stdexcept>
 
 namespace {
 
@@ -126,6 +128,43 @@ TEST(IntervalParameterValueTest, APlainParameterTakesTheValueAlone) {
     oParameter.setValueFromParameter(IntervalParameter<float>(0.5f, 0.0f, 1.0f, "mix"));
     EXPECT_EQ(0.5f, oParameter.value());
     EXPECT_FALSE(oParameter.isInterval());
+}
+
+/// A number whose copies can be made to fail. Assignments work.
+struct Fragile {
+    explicit Fragile(int iValue) : iValue_(iValue) {}
+    Fragile(Fragile const& oOther) : iValue_(oOther.iValue_) {
+        if (--nCopiesLeft < 0) {
+            throw std::runtime_error("no copy");
+        }
+    }
+    Fragile& operator=(Fragile const&) = default;
+    friend bool operator==(Fragile const& a, Fragile const& b) { return a.iValue_ == b.iValue_; }
+    friend std::ostream& operator<<(std::ostream& oStream, Fragile const& o) { return oStream << o.iValue_; }
+
+    int iValue_;
+    inline static int nCopiesLeft = 0;
+};
+
+TEST(IntervalParameterValueTest, BoundsThatCannotBeCopiedLeaveValueAndBounds) {
+    Fragile::nCopiesLeft = 1000;
+    IntervalParameter<Fragile> oParameter(Fragile(5), Fragile(0), Fragile(9), "name");
+    IntervalParameter<Fragile> const oSource(Fragile(6), Fragile(1), Fragile(8), "source");
+    setAllClean(oParameter);
+    // The lower bound is copied first.
+    for (int const nCopies : {0, 1}) {
+        Fragile::nCopiesLeft = nCopies;
+        EXPECT_THROW(oParameter.setValueFromParameter(oSource), std::runtime_error);
+        EXPECT_EQ(5, oParameter.value().iValue_);
+        EXPECT_EQ(0, oParameter.lowerBound().iValue_);
+        EXPECT_EQ(9, oParameter.upperBound().iValue_);
+        expectAllFlags(oParameter, false);
+    }
+    Fragile::nCopiesLeft = 1000;
+    oParameter.setValueFromParameter(oSource);
+    EXPECT_EQ(6, oParameter.value().iValue_);
+    EXPECT_EQ(1, oParameter.lowerBound().iValue_);
+    EXPECT_EQ(8, oParameter.upperBound().iValue_);
 }
 
 TEST(IntervalParameterValueTest, WritesAsAPlainOne) {
