@@ -160,6 +160,20 @@ TEST(FilterTest, FinishesItsSetUpOnce) {
     EXPECT_TRUE(plain.isInitialized());
 }
 
+TEST(FilterTest, CountsAsFinishedAlsoIfTheSetUpDoesNotSaySo) {
+    class ForgetfulFilter : public PlainFilter {
+    public:
+        int nSetUps = 0;
+
+    protected:
+        void finishLazyInitialization() override { ++nSetUps; }
+    } filter;
+    filter.initialize();
+    EXPECT_TRUE(filter.isInitialized());
+    filter.initialize();
+    EXPECT_EQ(filter.nSetUps, 1);
+}
+
 /// Adds one of everything and fails at the end of its first set-up.
 class StumblingFilter : public PlainFilter {
 public:
