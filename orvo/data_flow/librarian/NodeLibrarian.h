@@ -44,7 +44,7 @@ public:
     /// Registers a node type. Takes ownership of both objects, which may be plainly allocated.
     /// Throws InternalException "Enforce pNodeFactory != NULL" or "Enforce pMetaData != NULL": what was
     /// offered still belongs to the caller. Throws ParameterException "!bDuplicate" if the type is registered
-    /// already: both objects are freed, and the catalogue is as it was.
+    /// already, and std::bad_alloc: both objects are freed, and the catalogue is as it was.
     void add(NodeFactory* pNodeFactory, NodeMetaData* pMetaData);
 
     /// The same with a function in place of the factory. Throws also InternalException

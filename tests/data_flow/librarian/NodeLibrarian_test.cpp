@@ -233,14 +233,16 @@ TEST_F(NodeLibrarianTest, NullsAreRefusedAndStayTheCallers) {
     EXPECT_EQ("n", madeByID("id"));
 }
 
-TEST_F(NodeLibrarianTest, FactoryThatCannotBeMadeLeavesTheRecordToTheCaller) {
-    NodeMetaData* const pMetaData = ORVO_NEW NodeMetaData("n", "s", "v", "text", "id");
+TEST_F(NodeLibrarianTest, RecordIsFreedIfThereIsNoMemoryForItsFactory) {
+    NodeMetaData* const pMetaData = ORVO_NEW CountedMetaData("n", "s", "v", "text", "id");
+    CountedMetaData::nEnded = 0;
     {
         Core::AllocationFailure const failure(1);
         EXPECT_THROW(librarian.add(&createCPUOnly, pMetaData), std::bad_alloc);
     }
+    EXPECT_EQ(1, CountedMetaData::nEnded);
     EXPECT_EQ(librarian.begin(), librarian.end());
-    librarian.add(&createCPUOnly, pMetaData);
+    librarian.add(&createCPUOnly, ORVO_NEW NodeMetaData("n", "s", "v", "text", "id"));
     EXPECT_EQ("cpu only", madeByID("id"));
 }
 
