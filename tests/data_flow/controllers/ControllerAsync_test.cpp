@@ -457,6 +457,32 @@ TEST_F(ControllerAsyncTest, WaitLeavesItsLoopWhenTheFrameIsCancelled) {
     EXPECT_EQ(1, controller.nSleeps);
 }
 
+TEST_F(ControllerAsyncTest, WaitLeavesItsLoopWhenOnlyTheGroupIsCancelled) {
+    CountingController controller;
+    Chain chain(controller, 2);
+    Signal running;
+    Signal goOn;
+    chain[0].onRun_ = [&] {
+        running.raise();
+        goOn.await();
+    };
+    controller.afterSleep = [&] { goOn.raise(); };
+    controller.processAsync();
+    running.await();
+    TestAccess::cancelGroup(controller);
+    EXPECT_EQ(1, static_cast<int>(controller.controllerStatus()));
+    std::thread other([&] {
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        goOn.raise();
+    });
+    EXPECT_TRUE(controller.wait(1e9, 1.0));
+    EXPECT_EQ(0, controller.nSleeps);
+    other.join();
+    EXPECT_FALSE(chain.sink().out().hasData()) << "the graph was flushed";
+    controller.process();
+    EXPECT_EQ(2, chain.sink().result());
+}
+
 TEST_F(ControllerAsyncTest, CancelWithoutWaitDoesNotSpoilTheNextFrame) {
     Controller controller;
     Chain chain(controller, 3);

@@ -17,6 +17,8 @@ struct TestAccess {
     static void giveRoot(Controller& controller, std::unique_ptr<FrameLatch> pRoot) {
         controller.pImpl_->pRoot_ = std::move(pRoot);
     }
+    /// Cancels the slices and leaves the status as it is.
+    static void cancelGroup(Controller& controller) { controller.pImpl_->oGroup_.cancel_group_execution(); }
     static std::size_t rootCount(Controller& controller) { return controller.pImpl_->root()->count(); }
 
     static void createLibrarian() { NodeLibrarian::Create(); }
