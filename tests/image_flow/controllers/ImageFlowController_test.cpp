@@ -9,6 +9,7 @@
 
 #include <array>
 #include <deque>
+#include <limits>
 
 namespace ORVO {
 
@@ -295,6 +296,11 @@ TEST_F(ImageFlowControllerTest, infiniteComputeRegionsAreRefused) {
     graph.a.setGeneratedRegion(infiniteWorld());
     graph.oController_.computeRegions(world(0, 0, 8, 8));
     EXPECT_EQ(world(0, 0, 8, 8), graph.a.computeRegionParameter().value());
+    // One endless direction is enough.
+    float const infinity = std::numeric_limits<float>::infinity();
+    for (auto const& asked : {world(0, 0, infinity, 8), world(0, 0, 8, infinity)}) {
+        ORVO_EXPECT_INTERNAL(graph.oController_.computeRegions(asked), "Output region can't be infinite.");
+    }
     ORVO_EXPECT_INTERNAL(graph.oController_.computeRegions(infiniteWorld()),
                          "Output region can't be infinite.");
     // The first node in the list has its region; those after it keep their old one.

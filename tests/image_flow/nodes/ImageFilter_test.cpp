@@ -212,6 +212,7 @@ TEST_F(ImageFilterTest, refusesToBindAnImageThatLivesElsewhere) {
     ORVO_EXPECT_INTERNAL(homeless.setBoundOutputImage(upImage.get()), "outputTarget_ == p->targetPlatform()");
     TestFilter sink(1, false);
     ORVO_EXPECT_INTERNAL(sink.setBoundOutputImage(upImage.get()), "Enforce pImageOutput_ != NULL");
+    ORVO_EXPECT_INTERNAL(sink.setBoundOutputImage(&image), "outputTarget_ == p->targetPlatform()");
 }
 
 TEST_F(ImageFilterTest, aTakenAwayImageIsNeverWrittenAgain) {
