@@ -84,6 +84,21 @@ TEST_F(AdapterExecutablesTest, ASourceWithoutAnImageStillForwardsItsRegion) {
     EXPECT_FALSE(node.isReady());
 }
 
+TEST_F(AdapterExecutablesTest, RegionsOfImagesNeedImages) {
+    FloatImage image(1, 1);
+    SourcePtr const spSource = makeSource(image);
+    auto const spExecutable = adapter(spSource).buildFilterExecutable(ORVO_TARGET_CPU, *pExecutable_);
+    spSource->setImage(nullptr);
+    ORVO_EXPECT_INTERNAL(spExecutable->forwardStuff(), "Enforce image_ != NULL");
+
+    GeneratorNode sink;
+    OutputAdapterExecutable executable(*pExecutable_, sinkAdapter());
+    executable.bind(&sink);
+    spSink_->setImage(nullptr);
+    ORVO_EXPECT_INTERNAL(executable.forwardStuff(), "Enforce image_ != NULL");
+    ORVO_EXPECT_INTERNAL(executable.getInputTargetPlatform(), "Enforce image_ != NULL");
+}
+
 TEST_F(AdapterExecutablesTest, TheEndOfTheGraphHasNoConnectors) {
     OutputAdapterExecutable executable(*pExecutable_, sinkAdapter());
     EXPECT_EQ(executable.getImageFlowInputConnector("InputImage"), nullptr);
