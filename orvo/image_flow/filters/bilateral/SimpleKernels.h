@@ -29,8 +29,8 @@ struct SimpleJob {
 
 /// A kernel made for one instruction set. The plain one is the definition of the results. The others use a
 /// polynomial with a relative error of 3e-7 for the exponential and are the same otherwise, operation by
-/// operation: results differ from the plain ones by at most 1e-6 times the largest neighbour. NaN and
-/// infinity are treated alike.
+/// operation: results differ from the plain ones by at most 1e-6 times the largest neighbour
+/// where a pixel is one of its own neighbours, with a weight of about 1. NaN and infinity are treated alike.
 ///
 /// Threads: free of state; any thread.
 using SimpleKernel = void (*)(SimpleJob const& job);
