@@ -1,16 +1,19 @@
 // The fast bilateral filter, float RGBA 1920 x 1080, sigma 10 / 0.15, luminance and colorize (Lab), with each
-// instruction set on one thread and two.
+// instruction set on one thread and two; and the simple bilateral filter with the same sigmas on a part of
+// the picture, 480 x 270, on one thread.
 //
-// The counter to_plain is the time of the plain scalar version of the same run divided by the time of the
-// filter, the two run by turns so that both see the same machine: both are medians of wall-clock times.
-// to_memcpy is the time of the filter in times of memcpy for the bytes of the source read and of the
-// destination written, on one thread. ".../plain" is the plain version by itself. Before it is timed, each
-// variant is compared with the plain one.
+// The counter to_plain is the time of the plain version of the same run divided by the time of the filter,
+// the two run by turns so that both see the same machine: both are medians of wall-clock times. The plain
+// versions are ordinary scalar programs on one thread, which walk rows by pointers and work out what they can
+// beforehand. to_memcpy is the time of the fast filter in times of memcpy for the bytes of the source read
+// and of the destination written, on one thread. ".../plain" is the plain version by itself. Before it is
+// timed, each variant is compared with the plain one.
 #include "orvo/image_flow/filters/FastBilateralCPUFilter.h"
 
 #include "orvo/core/utility/SharedPtr.h"
 #include "orvo/image_flow/filters/bilateral/BandRunner.h"
 #include "orvo/image_flow/filters/bilateral/PlainBilateralFilter.h"
+#include "orvo/image_flow/filters/bilateral/SimpleBilateral.h"
 #include "orvo/image_runtime/BlankSIMDOptimizedImageCPU.h"
 #include "orvo/image_runtime/images/ImageCPU.h"
 #include "orvo/image_runtime/images/ImageCPUReadAccessor.h"
@@ -134,6 +137,16 @@ double medianOf(std::vector<double> aValues) {
     return *iMiddle;
 }
 
+double largestDifference(ImageCPU const& result, ImageCPU const& expected) {
+    auto const* const pResult = reinterpret_cast<float const*>(result.pixels());
+    auto const* const pExpected = reinterpret_cast<float const*>(expected.pixels());
+    float largest = 0.0F;
+    for (std::size_t i = 0; i < 4 * result.numberOfPixels(); ++i) {
+        largest = std::max(largest, std::abs(pResult[i] - pExpected[i]));
+    }
+    return static_cast<double>(largest);
+}
+
 /// Source, destinations and the two versions of the filter.
 struct Setting {
     explicit Setting(bool bColorize) : bColorize_(bColorize) {}
@@ -153,15 +166,7 @@ struct Setting {
                     upSource_->numberOfPixels() * sizeof(PixelRGBA32F));
     }
 
-    double largestDifference() const {
-        auto const* const pResult = reinterpret_cast<float const*>(upResult_->pixels());
-        auto const* const pExpected = reinterpret_cast<float const*>(upExpected_->pixels());
-        float largest = 0.0F;
-        for (std::size_t i = 0; i < 4 * upSource_->numberOfPixels(); ++i) {
-            largest = std::max(largest, std::abs(pResult[i] - pExpected[i]));
-        }
-        return static_cast<double>(largest);
-    }
+    double difference() const { return largestDifference(*upResult_, *upExpected_); }
 
     bool bColorize_;
     ImagePointer upSource_ = makePicture();
@@ -179,7 +184,7 @@ void benchmarkFast(benchmark::State& state, bool bColorize, InstructionSet eInst
     TeamRunner runner(nThreads);
     setting.plain();
     setting.fast(runner);
-    double const difference = setting.largestDifference();
+    double const difference = setting.difference();
     if (!(difference < (bColorize ? 1e-3 : 1e-5))) {
         state.SkipWithError("differs from the plain version");
         return;
@@ -212,6 +217,46 @@ void benchmarkPlain(benchmark::State& state, bool bColorize) {
     }
 }
 
+void benchmarkSimple(benchmark::State& state, bool bColorize, InstructionSet eInstructionSet) {
+    constexpr int kPartWidth = kWidth / 4;
+    constexpr int kPartHeight = kHeight / 4;
+    PositionExtentInPixelSpace const part(PositionInPixelSpace(kWidth / 3, kHeight / 3),
+                                          ExtentInPixelSpace(kPartWidth, kPartHeight));
+    ImagePointer const upSource = makePicture();
+    ImagePointer const upResult = makeImage();
+    ImagePointer const upExpected = makeImage();
+    upResult->initializeToTransparentBlack();
+    upExpected->initializeToTransparentBlack();
+    ImageFlow::bilateral::SimpleBilateral const filter(kSpatialSigma, kRangeSigma, bColorize);
+    auto const run = [&](InstructionSet eSet, ImageCPU& output) {
+        ImageRuntime::setActiveInstructionSet(eSet);
+        filter.filterRows(*upSource, output, part, 0, kPartHeight);
+    };
+    run(InstructionSet::PLAIN, *upExpected);
+    run(eInstructionSet, *upResult);
+    double const difference = largestDifference(*upResult, *upExpected);
+    if (!(difference < 1e-5)) {
+        state.SkipWithError("differs from the plain version");
+        return;
+    }
+    std::vector<double> aFast;
+    std::vector<double> aPlain;
+    for ([[maybe_unused]] auto _ : state) {
+        aFast.push_back(secondsOf([&] { run(eInstructionSet, *upResult); }));
+        if (aPlain.size() < 3) {
+            aPlain.push_back(secondsOf([&] { run(InstructionSet::PLAIN, *upExpected); }));
+        }
+        state.SetIterationTime(aFast.back());
+    }
+    double const fast = medianOf(aFast);
+    state.counters["median_ms"] = fast * 1e3;
+    state.counters["plain_ms"] = medianOf(aPlain) * 1e3;
+    state.counters["to_plain"] = medianOf(aPlain) / fast;
+    state.counters["pixels_per_second"] = double(kPartWidth) * double(kPartHeight) / fast;
+    state.counters["difference"] = difference;
+    ImageRuntime::setActiveInstructionSet(ImageRuntime::bestInstructionSet());
+}
+
 bool registerAll() {
     for (bool bColorize : {false, true}) {
         std::string const name = bColorize ? "bilateral/colorize/" : "bilateral/luminance/";
@@ -219,6 +264,13 @@ bool registerAll() {
             ->UseManualTime()
             ->Unit(benchmark::kMillisecond);
         for (InstructionSet eSet : {InstructionSet::SSE2, InstructionSet::AVX2, InstructionSet::AVX512}) {
+            if (ImageRuntime::isSupported(eSet)) {
+                std::ostringstream simple;
+                simple << "simple_" << name << eSet;
+                benchmark::RegisterBenchmark(simple.str().c_str(), benchmarkSimple, bColorize, eSet)
+                    ->UseManualTime()
+                    ->Unit(benchmark::kMillisecond);
+            }
             for (int nThreads : {1, 2}) {
                 if (ImageRuntime::isSupported(eSet)) {
                     std::ostringstream full;

@@ -6,15 +6,14 @@
 #include "orvo/image_runtime/ConvertSIMDOptimizedImageCPU.h"
 
 #include "benchmarks/support/MemoryBandwidth.h"
+#include "benchmarks/support/Timing.h"
 #include "orvo/core/utility/SharedPtr.h"
 #include "orvo/image_runtime/BlankSIMDOptimizedImageCPU.h"
 #include "orvo/image_runtime/kernels/InstructionSet.h"
 
 #include <benchmark/benchmark.h>
 
-#include <algorithm>
 #include <barrier>
-#include <chrono>
 #include <cstdint>
 #include <cstring>
 #include <functional>
@@ -26,6 +25,8 @@
 namespace {
 
 using namespace ORVO;
+using Benchmarks::medianOf;
+using Benchmarks::secondsOf;
 
 constexpr int WIDTH = 3840;
 constexpr int HEIGHT = 2160;
@@ -85,18 +86,6 @@ private:
     std::barrier<> oEnd_;
     std::vector<std::thread> aThreads_;
 };
-
-double secondsOf(std::function<void()> const& work) {
-    auto const begin = std::chrono::steady_clock::now();
-    work();
-    return std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();
-}
-
-double medianOf(std::vector<double> seconds) {
-    auto const middle = seconds.begin() + static_cast<std::ptrdiff_t>(seconds.size() / 2);
-    std::nth_element(seconds.begin(), middle, seconds.end());
-    return *middle;
-}
 
 PositionExtentInPixelSpace frame() { return PositionExtentInPixelSpace(ExtentInPixelSpace(WIDTH, HEIGHT)); }
 

@@ -1,5 +1,6 @@
 // Row slices of a node: what a second thread brings to work that computes, and what the slicing itself costs.
 // Items are pixels for the first, rows for the second.
+#include "benchmarks/support/Timing.h"
 #include "orvo/core/CoreLibrary.h"
 #include "orvo/data_flow/DataFlow.h"
 
@@ -8,11 +9,14 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
+#include <thread>
 #include <vector>
 
 namespace {
 
 using namespace ORVO;
+using Benchmarks::medianOf;
+using Benchmarks::secondsOf;
 
 constexpr std::size_t nWidth = 1920;
 constexpr std::size_t nHeight = 1080;
@@ -97,6 +101,29 @@ BENCHMARK_CAPTURE(computeSynchronous, single, 1, true)
 BENCHMARK_CAPTURE(computeSynchronous, one, 1, false)->Name("row_slices_compute/threads_1")->UseRealTime();
 BENCHMARK_CAPTURE(computeSynchronous, two, 2, false)->Name("row_slices_compute/threads_2")->UseRealTime();
 BENCHMARK_CAPTURE(computeAsynchronous, two, 2)->Name("row_slices_compute/threads_2_async")->UseRealTime();
+
+/// One thread, two threads and, as what the machine itself gives, two bare threads of which each takes one
+/// half: by turns, since a neighbour's load otherwise falls on one of them alone.
+void computeByTurns(benchmark::State& state) {
+    Fixture fixture(nHeight, nComputeSteps, 2);
+    RowNode& node = fixture.node();
+    std::vector<double> aOne, aTwo, aBare;
+    for (auto _ : state) {
+        aOne.push_back(secondsOf([&] { node.processSlice(0, nHeight); }));
+        aBare.push_back(secondsOf([&] {
+            std::thread other([&] { node.processSlice(0, nHeight / 2); });
+            node.processSlice(nHeight / 2, nHeight);
+            other.join();
+        }));
+        aTwo.push_back(secondsOf([&] { fixture.controller().process(); }));
+        state.SetIterationTime(aTwo.back());
+    }
+    double const one = medianOf(aOne);
+    state.counters["to_one_thread"] = one / medianOf(aTwo);
+    state.counters["bare_threads_to_one"] = one / medianOf(aBare);
+}
+
+BENCHMARK(computeByTurns)->Name("row_slices_by_turns")->UseManualTime()->MinTime(1.0);
 
 /// Slices without work: the node's rows are walked over with no step at all.
 class EmptyRows : public RowNode {

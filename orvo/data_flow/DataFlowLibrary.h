@@ -23,15 +23,16 @@ public:
     /// "!internal::FrameThreads::isFrameThread()" if called on the thread of a frame.
     static void terminate();
 
+    /// Whether the layer is up: true from the end of initialize() to the end of terminate().
     static bool isInitialized();
 };
 
-/// Keeps the data-flow layer up for the time of a scope.
+/// Keeps the data-flow layer up for the time of a scope. Owns nothing.
 ///
 /// Threads: as Library.
 class ORVO_API AutoInitializer {
 public:
-    /// Throws as Library::initialize() does.
+    /// Starts the layer; throws as Library::initialize() does, and then terminates nothing.
     AutoInitializer();
     AutoInitializer(AutoInitializer const&) = delete;
     AutoInitializer& operator=(AutoInitializer const&) = delete;

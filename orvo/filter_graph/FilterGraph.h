@@ -7,6 +7,7 @@
 /// (`createInputAdapter`, `createOutputAdapter`), bind the images (`ImageCPU`), connect all of them
 /// (`Connect`), create a processor on the output adapter (`createProcessor`), and ask it for frames.
 
+#include "orvo/filter_graph/filters/Bilateral.h"
 #include "orvo/filter_graph/filters/StandardFilters.h"
 #include "orvo/filter_graph/impl/Connect.h"
 #include "orvo/filter_graph/impl/CreateProcessor.h"

@@ -21,15 +21,18 @@ public:
     /// Throws "ImageFlow already initialized", "Core::Library::isInitialized()",
     /// "DataFlow::Library::isInitialized()", "OGL::Library::isInitialized()" or
     /// "ImageRuntime::Library::isInitialized()", and `ParameterException` "!bDuplicate" where a node type of
-    /// the same identity is registered already; the catalogue is then as it was. The driver of the runtime's
-    /// first context fails the check with `ResourceException` "Minimum OpenGL Version (1.5) not supported."
-    /// (versions 1.0 to 1.4), "Framebuffer Object Extension not supported." or "Non power of two textures not
-    /// supported.", or with `OGL::ExceptionOGL` where that context cannot be made current.
+    /// the same identity is registered already; the catalogue is then as it was. Where memory runs out
+    /// (`std::bad_alloc`) the catalogue is emptied, also of the types of others.
+    /// The driver of the runtime's first context fails the check with `ResourceException` "Minimum OpenGL
+    /// Version (1.5) not supported." (versions 1.0 to 1.4), "Framebuffer Object Extension not supported." or
+    /// "Non power of two textures not supported.", or with `OGL::ExceptionOGL` where that context cannot be
+    /// made current.
     static void initialize(bool checkGPU);
     /// Removes every node type from the librarian, also those that others registered. Throws "ImageFlow is
     /// not initialized!", "Core::Library::isInitialized()", "DataFlow::Library::isInitialized()" or
     /// "OGL::Library::isInitialized()".
     static void terminate();
+    /// Whether `initialize` has succeeded and `terminate` has not since.
     static bool isInitialized();
     /// Whether the image runtime was started without an OpenGL context. Throws
     /// "ImageRuntime::Library::isInitialized()".

@@ -1,12 +1,14 @@
 #include "orvo/data_flow/DataFlowLibrary.h"
 
 #include "orvo/core/CoreLibrary.h"
-#include "orvo/core/exceptions/SharedException.h"
 #include "orvo/data_flow/controllers/Controller.h"
+#include "orvo/data_flow/librarian/NodeFactory.h"
 #include "orvo/data_flow/librarian/NodeLibrarian.h"
 #include "orvo/data_flow/librarian/NodeMetaData.h"
 #include "orvo/data_flow/nodes/Node.h"
 
+#include "tests/data_flow/controllers/SharedFailure.h"
+#include "tests/data_flow/controllers/TestAccess.h"
 #include "tests/data_flow/controllers/TestNodes.h"
 #include "tests/support/CoreLayer.h"
 #include "tests/support/Expect.h"
@@ -16,6 +18,7 @@
 #include <chrono>
 #include <memory>
 #include <optional>
+#include <string>
 #include <thread>
 
 namespace ORVO::Test {
@@ -24,9 +27,11 @@ using DataFlow::AutoInitializer;
 using DataFlow::Controller;
 using DataFlow::Library;
 using DataFlow::Node;
+using DataFlow::NodeFactory;
 using DataFlow::NodeLibrarian;
 using DataFlow::NodeMetaData;
 using DataFlow::NodeTargetType;
+using DataFlow::internal::TestAccess;
 
 namespace {
 Node* createNode(NodeTargetType) { return ORVO_NEW Node("node"); }
@@ -54,6 +59,17 @@ TEST(DataFlowLibraryTest, StartNeedsTheCore) {
     ORVO_EXPECT_INTERNAL(Library::initialize(), "Core::Library::isInitialized()");
     EXPECT_FALSE(Library::isInitialized());
     EXPECT_FALSE(NodeLibrarian::exists());
+}
+
+TEST(DataFlowLibraryTest, StartThatFailsHalfWayLeavesNothingBehind) {
+    CoreLayer const core;
+    TestAccess::createLibrarian();
+    ORVO_EXPECT_INTERNAL(Library::initialize(), "gpSingleton_ == 0");
+    EXPECT_FALSE(Library::isInitialized());
+    ORVO_EXPECT_INTERNAL(Node("n"), "pIndexMap_");
+    TestAccess::destroyLibrarian();
+    AutoInitializer const dataFlow;
+    EXPECT_TRUE(Library::isInitialized());
 }
 
 TEST(DataFlowLibraryTest, StopWithoutStartIsRefused) {
@@ -107,6 +123,26 @@ TEST(DataFlowLibraryTest, StopFreesTheRegisteredTypes) {
     // What is left of tracked memory is compared at the end of every test.
 }
 
+TEST(DataFlowLibraryTest, StopFreesTheTypesWhileNodesStillHaveNames) {
+    struct Factory : NodeFactory {
+        explicit Factory(std::string& sLastWords) : sLastWords_(sLastWords) {}
+        ~Factory() override {
+            sLastWords_ = Node("last").debugId();
+            EXPECT_TRUE(Library::isInitialized());
+        }
+        Node* create(NodeTargetType) override { return nullptr; }
+        std::string& sLastWords_;
+    };
+    CoreLayer const core;
+    std::string sLastWords;
+    {
+        AutoInitializer const dataFlow;
+        NodeLibrarian::Instance()->add(ORVO_NEW Factory(sLastWords),
+                                       ORVO_NEW NodeMetaData("n", "s", "v", 1, "text", "id"));
+    }
+    EXPECT_EQ("last [0]", sLastWords);
+}
+
 TEST(DataFlowLibraryTest, NamesAreCountedAnewAfterARestart) {
     CoreLayer const core;
     for (int i = 0; i < 2; ++i) {
@@ -149,14 +185,8 @@ TEST(DataFlowLibraryTest, StopOnTheThreadOfAFrameIsRefused) {
     controller.setSinkNode(node);
     controller.processAsync();
     ASSERT_TRUE(controller.wait(60.0, 0.001));
-    try {
-        controller.checkException();
-        ADD_FAILURE() << "nothing was thrown";
-    } catch (SharedException const& shared) {
-        auto const* pInner = dynamic_cast<InternalException const*>(shared.exception().get());
-        ASSERT_NE(nullptr, pInner);
-        EXPECT_STREQ("!internal::FrameThreads::isFrameThread()", pInner->message());
-    }
+    expectShared<InternalException>([&] { controller.checkException(); },
+                                    "!internal::FrameThreads::isFrameThread()");
     EXPECT_TRUE(Library::isInitialized());
 }
 

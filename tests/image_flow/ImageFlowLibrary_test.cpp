@@ -1,6 +1,7 @@
 #include "orvo/image_flow/ImageFlowLibrary.h"
 
 #include "orvo/core/CoreLibrary.h"
+#include "orvo/core/memory/AllocationFailure.h"
 #include "orvo/core/memory/TrackedNew.h"
 #include "orvo/core/utility/SharedPtr.h"
 #include "orvo/data_flow/DataFlowLibrary.h"
@@ -21,7 +22,9 @@
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
 
+#include <iterator>
 #include <memory>
+#include <new>
 #include <typeinfo>
 
 namespace ORVO {
@@ -39,6 +42,11 @@ void initializeRuntime() {
     ImageRuntime::Library::initialize(static_cast<OGL::Context const*>(nullptr),
                                       VideoMemory::Configuration());
 }
+
+/// The layers below image flow, up for a scope.
+struct LowerLayers : ORVO::Test::ImageRuntimeLayers {
+    DataFlow::AutoInitializer oDataFlow_;
+};
 
 NodePtr create(char const* clientID, int target) {
     return NodePtr(
@@ -147,24 +155,17 @@ TEST(ImageFlowLibraryTest, makesNodesForTheTargetsThatATypeServes) {
 }
 
 TEST(ImageFlowLibraryTest, terminationRemovesEveryNodeType) {
-    Core::AutoInitializer core;
-    OGL::AutoInitializer ogl;
-    initializeRuntime();
-    DataFlow::AutoInitializer dataFlow;
+    LowerLayers layers;
     Library::initialize(false);
     NodeLibrarian& librarian = *NodeLibrarian::Instance();
     librarian.add([](NodeTargetType) -> Node* { return nullptr; },
                   ORVO_NEW NodeMetaData("Other", "Name", "Vendor", 1u, "", "other"));
     Library::terminate();
     EXPECT_EQ(librarian.begin(), librarian.end());
-    ImageRuntime::Library::terminate();
 }
 
 TEST(ImageFlowLibraryTest, aTypeOfTheSameIdentityIsRefusedAndNothingChanges) {
-    Core::AutoInitializer core;
-    OGL::AutoInitializer ogl;
-    initializeRuntime();
-    DataFlow::AutoInitializer dataFlow;
+    LowerLayers layers;
     NodeLibrarian& librarian = *NodeLibrarian::Instance();
     librarian.add([](NodeTargetType) -> Node* { return nullptr; },
                   ORVO_NEW NodeMetaData("LABToRGBCPU", "ImageFlow", "Norvane", 1u, "", "other"));
@@ -174,14 +175,31 @@ TEST(ImageFlowLibraryTest, aTypeOfTheSameIdentityIsRefusedAndNothingChanges) {
     librarian.clearAll();
     Library::initialize(false);
     Library::terminate();
-    ImageRuntime::Library::terminate();
+}
+
+TEST(ImageFlowLibraryTest, aStartThatRunsOutOfMemoryMayBeTriedAgain) {
+    LowerLayers layers;
+    NodeLibrarian& librarian = *NodeLibrarian::Instance();
+    std::uint64_t nFailures = 0;
+    for (;; ++nFailures) {
+        ASSERT_LT(nFailures, 100u);
+        Core::AllocationFailure failure(nFailures + 1);
+        try {
+            Library::initialize(false);
+            break;
+        } catch (std::bad_alloc const&) {
+            EXPECT_TRUE(failure.hasFired());
+            EXPECT_FALSE(Library::isInitialized());
+            EXPECT_EQ(librarian.begin(), librarian.end());
+        }
+    }
+    EXPECT_GE(nFailures, std::size(aRows)); // a record for each node type at least
+    EXPECT_EQ(std::ptrdiff_t(std::size(aRows)), librarian.end() - librarian.begin());
+    Library::terminate();
 }
 
 TEST(ImageFlowLibraryTest, theAutoInitializerKeepsTheLayerUpInItsScope) {
-    Core::AutoInitializer core;
-    OGL::AutoInitializer ogl;
-    initializeRuntime();
-    DataFlow::AutoInitializer dataFlow;
+    LowerLayers layers;
     {
         ImageFlow::AutoInitializer scope(false);
         EXPECT_TRUE(Library::isInitialized());
@@ -199,7 +217,6 @@ TEST(ImageFlowLibraryTest, theAutoInitializerKeepsTheLayerUpInItsScope) {
     }
     EXPECT_TRUE(Library::isInitialized());
     Library::terminate();
-    ImageRuntime::Library::terminate();
 }
 
 } // namespace

@@ -10,7 +10,7 @@
 #include "orvo/filter_graph/impl/Exception.h"
 
 // The statement must throw a FilterGraph::Exception with exactly one record: an error with exactly the given
-// message.
+// message, which is about no text of the host's (both numbers are 0).
 #define ORVO_EXPECT_FILTERGRAPH(statement, text)                                                             \
     do {                                                                                                     \
         try {                                                                                                \
@@ -21,6 +21,8 @@
             EXPECT_TRUE(orvoCaught.errorsAndWarnings()[0].isError()) << #statement;                          \
             EXPECT_EQ(std::string(text), std::string(orvoCaught.errorsAndWarnings()[0].message()))           \
                 << #statement;                                                                               \
+            EXPECT_EQ(0, orvoCaught.errorsAndWarnings()[0].inputStringId()) << #statement;                   \
+            EXPECT_EQ(0, orvoCaught.errorsAndWarnings()[0].line()) << #statement;                            \
         } catch (std::exception const& orvoCaught) {                                                         \
             ADD_FAILURE() << #statement << " threw " << typeid(orvoCaught).name() << ": "                    \
                           << orvoCaught.what() << "; expected FilterGraph::Exception: " << (text);           \

@@ -17,8 +17,9 @@ class Parameter;
 template <typename T>
 class ORVO_API ParameterInput : public ConstInput<T> {
 public:
-    /// An empty, unconnected input named `sName` of `pNode` for `pParameter`. Neither is owned; the parameter
-    /// is not null, and lives whenever the input fetches.
+    /// An empty, unconnected input named `sName` of `pNode` (may be null) for `pParameter`. Neither is owned;
+    /// the parameter lives whenever the input fetches. Throws `InternalException`
+    /// "Enforce pParameter != NULL".
     ParameterInput(std::string const& sName, Node* pNode, Parameter<T>* pParameter)
         : ConstInput<T>(sName, pNode), pParameter_(pParameter) {
         ORVO_ENFORCE(pParameter);

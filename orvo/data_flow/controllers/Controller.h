@@ -55,12 +55,13 @@ public:
     enum teControllerStatus : std::int32_t {
         CONTROLLER_STOPPED = 0, ///< No frame runs; the graph may be edited.
         CONTROLLER_RUNNING = 1, ///< A frame is running.
-        CONTROLLER_CANCELLED =
-            2 ///< The frame was cancelled and has not ended, or wait() has not collected it.
+        /// The frame was cancelled and has not ended, or wait() has not collected it.
+        CONTROLLER_CANCELLED = 2
     };
 
     using NodeIterator = std::vector<Node*>::const_iterator;
 
+    /// A controller without nodes and without a sink, stopped.
     Controller();
     Controller(Controller const&) = delete;
     Controller& operator=(Controller const&) = delete;
@@ -127,9 +128,8 @@ public:
 
     /// Waits for the frame. Times in seconds; `timeout` is compared with the sum of the intervals slept,
     /// not with a clock. With `interval` 0 it spins until the frame ends.
-    /// @return false if the sum exceeded `timeout` while the frame runs on; true once the frame has ended and
-    /// been
-    ///         collected. If it was cancelled, the graph has then been flushed and the next frame can run.
+    /// Returns false if the sum exceeded `timeout` while the frame runs on; true once the frame has ended and
+    /// been collected. If it was cancelled, the graph has then been flushed and the next frame can run.
     /// Throws InternalException "bGraphFlushed" if an override refuses the flush. Does not report the frame's
     /// failure: see checkException(). In the completion callback the frame counts as ended.
     virtual bool wait(double timeout, double interval);
@@ -143,11 +143,14 @@ public:
 
     /// Sets the node to pull from. Not owned; null for none.
     void setSinkNode(Node* pSink) { pSink_ = pSink; }
+    /// The same.
     void setSinkNode(Node& sink) { pSink_ = &sink; }
+    /// The node to pull from, or null. Not owned.
     Node* getSinkNode() const { return pSink_; }
 
     /// The nodes in the order of addNode(). Invalidated by addNode(), removeNode() and removeAllNodes().
     NodeIterator nodesBegin() const { return aNodes_.begin(); }
+    /// Behind the last node.
     NodeIterator nodesEnd() const { return aNodes_.end(); }
 
     /// The status; a host that reads 0 also sees everything that the frame wrote. Any thread.
@@ -177,11 +180,13 @@ public:
     /// processors of the machine) gives all that it offers; 0 is stored and counts as 1. Until it is called
     /// there is no bound, and the number is one more than the processors of the machine. Always true.
     static bool setNumberOfThreads(std::size_t nThreads);
+    /// The number that was set, also where the scheduler offers less.
     static std::size_t getNumberOfThreads();
 
     /// The least number of work units (pixels) in a slice. Initially 1. Takes effect for the next
     /// processSlices(). Always true.
     static bool setMinimumGrainSize(std::size_t nUnits);
+    /// The number that was set.
     static std::size_t getMinimumGrainSize();
 
 protected:
@@ -201,6 +206,7 @@ protected:
 
     /// Serialises the set-up of threads across controllers; there is nothing to set up. Always true.
     bool initializeScheduler(std::size_t nThreads);
+    /// Does nothing: nothing was set up.
     void terminateScheduler();
 
     /// Cancels a frame that still runs and waits for its end; does nothing if none is out. For the

@@ -36,10 +36,14 @@ public:
 
     /// Takes and releases the lock that serialises scheduler set-up across controllers. Always true.
     static bool initializeScheduler(std::size_t nThreads);
+    /// Does nothing: nothing was set up.
     static void terminateScheduler();
 
+    /// Keeps slices that have not started from starting, until resetIfCancelled(). Other controllers go on.
     void cancelProcess();
+    /// Whether the group was cancelled and not reset since.
     bool isCancelled();
+    /// Makes a cancelled group ready for the next frame. No slice may be running.
     void resetIfCancelled();
 
     /// Where frames are counted. Null only if a test took it away.

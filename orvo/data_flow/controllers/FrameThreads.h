@@ -20,6 +20,7 @@ namespace ORVO::DataFlow::internal {
 /// Threads: run() from any; join() from one that is not of the pool.
 class FrameThreads {
 public:
+    /// The pool of the process.
     static FrameThreads& instance();
 
     FrameThreads() = default;

@@ -15,6 +15,7 @@ public:
     explicit CreateNodeFunctionNodeFactory(CreateFunction pCreateFunction);
     ~CreateNodeFunctionNodeFactory() override;
 
+    /// What the function makes, owned by the caller; null if it answers null.
     Node* create(NodeTargetType eTarget) override;
 
 private:

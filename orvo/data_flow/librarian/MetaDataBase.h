@@ -14,14 +14,18 @@ class ORVO_API MetaDataBase {
 public:
     /// Without a version: as a search key it stands for the latest one.
     MetaDataBase(std::string const& name, std::string const& nameSpace, std::string const& vendor);
+    /// With a version: as a search key it stands for that one.
     MetaDataBase(std::string const& name, std::string const& nameSpace, std::string const& vendor,
                  std::uint32_t version);
     virtual ~MetaDataBase();
 
+    /// The name of the node type.
     std::string const& name() const { return sName_; }
     /// Reverse-domain style grouping.
     std::string const& nameSpace() const { return sNameSpace_; }
+    /// The maker's name.
     std::string const& vendor() const { return sVendor_; }
+    /// Whether the record was built with a version, be it 0.
     bool hasVersion() const { return bHasVersion_; }
     /// 0 if there is no version.
     std::uint32_t version() const { return bHasVersion_ ? iVersion_ : 0; }

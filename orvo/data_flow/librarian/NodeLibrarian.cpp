@@ -72,9 +72,10 @@ void NodeLibrarian::add(NodeFactory* pNodeFactory, NodeMetaData* pMetaData) {
 
 void NodeLibrarian::add(Node* (*pCreateFunction)(NodeTargetType), NodeMetaData* pMetaData) {
     ORVO_ENFORCE(pCreateFunction);
-    Owned<NodeFactory> spFactory(ORVO_NEW CreateNodeFunctionNodeFactory(pCreateFunction));
     ORVO_ENFORCE(pMetaData);
-    add(spFactory.release(), pMetaData);
+    Owned<NodeMetaData> spMetaData(pMetaData);
+    Owned<NodeFactory> spFactory(ORVO_NEW CreateNodeFunctionNodeFactory(pCreateFunction));
+    add(spFactory.release(), spMetaData.release());
 }
 
 Node* NodeLibrarian::createNodeByMetadata(NodeMetaData const* pMetaData, NodeTargetType eTarget) {

@@ -44,7 +44,7 @@ public:
     /// Registers a node type. Takes ownership of both objects, which may be plainly allocated.
     /// Throws InternalException "Enforce pNodeFactory != NULL" or "Enforce pMetaData != NULL": what was
     /// offered still belongs to the caller. Throws ParameterException "!bDuplicate" if the type is registered
-    /// already: both objects are freed, and the catalogue is as it was.
+    /// already, and std::bad_alloc: both objects are freed, and the catalogue is as it was.
     void add(NodeFactory* pNodeFactory, NodeMetaData* pMetaData);
 
     /// The same with a function in place of the factory. Throws also InternalException
@@ -56,11 +56,15 @@ public:
     /// the type does not serve.
     Node* createNodeByMetadata(NodeMetaData const* pMetaData, NodeTargetType eTarget);
 
-    /// Makes a node of the first registered type with this client ID; null if there is none.
+    /// Makes a node, owned by the caller, of the first registered type with this client ID (byte for byte):
+    /// of exactly its version, or of the latest one if its record has none. Null if there is no such type, or
+    /// if it does not serve the target. Throws InternalException "Enforce gpSingleton_ != NULL" while the
+    /// library is not up.
     Node* createNodeByClientID(std::string const& clientID, NodeTargetType eTarget);
 
-    /// The records in the order of registration. Invalidated by add() and clearAll().
+    /// The records in the order of registration, not owned. Invalidated by add() and clearAll().
     MetaDataIterator begin() const { return aMetaData_.begin(); }
+    /// Behind the last record.
     MetaDataIterator end() const { return aMetaData_.end(); }
 
     /// Forgets and frees all node types.

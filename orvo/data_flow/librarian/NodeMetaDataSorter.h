@@ -12,8 +12,9 @@ class NodeMetaData;
 /// Threads: any.
 class ORVO_API NodeMetaDataSorter {
 public:
-    /// The pointers must not be null.
+    /// Whether the left record stands before the right one. The pointers must not be null.
     bool operator()(NodeMetaData const* pLeft, NodeMetaData const* pRight) const;
+    /// The same order.
     bool operator()(NodeMetaData const& left, NodeMetaData const& right) const;
 };
 

@@ -192,6 +192,7 @@ InputConnector* Node::convertToConnector(ParameterBase* pParameter) {
     ORVO_ENFORCE(pParameter);
     reserveOneMore(aInputs_);
     InputConnector* const pInput = pParameter->createProxyConnector(this);
+    ORVO_ENFORCE(pInput);
     aInputs_.push_back(pInput);
     return pInput;
 }

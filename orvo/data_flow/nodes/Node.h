@@ -65,7 +65,8 @@ public:
     virtual ~Node();
 
     /// Writes the node and its connections, one line each. Throws `InternalException`
-    /// "Enforce pConnectedOutput_ != NULL" for an unconnected input, with nothing written.
+    /// "Enforce pConnectedOutput_ != NULL" for an unconnected input and "Enforce pNode != NULL" for a partner
+    /// without a node, with nothing written.
     virtual void debugWrite(std::ostream& oStream) const;
 
     /// Remembers the controller that the node was added to. Not owned.
@@ -96,7 +97,8 @@ public:
     /// is connected to an output that holds data.
     virtual bool isReady() const;
 
-    /// Runs the node: `preProcess`, `internalProcess`, `postProcess`. The caller holds the node's lock.
+    /// Runs the node: `preProcess`, `internalProcess`, `postProcess`. The caller holds the node's lock. Lets
+    /// every exception of the three out; what was fetched by then stays in the inputs until `flush`.
     virtual void process();
 
     /// Does items `begin` to `end` (exclusive) of `rangeToProcess`. A node that reports items overrides it:
@@ -127,15 +129,18 @@ public:
 
     /// The number given to `setPriority`, 0 at first. Nothing in the library reads it.
     std::uint32_t priority() const { return iPriority_; }
+    /// Stores the number that `priority` gives.
     void setPriority(std::uint32_t iPriority) { iPriority_ = iPriority; }
 
     /// The mark of the last traversal, `COLOR_NOT_VISITED` at first.
     teColor color() const { return eColor_; }
+    /// Sets the mark.
     void setColor(teColor eColor) { eColor_ = eColor; }
 
     /// Whether a thread runs the node, or a run threw and the node was not flushed since. What the running
     /// thread wrote before `setProcessing(false)` is visible to who reads false here.
     bool isProcessing() const { return iProcessing_.load(std::memory_order_acquire) > 0; }
+    /// Marks the node as running or idle. Called by the thread that holds the node's lock, and by `flush`.
     void setProcessing(bool bProcessing) {
         iProcessing_.store(bProcessing ? 1 : 0, std::memory_order_release);
     }
@@ -143,41 +148,52 @@ public:
     /// Input number `iInput`, in the order of `addInput`. Not owned. Throws `InternalException`
     /// "Range error: iInput < aInputs_.size()".
     InputConnector* input(std::size_t iInput);
+    /// The same of a const node.
     InputConnector const* input(std::size_t iInput) const;
 
-    /// The first input of that name, or null.
+    /// The first input of that name (byte for byte), or null. Not owned.
     InputConnector* input(std::string const& sName);
+    /// The same of a const node.
     InputConnector const* input(std::string const& sName) const;
 
     /// Output number `iOutput`, in the order of `addOutput`. Not owned. Throws `InternalException`
     /// "Range error: iOutput < aOutputs_.size()".
     OutputConnector* output(std::size_t iOutput);
+    /// The same of a const node.
     OutputConnector const* output(std::size_t iOutput) const;
 
-    /// The first output of that name, or null.
+    /// The first output of that name (byte for byte), or null. Not owned.
     OutputConnector* output(std::string const& sName);
+    /// The same of a const node.
     OutputConnector const* output(std::string const& sName) const;
 
+    /// How many inputs were added, those made of parameters included.
     std::size_t numberOfInputs() const { return aInputs_.size(); }
+    /// How many outputs were added.
     std::size_t numberOfOutputs() const { return aOutputs_.size(); }
+    /// How many parameters the node's set holds.
     std::size_t numberOfParameters() const { return oParameters_.size(); }
 
-    /// Parameter number `iParameter`, in the order of registration. Throws `InternalException`
+    /// Parameter number `iParameter`, in the order of registration. Not owned. Throws `InternalException`
     /// "Range error: iParameter < size()".
     ParameterBase* parameter(std::size_t iParameter);
+    /// The same of a const node.
     ParameterBase const* parameter(std::size_t iParameter) const;
 
-    /// The first parameter of that name, or null.
+    /// The first parameter of that name (byte for byte), or null. Not owned.
     ParameterBase* parameter(std::string const& sName);
+    /// The same of a const node.
     ParameterBase const* parameter(std::string const& sName) const;
 
-    /// All parameters of the node.
+    /// All parameters of the node. The set refers to registered ones without owning them.
     ParameterSet& parameters() { return oParameters_; }
+    /// The same of a const node.
     ParameterSet const& parameters() const { return oParameters_; }
 
     /// Turns a parameter into an input of its name, from which it takes a new value at every run. The input
     /// belongs to the caller, who keeps it for as long as the node lives, and frees it then with
-    /// `ORVODeleter<InputConnector>`. Throws `InternalException` "Enforce pParameter != NULL".
+    /// `ORVODeleter<InputConnector>`. Throws `InternalException` "Enforce pParameter != NULL", and
+    /// "Enforce pInput != NULL" if the parameter makes none.
     InputConnector* convertToConnector(ParameterBase* pParameter);
 
     /// Whether the plain dirty flag of any parameter is set; clears that flag of all of them.

@@ -5,6 +5,7 @@
 
 #include <memory>
 #include <string>
+#include <utility>
 
 namespace ORVO::DataFlow {
 
@@ -37,8 +38,10 @@ public:
         return std::make_shared<IntervalParameter>(value, lower, upper, sName, sDescription);
     }
 
-    /// The smallest and the largest value that make sense.
+    /// The smallest value that makes sense. The reference holds until bounds are taken over or the parameter
+    /// dies.
     T const& lowerBound() const { return lowerBound_; }
+    /// The largest value that makes sense, held as long.
     T const& upperBound() const { return upperBound_; }
 
     bool isInterval() const override { return true; }
@@ -51,14 +54,20 @@ public:
         return spClone;
     }
 
-    /// Takes the value of `oSource` and, if that has bounds, its bounds too. Bounds set no flag.
+    /// Takes the value of `oSource` and, if that has bounds, its bounds too. Bounds set no flag. Throws
+    /// `InternalException` "isOfType<T>()" if its type is another. If it throws, value and bounds stay.
     void setValueFromParameter(ParameterBase const& oSource) override {
-        Parameter<T>::setValueFromParameter(oSource);
-        if (auto const* const pSource = dynamic_cast<IntervalParameter const*>(&oSource);
-            pSource != nullptr && oSource.isInterval()) {
-            lowerBound_ = pSource->lowerBound_;
-            upperBound_ = pSource->upperBound_;
+        auto const* const pSource = dynamic_cast<IntervalParameter const*>(&oSource);
+        if (pSource == nullptr || !oSource.isInterval()) {
+            Parameter<T>::setValueFromParameter(oSource);
+            return;
         }
+        // Copied before the value is set, so that a copy that fails changes nothing.
+        T lowerBound(pSource->lowerBound_);
+        T upperBound(pSource->upperBound_);
+        Parameter<T>::setValueFromParameter(oSource);
+        lowerBound_ = std::move(lowerBound);
+        upperBound_ = std::move(upperBound);
     }
 
 private:

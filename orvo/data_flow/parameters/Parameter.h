@@ -45,10 +45,11 @@ public:
     Parameter& operator=(Parameter const&) = default;
     ~Parameter() override = default;
 
-    /// The constructors, for shared parameters.
+    /// The constructor without a description, for a shared parameter.
     static std::shared_ptr<Parameter> create(T const& value, std::string const& sName) {
         return std::make_shared<Parameter>(value, sName);
     }
+    /// The constructor with a description, for a shared parameter.
     static std::shared_ptr<Parameter> create(T const& value, std::string const& sName,
                                              std::string const& sDescription) {
         return std::make_shared<Parameter>(value, sName, sDescription);
@@ -75,7 +76,8 @@ public:
     /// The value. The reference holds until the value is set or the parameter dies.
     virtual T const& value() const { return value_; }
 
-    /// Stores `value` and sets all dirty flags; does nothing if it equals the value that stands.
+    /// Stores `value` and sets all dirty flags; does nothing if it equals the value that stands. If the copy
+    /// of a T throws, no flag is set.
     virtual void setValue(T const& value) {
         if (value_ == value) {
             return;

@@ -21,7 +21,8 @@ class ParameterVisitorBase;
 /// simple-caching flag to the dirty pass of a frame (`Node::updateDirtyState`), the glyphcast flag to the
 /// client.
 ///
-/// Threads: written between frames by the thread that owns the graph, read by any thread during a frame.
+/// Threads: written between frames by the thread that owns the graph, read by any thread during a frame. A
+/// parameter that an input feeds is written during a frame, under the lock of the input's node.
 class ORVO_API ParameterBase {
 public:
     virtual ~ParameterBase();
@@ -67,14 +68,17 @@ public:
 
     /// Whether the value changed since `setClean`.
     bool isDirty() const { return bDirty_; }
+    /// Clears the plain flag alone.
     void setClean() { bDirty_ = false; }
 
     /// Whether the value changed since `setCleanSimpleCaching`.
     bool isDirtySimpleCaching() const { return bDirtySimpleCaching_; }
+    /// Clears the simple-caching flag alone.
     void setCleanSimpleCaching() { bDirtySimpleCaching_ = false; }
 
     /// Whether the value changed since `setCleanGlyphcast`.
     bool isDirtyGlyphcast() const { return bDirtyGlyphcast_; }
+    /// Clears the glyphcast flag alone.
     void setCleanGlyphcast() { bDirtyGlyphcast_ = false; }
 
 protected:

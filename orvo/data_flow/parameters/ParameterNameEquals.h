@@ -19,6 +19,7 @@ public:
 
     /// Whether the parameter bears exactly the name, byte for byte; false for null.
     bool operator()(ParameterBase const* pParameter) const;
+    /// The same for an element of a set.
     bool operator()(std::shared_ptr<ParameterBase> const& spParameter) const;
 
 private:

@@ -49,12 +49,18 @@ public:
         insertClones(container(itFirst, itLast));
     }
 
+    /// The elements in the order of insertion. Invalidated by whatever changes the set.
     iterator begin() { return aParameters_.begin(); }
+    /// Behind the last element.
     iterator end() { return aParameters_.end(); }
+    /// The same of a const set.
     const_iterator begin() const { return aParameters_.begin(); }
+    /// Behind the last element.
     const_iterator end() const { return aParameters_.end(); }
 
+    /// The number of elements.
     std::size_t size() const { return aParameters_.size(); }
+    /// Lets go of all elements, which live on with their other holders.
     void clear() { aParameters_.clear(); }
 
     /// Exchanges the elements, which stay shared with their other holders.

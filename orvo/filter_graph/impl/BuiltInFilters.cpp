@@ -1,12 +1,17 @@
 #include "orvo/filter_graph/impl/FilterFactory.h"
 #include "orvo/filter_graph/impl/FilterGraphLibrary.h"
 #include "orvo/filter_graph/internal/ImageFlowFilterWrapper.h"
+#include "orvo/image_flow/ImageFlowLibrary.h"
 
 namespace ORVO::FilterGraph {
 
 namespace {
 
-Identifier colourTransformIdentifier() { return {"VantleFilterGPU", "ImageFlow", "Norvane", 1}; }
+// The name space and the vendor under which the image-flow layer registers the node.
+Identifier colourTransformIdentifier() {
+    return {"VantleFilterGPU", ImageFlow::Library::imageFlowNamespace(), ImageFlow::Library::norvaneVendor(),
+            1};
+}
 
 } // namespace
 

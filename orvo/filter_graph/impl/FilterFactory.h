@@ -65,6 +65,7 @@ public:
     IFilterIterator prototypes();
     IFilterConstIterator prototypes() const;
 
+    /// The number of prototypes, each version counted.
     std::size_t numberOfPrototypes() const;
 
 private:

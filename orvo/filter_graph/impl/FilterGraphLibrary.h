@@ -59,6 +59,7 @@ public:
     /// layers.
     static void terminate();
 
+    /// Whether the library is up.
     static bool isInitialized();
 
     /// The options of the last `initialize`.
@@ -99,7 +100,10 @@ private:
     bool armed_;
 };
 
-/// The number of threads over which the rows of an image are spread, for all controllers of the process.
+/// Sets the number of threads over which the rows of an image are spread, the frame's own included, for all
+/// controllers of the process. 0 counts as 1; more than the scheduler offers gives all that it offers.
+///
+/// Threads: any; a frame that runs takes it over with its next node.
 ORVO_API void setNumberOfThreads(std::size_t nThreads);
 
 } // namespace ORVO::FilterGraph

@@ -41,6 +41,7 @@ public:
     virtual IFilter* getIFilter() = 0;
     virtual IFilter const* getIFilter() const = 0;
 
+    /// The mode that the adapter was created with.
     virtual eRegionSyncMode mode() = 0;
 
 protected:

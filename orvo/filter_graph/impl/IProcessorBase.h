@@ -18,7 +18,9 @@ namespace ORVO::FilterGraph {
 /// the first frame was prepared. `frameStatus`, `waitForFrame` and `cancelFrame` rethrow, as a
 /// `SharedException`, what a worker thread of an asynchronous frame threw.
 ///
-/// Threads: one at a time for each processor; completion callbacks come from the thread that ends the frame.
+/// Threads: one at a time for each processor, but `frameStatus` and `cancelFrame` may be called from other
+/// threads while a frame runs or is waited for; completion callbacks come from the thread that ends the
+/// frame.
 class ORVO_API IProcessorBase {
 public:
     using OptimizationOptions = FilterGraph::OptimizationOptions;

@@ -58,7 +58,8 @@ public:
 
     bool isPinned() const { return bPinned_; }
 
-    /// Appends an item and takes ownership of it.
+    /// Appends an item and takes ownership of it; it dies here if it cannot be appended.
+    /// @throws InternalException "Enforce pItem != NULL" for null.
     void addMetadataItem(MetadataItemBase const* pItem);
 
     /// The metadata items in the order in which they were added.
@@ -86,6 +87,7 @@ protected:
     void setData(std::shared_ptr<DataFlow::ParameterBase> const& spData) { spData_ = spData; }
 
     /// Appends clones of all metadata items to another parameter.
+    /// @throws InternalException "Enforce pTarget != NULL" for null.
     void cloneMetadata(ParameterBase* pTarget) const;
 
     /// @throws InternalException "Data type retrieved must match parameter exactly" unless `type` is the

@@ -107,7 +107,9 @@ void Filter::assign(Filter const& other) {
     color = 0;
     pParameterSet_ = std::move(parts.parameterSet);
     ownedParameters_ = std::move(parts.parameters);
+    int const ownTimeStamp = timeStamp;
     releaseInputs();
+    timeStamp = ownTimeStamp; // which the lost connections moved
     pInputSet_ = std::move(parts.inputSet);
     ownedInputs_ = std::move(parts.inputs);
     pOutput_ = std::move(parts.output);

@@ -68,6 +68,7 @@ public:
     bool canBuildFilterExecutable(TargetPlatform target) const override;
 
 protected:
+    /// Sets the identity of the filter's type.
     virtual void setIdentifier(Identifier const& identifier);
 
 public:
@@ -129,6 +130,7 @@ protected:
     Filter(Filter const& other);
 
     /// Disconnects this filter and makes it a copy of the other, see `assign`. Owned parameters are deleted.
+    /// The time stamps of its old producers move, its own stays.
     Filter& operator=(Filter const& other);
 
     /// Takes over identity, parameters, inputs, output and metadata as clones, and the other's time stamp as

@@ -56,8 +56,8 @@ class OutputAdapter;
 /// that a later one would take.
 ///
 /// Threads: the host's thread; `returnStuff` and the completion callback of an asynchronous frame run on the
-/// thread that ends it. `cancelFrame` and `isProcessingComplete` may be called from any thread while a frame
-/// runs.
+/// thread that ends it. `cancelFrame`, `checkException` and `isProcessingComplete` may be called from any
+/// thread while a frame runs.
 class ORVO_API GraphExecutable {
 public:
     using OptimizationOptions = IProcessorBase::OptimizationOptions;
@@ -188,7 +188,7 @@ private:
     std::vector<ImageFilter*> aFanOutNodes_;              // those among them with more than one output
 
     bool bFrameOut_ = false;                         // an asynchronous frame was launched and not waited for
-    bool bLastFrameBroken_ = false;                  // the last frame threw, or failed on its thread
+    std::atomic<bool> bLastFrameBroken_{false};      // the last frame threw, or failed on its thread
     std::atomic<bool> bCancelled_{false};            // a cancel was asked for since the last launch
     std::atomic<std::thread::id> oCallbackThread_{}; // the thread that is inside the completion callback
 };

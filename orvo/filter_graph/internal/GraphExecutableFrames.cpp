@@ -259,6 +259,7 @@ bool GraphExecutable::internalCompletionCallback(void* self) {
     auto* const pExecutable = static_cast<GraphExecutable*>(self);
     try {
         if (pExecutable->drawsIntoTexture()) {
+            ScopedGraphContext const current(pExecutable->spContext_);
             OGL::finishCurrentContext();
         }
         pExecutable->returnStuff();

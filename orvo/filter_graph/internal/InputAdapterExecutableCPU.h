@@ -20,7 +20,8 @@ public:
 
     /// Hands the adapter's image, its pixel extent and its domain of definition (world space) to the source.
     /// The source counts as changed unless the image bears a content stamp and image and stamp are those of
-    /// the last frame.
+    /// the last frame. Throws InternalException "Enforce image_ != NULL" if the region is that of an image
+    /// and there is none.
     void forwardStuff() override;
 
     /// The source's region of interest (world space) goes back to the adapter.

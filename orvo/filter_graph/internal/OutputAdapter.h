@@ -21,6 +21,7 @@ public:
     explicit OutputAdapter(eRegionSyncMode mode);
     ~OutputAdapter() override;
 
+    /// A new sink without an image.
     static std::shared_ptr<OutputAdapter> create(eRegionSyncMode mode);
 
     /// Binds an image and makes its channel count the demand of the input.
@@ -50,6 +51,7 @@ public:
     /// A copy with the same mode, without image and regions.
     std::shared_ptr<Filter> clone() override;
 
+    /// The end of the compiled graph, whatever the target.
     std::shared_ptr<IFilterExecutable> buildFilterExecutable(TargetPlatform target,
                                                              GraphExecutable& graphExecutable) override;
 

@@ -25,10 +25,11 @@ public:
     /// Binds the client's image to the sink, or unbinds what was bound if the image has no pixels, and sets
     /// the sink's pixel extent, its region of interest (world space) and its output precision, which follows
     /// the channel type of the client's image. Throws InternalException "Enforce pSink_ != NULL" before
-    /// `bind`.
+    /// `bind`, and "Enforce image_ != NULL" without an image.
     void forwardStuff() override;
 
-    /// The sink's domain of definition (world space) goes back to the adapter.
+    /// The sink's domain of definition (world space) goes back to the adapter. Throws InternalException
+    /// "Enforce pSink_ != NULL" before `bind`.
     void returnStuff() override;
 
     DataFlow::InputConnector* getImageFlowInputConnector(std::string const& name) override;
@@ -36,7 +37,7 @@ public:
     DataFlow::OutputConnector* cloneImageFlowOutputConnector() override;
     DataFlow::OutputConnector* getClonedImageFlowOutputConnector(std::size_t index) override;
 
-    /// Where the client's image lives.
+    /// Where the client's image lives. Throws InternalException "Enforce image_ != NULL" without an image.
     TargetPlatform getInputTargetPlatform() override;
 
     /// `ORVO_TARGET_UNSET`: there is no output.

@@ -68,8 +68,11 @@ protected:
     /// Source and destination.
     using Pair = std::pair<DataFlow::ParameterBase const*, DataFlow::ParameterBase*>;
 
+    /// Copies the value of one pair.
+    /// @throws InternalException "isOfType<T>()" if the two are of different types.
     static void doForward(Pair const& pair);
 
+    /// Runs the children in the order in which they were added.
     void forwardChildren();
 
 private:

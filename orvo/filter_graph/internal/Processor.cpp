@@ -49,7 +49,8 @@ IOutputAdapter* Processor::output() { return pOriginalGraph_; }
 // ---- Status
 
 IProcessorBase::eFrameStatus Processor::frameStatus() {
-    if (frameStatus_ == FRAME_RUNNING || frameStatus_ == FRAME_CANCELLED) {
+    eFrameStatus const eStatus = frameStatus_;
+    if (eStatus == FRAME_RUNNING || eStatus == FRAME_CANCELLED) {
         ORVO_ENFORCE(spGraphExecutable_);
         if (spGraphExecutable_->isProcessingComplete()) {
             frameStatus_ = FRAME_COMPLETE;

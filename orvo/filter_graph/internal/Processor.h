@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <map>
 #include <memory>
 #include <vector>
@@ -38,7 +39,8 @@ class OutputAdapter;
 /// If the client graph has a cycle or an unconnected input, the frame fails and the graph can be repaired and
 /// run again: the marks of the failed walk are taken back.
 ///
-/// Threads: the host's thread. `frameStatus` may be polled from another thread while no other operation runs.
+/// Threads: the host's thread. While a frame runs, or is waited for, `frameStatus` and `cancelFrame` may be
+/// called from other threads too.
 class ORVO_API Processor : public IEmbeddedProcessor {
 public:
     /// `pGraph` is the end of the client graph, `context` may be null. Neither is owned, and both must
@@ -133,7 +135,7 @@ private:
     std::vector<std::shared_ptr<ParameterForwarder>> aChildForwarders_;
     std::shared_ptr<GraphExecutable> spGraphExecutable_;
     IAdapter::eRegionSyncMode regionSyncMode_;
-    eFrameStatus frameStatus_;
+    std::atomic<eFrameStatus> frameStatus_;
     OGL::Context const* context_;
     CheckTimeStampVisitor::Memory
         aTimeStamps_;               // of the last walk that compared clones_ with the client graph

@@ -86,8 +86,11 @@ Hint hintOf(ImageGPU::tePixelFormat format) {
     return static_cast<Hint>(format % 4);
 }
 
-Hint hintOfSink(ImageFilter const& sink) {
-    void const* const pData = sink.imageOutput()->data();
+/// The precision of the image on the sink's output.
+Hint hintFrom(ImageFilter const& sink) {
+    DataFlow::OutputConnector const* const pOutput = sink.imageOutput();
+    ORVO_CHECK(pOutput != nullptr && pOutput->hasData(), "(pSink->imageOutput()->hasData()) == true");
+    void const* const pData = pOutput->data();
     if (sink.getOutputTargetPlatform() == ORVO_TARGET_GL) {
         auto const* const imGPU = static_cast<ImageGPU const*>(pData);
         ORVO_CHECK(imGPU != nullptr, "imGPU != NULL");
@@ -272,6 +275,7 @@ void ImageFlowController::propagateDODs() {
 void ImageFlowController::propagateROIs(PositionExtentInWorldSpace const& region) {
     ImageFilter* const pSink = imageSink();
     ORVO_ENFORCE(pSink, "imageSink()");
+    pSink->setRegionOfInterest(region);
     DFSPostStackVisitor visitor;
     depthFirstSearch(visitor);
     for (ImageFilter* pImageFilter : visitor.stack()) {
@@ -280,7 +284,6 @@ void ImageFlowController::propagateROIs(PositionExtentInWorldSpace const& region
         // wrongly.
         pImageFilter->clearParentROIs();
     }
-    pSink->setRegionOfInterest(region);
     for (auto iter = visitor.stack().rbegin(); iter != visitor.stack().rend(); ++iter) {
         (*iter)->computeUnionOfParentROIs();
         (*iter)->computeAndSetChildROIs();
@@ -352,6 +355,8 @@ void ImageFlowController::depthFirstVisit(Node* node) {
             }
         } else {
             aWay.pop_back();
+            // A visitor that began a walk of its own has ended this one.
+            ORVO_ENFORCE(pVisitor_);
             pVisitor_->postVisitImageNode(pImageFilter);
         }
     }
@@ -367,6 +372,7 @@ void ImageFlowController::breadthFirstSearch(Visitor& visitor) {
     while (!aQueue.empty()) {
         Node* const pNode = aQueue.front();
         ImageFilter* const pImageFilter = pNode->asImageFilter();
+        ORVO_ENFORCE(pVisitor_);
         pVisitor_->preVisitImageNode(pImageFilter);
         std::size_t const nInputs = pImageFilter == nullptr ? 0 : pImageFilter->numberOfImageInputs();
         for (std::size_t iInput = 0; iInput < nInputs; ++iInput) {
@@ -378,6 +384,7 @@ void ImageFlowController::breadthFirstSearch(Visitor& visitor) {
         }
         aQueue.pop_front();
         pNode->setColor(Node::COLOR_FINISHED);
+        ORVO_ENFORCE(pVisitor_);
         pVisitor_->postVisitImageNode(pImageFilter);
     }
 }
@@ -397,23 +404,33 @@ std::vector<ImageFilter*> ImageFlowController::filtersProducersFirst() {
 void ImageFlowController::setNodeImageDescriptorInfo(bool fromSink) {
     ImageFilter* const pSink = imageSink();
     ORVO_ENFORCE(pSink);
+    if (fromSink) {
+        setPrecisionFrom(*pSink);
+        return;
+    }
     DataFlow::OutputConnector const* const pOutput = pSink->imageOutput();
     bool const bSinkHasData = pOutput != nullptr && pOutput->hasData();
-    if (!fromSink) {
-        for (auto iter = nodesBegin(); iter != nodesEnd(); ++iter) {
-            ImageFilter* const iff = (*iter)->asImageFilter();
-            ORVO_CHECK(iff != nullptr, "iff!=0");
-            if (bSinkHasData) {
-                return;
-            }
-            iff->setImageDescInfoFromSource(true);
+    for (auto iter = nodesBegin(); iter != nodesEnd(); ++iter) {
+        ImageFilter* const iff = (*iter)->asImageFilter();
+        ORVO_CHECK(iff != nullptr, "iff!=0");
+        if (bSinkHasData) {
+            return;
         }
-        return;
+        iff->setImageDescInfoFromSource(true);
+    }
+}
+
+void ImageFlowController::setPrecisionFrom(ImageFilter const& sink) {
+    Hint hint = ImageFilter::OUTPUT_PRECISION_DEFAULT;
+    // All is checked before the first node changes.
+    for (auto iter = nodesBegin(); iter != nodesEnd(); ++iter) {
+        ImageFilter const* const iff = (*iter)->asImageFilter();
+        ORVO_CHECK(iff != nullptr, "iff!=0");
+        hint = hintFrom(sink);
     }
     for (ImageFilter* iff : filtersProducersFirst()) {
         ORVO_CHECK(iff != nullptr, "iff!=0");
-        ORVO_CHECK(bSinkHasData, "(pSink->imageOutput()->hasData()) == true");
-        iff->computeImageDescriptorInfo(hintOfSink(*pSink));
+        iff->computeImageDescriptorInfo(hint);
     }
 }
 

@@ -30,19 +30,23 @@ class Visitor;
 /// All walks keep their stack on the heap and are linear in nodes and connections, so graphs may be of any
 /// depth. Failures are `InternalException`s with the stated texts.
 ///
-/// Threads: walks, wiring and `process` by one thread at a time, between frames. While an asynchronous frame
-/// runs, its context is current on the frame's thread and must be on no other; it is released before the
-/// completion callback.
+/// Nodes and visitors stay their owners'; nodes must outlive the frames.
+///
+/// Threads: as `DataFlow::Controller`; walks, passes and `process` by the thread that owns the controller,
+/// between frames, and one at a time. While an asynchronous frame runs, its context is current on the frame's
+/// thread and must be on no other; it is released before the completion callback.
 class ORVO_API ImageFlowController : public DataFlow::Controller {
 public:
+    /// A controller without nodes and without a sink.
     ImageFlowController();
+    /// Cancels a frame that still runs and waits for its end.
     ~ImageFlowController() override;
 
     /// `setNodeImageDescriptorInfo(false)`, then a synchronous frame. Throws `OGL::ExceptionOGL` "Processing
     /// failure due to OpenGL error" (with the code 0) for an OpenGL error that is pending before the frame,
     /// which then is not run, or after it. Whatever is thrown, no error is pending afterwards.
     void process() override;
-    /// `setNodeImageDescriptorInfo(false)`, then an asynchronous frame.
+    /// `setNodeImageDescriptorInfo(false)`, then an asynchronous frame. Throws what these throw.
     void processAsync() override;
     /// As the base's. If that collected the frame, throws `OGL::ExceptionOGL` "Processing failure due to
     /// OpenGL error" (with the code 0) for an OpenGL error that the frame left behind, which is pending no
@@ -79,20 +83,30 @@ public:
     /// Each throws "Enforce imageSink() != NULL" without a sink, and "Enforce pOutput != NULL" or
     /// "Enforce pSource != NULL" where an image input of a reached node is unconnected.
     /// @{
+    /// Computes the pixel extents (world units a pixel) of every node that the sink reaches.
     void propagatePixelExtents();
+    /// Computes the DOD (world) of every node that the sink reaches.
     void propagateDODs();
     /// Asks the sink for `region` (world) and sets the ROI of every node that it reaches, then the compute
     /// region of every image node of the graph: DOD intersected with ROI. Regions left by a failed pass are
     /// forgotten first. Throws "Output region can't be infinite." at the first node whose compute region is
-    /// infinite; an undefined or empty one is not refused.
+    /// infinite: that node has its new region by then, the nodes after it in the list keep their old one. An
+    /// undefined or empty region is not refused. Throws "aParentROIs_.size() ==
+    /// totalNumberOfAllImageOutputs()" where an output of a reached node has no consumer that is reached.
+    /// After any failure ROIs are left as far as they came; the next pass sets them anew.
     void propagateROIs(PositionExtentInWorldSpace const& region);
     /// Pixel extents, DODs and ROIs, in this order.
     void computeRegions(PositionExtentInWorldSpace const& region);
+    /// Updates the dirty state of every node that the sink reaches, producers first.
     void setDirtyState();
     /// @}
 
     /// \name Walks
-    /// Nodes that the sink does not reach are not visited; a cycle ends at the first node met again.
+    /// Nodes that the sink does not reach are not visited; a cycle ends at the first node met again. Each
+    /// throws "Enforce imageSink() != NULL", "Enforce pOutput != NULL", "Enforce pSource != NULL" as the
+    /// passes do, and what the visitor throws. The visitor is forgotten at the end of a walk, also of a
+    /// failed one; a walk that a visitor begins on the same controller ends its own: "Enforce pVisitor_ !=
+    /// NULL".
     /// @{
 
     /// Pre-visit on entering a node, then its producers in input order, then post-visit. Afterwards the
@@ -107,21 +121,24 @@ public:
     /// False: unless the sink's output holds an image (the formats were fixed from it), every node takes its
     /// format from its first input's image.
     ///
-    /// Throws "Enforce pSink != NULL" without a sink, "iff!=0" where a node is no image node,
-    /// "(pSink->imageOutput()->hasData()) == true" where the sink's output holds no image, "Not implemented:
-    /// ImageCPU Pixel format not supported" for BGR8, BGRA8, half and undefined formats of that image, and
-    /// "Not implemented: ImageGPU Pixel format not supported" for the undefined one.
+    /// Throws "Enforce pSink != NULL" without a sink and "iff!=0" where a node is no image node. With true
+    /// also "(pSink->imageOutput()->hasData()) == true" where the sink's output holds no image, "Not
+    /// implemented: ImageCPU Pixel format not supported" for BGR8, BGRA8, half and undefined formats of that
+    /// image, "Not implemented: ImageGPU Pixel format not supported" for the undefined one, "Enforce pOutput != NULL" and "Enforce pSource != NULL" as the passes do, no node having
+    /// changed by then, and what `ImageFilter::computeImageDescriptorInfo` throws.
     void setNodeImageDescriptorInfo(bool fromSink);
 
 protected:
     /// If there is a context: makes it current, with texture unit 0 active and its 2D texturing enabled.
     /// Throws `OGL::ExceptionOGL`.
     void prepareOGLForProcess();
-    /// The depth-first walk from one node, with the visitor and the colours as they stand.
+    /// The depth-first walk from one node, with the visitor and the colours as they stand, for visitors that
+    /// walk on by themselves. Throws "Enforce pVisitor_ != NULL" outside a walk.
     void depthFirstVisit(DataFlow::Node* node);
 
 private:
     void determineComputeRegions();
+    void setPrecisionFrom(ImageFilter const& sink);
     void clearColors();
     std::vector<ImageFilter*> filtersProducersFirst();
 

@@ -14,6 +14,7 @@ namespace ORVO {
 /// Threads: as `ImageFilter`; slices touch only their own rows.
 class ORVO_API ConvertFromSIMDOptimized : public ImageFilter {
 public:
+    /// An unconnected node with the default precision hint.
     ConvertFromSIMDOptimized();
     ~ConvertFromSIMDOptimized() override;
 
@@ -21,7 +22,8 @@ public:
     void allocateOutputImage() override;
     /// As the base. Throws "pOutputImage_" where there is no output image then.
     void prepareForRender() override;
-    /// Rows `begin` to `end` (exclusive), counted from the top of the output region.
+    /// Rows `begin` to `end` (exclusive), counted from the top of the output region. Any
+    /// thread of the frame, each its own rows.
     void processSlice(std::size_t begin, std::size_t end) override;
 
 private:

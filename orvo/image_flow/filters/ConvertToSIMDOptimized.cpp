@@ -34,6 +34,7 @@ void ConvertToSIMDOptimized::allocateOutputImage() {
 }
 
 void ConvertToSIMDOptimized::createOutputImage() {
+    spOutputImage_.reset();
     ImageCPU const* const pInput = oInput_.get();
     ImageCPU::tePixelFormat const format =
         getImageDescInfoFromSource() && pInput != nullptr

@@ -49,15 +49,14 @@ public:
     /// @param destination where the result goes. Borrowed for the call.
     /// @param rangeSigma in units of intensity. At or below 0.05, or NaN, the image passes unsmoothed.
     /// @param sigmaX, sigmaY in pixels. Where 2.146 sigma is at most 1 and the direct filter runs, or where a
-    /// sigma is
-    ///        NaN or negative, the image passes unsmoothed.
+    /// sigma is NaN or negative, the image passes unsmoothed. The direct filter reaches no further than 4096
+    /// pixels.
     /// @param colorize true to smooth L, a and b; false for a grey result.
     /// @return true, or false if the callback stopped the work; rows written by then stay written.
     /// @throws InternalException "Enforce source != NULL", "Enforce destination != NULL", and "Invalid input
-    /// image type"
-    ///         where an accessor of the library stands on a format that it does not serve; then nothing was
-    ///         written.
-    ///         @throws std::bad_alloc. Exceptions of a caller's own accessor pass through.
+    /// image type" where an accessor of the library stands on a format that it does not serve;
+    /// ParameterException where a channel of the destination in floats takes 4 GiB or more. Nothing was
+    /// written then. std::bad_alloc; exceptions of a caller's own accessor pass through.
     bool applyFilter(ImageReadAccessor* source, ImageWriteAccessor* destination, float rangeSigma,
                      float sigmaX, float sigmaY, bool colorize);
 

@@ -2,11 +2,9 @@
 
 #include "orvo/core/math/Float.h"
 #include "orvo/image_flow/filters/bilateral/SimpleBilateral.h"
-#include "orvo/image_runtime/kernels/Rows.h"
 
 #include <cmath>
 #include <utility>
-#include <vector>
 
 namespace ORVO {
 
@@ -52,24 +50,7 @@ PositionExtentInWorldSpace SimpleBilateralFilterCPU::changed(PositionExtentInWor
 void SimpleBilateralFilterCPU::processSlice(std::size_t begin, std::size_t end) {
     ImageFlow::bilateral::SimpleBilateral const filter(oSpatialSigma_.value(), oRangeSigma_.value(),
                                                        oColorize_.value());
-    ImageCPU& output = *spOutputImage_;
-    ImageFlow::bilateral::PixelWindow window(*oInputImage_, filter.halfWindow());
-    PositionInPixelSpace const corner = oOutputRegionInPixels_.position();
-    int const width = oOutputRegionInPixels_.extent().width();
-    std::vector<float> aRow(4 * static_cast<std::size_t>(width));
-    for (std::size_t row = begin; row < end; ++row) {
-        int const y = corner.y() + static_cast<int>(row);
-        window.moveTo(y);
-        for (int column = 0; column < width; ++column) {
-            float4 const pixel = filter.resultAt(window, corner.x() + column);
-            float* const pPixel = aRow.data() + 4 * static_cast<std::size_t>(column);
-            pPixel[0] = pixel.x;
-            pPixel[1] = pixel.y;
-            pPixel[2] = pixel.z;
-            pPixel[3] = pixel.w;
-        }
-        ImageRuntime::writeRowFromRGBAFloat(output, y, corner.x(), corner.x() + width, aRow.data());
-    }
+    filter.filterRows(*oInputImage_, *spOutputImage_, oOutputRegionInPixels_, begin, end);
 }
 
 } // namespace ORVO

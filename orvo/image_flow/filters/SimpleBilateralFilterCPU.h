@@ -16,7 +16,13 @@ namespace ORVO {
 ///
 /// Parameters: "spatialSigma" (float, in pixels, 0 to 100, default 0.1), "rangeSigma" (float, in units of
 /// intensity, 0 to 1, default 0.1), "colorize" (bool, default false: grey result). The window reaches
-/// trunc(ceil(2.146 spatialSigma)) / 2 pixels from its centre. The alpha of the result is 0.
+/// trunc(ceil(2.146 spatialSigma)) / 2 pixels from its centre, and never further than 4096. The alpha of the
+/// result is 0.
+///
+/// Results are those of the formulas in single precision; with vector instructions (see
+/// ImageRuntime::activeInstructionSet()) they differ from those by at most 1e-6 times the largest neighbour,
+/// before they are clamped and truncated to the format of the output. Outside the input, where all weights
+/// may be tiny, they agree less closely.
 ///
 /// Neighbours: a coordinate that is negative, or not below the width (height), counts as the width (height)
 /// itself, and the pixel is then found by y * width + x among the pixels of the image in row order: beyond

@@ -118,9 +118,9 @@ bool ImageFilter::willRunInHardware() { return false; }
 bool ImageFilter::isSIMD() const { return false; }
 
 void ImageFilter::setBoundOutputImage(ImageBase* image) {
-    ORVO_ENFORCE(pImageOutput_);
     ImageBase* const p = image;
     ORVO_CHECK(p == nullptr || outputTarget_ == p->targetPlatform(), "outputTarget_ == p->targetPlatform()");
+    ORVO_ENFORCE(pImageOutput_);
     // The connectors keep the address of the typed object.
     void const* const pData = dataOf(p, outputTarget_);
     // An image taken earlier may be the one that was bound until now.

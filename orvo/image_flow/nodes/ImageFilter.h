@@ -36,9 +36,9 @@ class ImageGPU;
 /// - domain of definition (DOD): the world rectangle where the output has content; undefined means none
 /// known;
 /// - region of interest (ROI): the world rectangle that the consumers ask for;
-/// - compute region: DOD intersected with ROI, what the node computes and what its output image covers. It
-/// may be
-///   undefined or empty (nothing is computed); an infinite one is refused by the controller.
+/// - compute region: DOD intersected with ROI (world), what the node computes and what its output image
+/// covers.
+///   It may be undefined or empty (nothing is computed); an infinite one is refused by the controller.
 ///
 /// A subclass sets `inputTarget_` and `outputTarget_`, makes its connectors, and calls `addImageInput` and
 /// `setImageOutput` in its constructor. It implements `processSlice` (rows of the output image, counted from
@@ -78,6 +78,7 @@ public:
     void debugWrite(std::ostream& stream) const override;
     /// Drops the output image in the making and the prepared state, then what `Node::flush` drops.
     void flush() override;
+    /// This node.
     ImageFilter const* asImageFilter() const override;
     ImageFilter* asImageFilter() override;
     /// Width (units), height (items) and 0, of the output region in pixels; all zero where it is empty or
@@ -102,8 +103,8 @@ public:
     /// input.
     virtual PositionExtentInWorldSpace computeDomainOfDefinition();
     /// Hands `needed` of the own ROI to the producer of each image input, by `setParentROI`, in index order.
-    /// Throws as `computeDomainOfDefinition`; nothing is handed on then by the inputs from the failing one
-    /// on.
+    /// Throws as `computeDomainOfDefinition`, with nothing handed on, and as `setParentROI`, the inputs
+    /// before the failing one having handed on.
     virtual void computeAndSetChildROIs();
     /// The world rectangle that the node fills without any input. Base: the region of `setGeneratedRegion`.
     virtual PositionExtentInWorldSpace generated(RegionMap const& inputDODs);
@@ -126,7 +127,8 @@ public:
     /// "Enforce pImageOutput_ != NULL" where the node has no image output.
     virtual void setBoundOutputImage(ImageBase* image);
     /// Allocates the output image unless that has been done since the last run. A client may call it before
-    /// the frame; `internalProcess` calls it in any case.
+    /// the frame; `internalProcess` calls it in any case. Throws as `allocateOutputImage`; the node is not
+    /// prepared then.
     virtual void prepareForRender();
     /// Computes `oOutputRegionInPixels_` from "ComputeRegion", and, on the CPU, sees that `spOutputImage_`
     /// holds an image: the bound one, the one that is there, or a new one that covers the region, in the
@@ -151,7 +153,8 @@ public:
     /// \name Connectors
     /// @{
 
-    /// Throws "Range error: iImageInput < numberOfImageInputs()".
+    /// The image inputs in the order of `addImageInput`. Throws "Range error: iImageInput <
+    /// numberOfImageInputs()".
     DataFlow::InputConnector* imageInput(std::size_t iImageInput);
     DataFlow::InputConnector const* imageInput(std::size_t iImageInput) const;
     /// The first input of that name; null if there is none.
@@ -160,11 +163,14 @@ public:
     /// The true image output; null for sinks.
     DataFlow::OutputConnector* imageOutput();
     DataFlow::OutputConnector const* imageOutput() const;
+    /// Inputs that carry images; parameter inputs do not count.
     std::size_t numberOfImageInputs() const;
     /// 1 if there is a true image output, else 0.
     std::size_t numberOfImageOutputs_DEPRECATED_1_0() const;
+    /// Outputs made by `cloneImageOutput`.
     std::size_t numberOfClonedImageOutputs() const;
-    /// Throws "Range error: iImageOutput < numberOfClonedImageOutputs()".
+    /// The clones in the order in which they were made. Throws "Range error: iImageOutput <
+    /// numberOfClonedImageOutputs()".
     DataFlow::OutputConnector* clonedImageOutput(std::size_t iImageOutput);
     DataFlow::OutputConnector const* clonedImageOutput(std::size_t iImageOutput) const;
     /// A further output, owned by the node, that bears the true output's name, shares its object after each
@@ -175,7 +181,9 @@ public:
 
     /// \name Regions
     /// @{
+    /// Stores what `domainOfDefinition` answers (world).
     void setDomainOfDefinition(PositionExtentInWorldSpace const& region);
+    /// Stores what `regionOfInterest` answers (world).
     void setRegionOfInterest(PositionExtentInWorldSpace const& region);
     /// Adds the region (world) that one consumer asks for. Throws
     /// "aParentROIs_.size() < totalNumberOfAllImageOutputs()" when more arrive than the node has outputs.
@@ -183,7 +191,8 @@ public:
     /// Forgets the regions that consumers asked for.
     void clearParentROIs();
     /// Makes the ROI the union of the consumers' regions and forgets these; without any, the ROI stays.
-    /// Throws "aParentROIs_.size() == totalNumberOfAllImageOutputs()" unless there is one for each output.
+    /// Throws "aParentROIs_.size() == totalNumberOfAllImageOutputs()" unless there is one for each output,
+    /// with nothing changed.
     void computeUnionOfParentROIs();
     /// The parameter "ComputeRegion". Throws "Enforce spComputeRegion_.get() != NULL".
     DataFlow::Parameter<PositionExtentInWorldSpace>& computeRegionParameter();
@@ -198,7 +207,9 @@ public:
     void computePixelExtents();
     /// @}
 
+    /// Where the images of the inputs live; `ORVO_TARGET_UNSET` where the subclass does not say.
     TargetPlatform getInputTargetPlatform() const;
+    /// Where the image of the output lives; `ORVO_TARGET_UNSET` where the subclass does not say.
     TargetPlatform getOutputTargetPlatform() const;
     /// The controller that runs the node, which is the one of the image layer; null before it was added to
     /// one.
@@ -206,6 +217,7 @@ public:
 
     /// True: the format of the output image follows that of the first input's image.
     void setImageDescInfoFromSource(bool fromSource);
+    /// Whether it does; false at first.
     bool getImageDescInfoFromSource() const;
     /// Replaces a default precision hint by `hint` and derives the channel count from the producer of input
     /// 0, where nothing else fixes it; the producer must have done so before. Throws "Enforce pOutput !=
@@ -218,7 +230,9 @@ protected:
     /// Sets the true image output; it stays the subclass's. On the CPU it is an `OutputTemplate<ImageCPU>`,
     /// on the GPU an `OutputTemplate<ImageGPU>`.
     void setImageOutput(DataFlow::OutputConnector* output);
+    /// Whether `prepareForRender` has prepared the next run.
     bool preparedForRender() const;
+    /// The pixel extents (world units a pixel) of the last pixel extent pass; never null.
     std::shared_ptr<InputOutputImagePixelExtentSet> const& spPixelExtentSet() const;
 
     /// The pixel extent (world units a pixel) of the image output; (1, 1) before the pixel extent pass.
@@ -241,7 +255,13 @@ protected:
     /// Whether `spOutputImage_` holds an image that covers `oOutputRegionInPixels_`.
     bool hasOutputImage() const;
 
+    /// Prepares, runs the slices, and hands the image to the output if that has a consumer; otherwise the
+    /// image dies, unless it is the client's. Throws as `prepareForRender` and
+    /// `DataFlow::Controller::processSlices`, and "Enforce pController != NULL" before the node was added to
+    /// a controller.
     void internalProcess() override;
+    /// Lets the clones share the true output's image, then drops the inputs' data. Throws "false" where there
+    /// is a clone and the output does not live on the CPU.
     void postProcess() override;
 
     PositionExtentInWorldSpace oDomainOfDefinition_;

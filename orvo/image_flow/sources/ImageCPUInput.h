@@ -13,15 +13,18 @@ class ImageRegionCopy;
 /// output is bound. Then it writes its compute region into the bound image, as far as its own image covers
 /// it, converting the channel type and the order of the channels. The image survives a flush of the graph.
 ///
-/// Throws `InternalException` with the stated texts, and `ParameterException` where a bound output has
-/// another number of channels than the image.
+/// Failures are `InternalException`s with the stated texts. A run with a bound output throws also "No
+/// ImageCPU set yet.", and `ParameterException` "Source and bound output image differ in their channels"
+/// where the two have another number of channels; the bound image is untouched then.
 ///
 /// Threads: setters and loaders by the client's thread, between frames.
 class ORVO_API ImageCPUInput : public ImageFilter {
 public:
+    /// A source without an image that has nothing to emit.
     ImageCPUInput();
     ~ImageCPUInput() override;
 
+    /// Lets the source run once more.
     void emit() override;
     /// True.
     bool canEmit() const override;
@@ -39,7 +42,9 @@ public:
 
     /// \name The client's image
     /// Each setter throws "ImageCPU already set on input" where an image set by `setImageCPU` has not been
-    /// released or cleared; the image given stays the caller's then. Null takes the image away.
+    /// released or cleared; the image given stays the caller's then. Where memory runs out
+    /// (`std::bad_alloc`), the image before stays, and an image that was to be owned is destroyed. Null takes
+    /// the image away.
     /// @{
 
     /// The source owns the image and destroys it when it is replaced.
@@ -52,6 +57,7 @@ public:
     /// "wasReleased" while an output or a consumer still shares it, and "Enforce deleter != NULL" for an
     /// image set with another ownership; the source keeps it then.
     virtual ImageCPU* releaseImageCPU();
+    /// The image, which stays where it is; null if there is none.
     virtual ImageCPU* getImageCPU();
     virtual ImageCPU const* getImageCPU() const;
     virtual ImageCPU const* operator->() const;
@@ -62,11 +68,17 @@ public:
     /// \name Geometry of the client's image, in pixels
     /// Each throws "No ImageCPU set yet." without an image.
     /// @{
+    /// Columns.
     int width() const;
+    /// Rows.
     int height() const;
+    /// The first column.
     int offsetX() const;
+    /// The first row.
     int offsetY() const;
+    /// The first column and row.
     PositionInPixelSpace offset() const;
+    /// Columns and rows.
     ExtentInPixelSpace size() const;
     /// @}
 
@@ -102,8 +114,10 @@ public:
 protected:
     /// The channels of the image's format. Throws "No ImageCPU set yet." without an image.
     std::size_t getNumChannelsOutput() override;
+    /// Shares the image with the output, or copies it into the bound image; emitted then.
     void internalProcess() override;
-    /// Copies rows into the bound image.
+    /// Copies the rows `begin` to `end` (exclusive) of the output region into the bound image. Any thread of
+    /// the frame, each its own rows.
     void processSlice(std::size_t begin, std::size_t end) override;
 
 private:

@@ -14,6 +14,7 @@ class ORVO_API ImageCPUOutput : public ImageFilter {
 public:
     /// Node name "ImageCPUOutput", input name "InputImage".
     ImageCPUOutput();
+    /// The same under other names.
     ImageCPUOutput(char const* nodeName, char const* inputName);
     ~ImageCPUOutput() override;
 

@@ -5,6 +5,7 @@
 #include "tests/data_flow/nodes/TestNode.h"
 #include "tests/support/DataFlowLayers.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -21,6 +22,22 @@ class ConnectorTest : public testing::Test {
 protected:
     ORVO::Test::DataFlowLayers oLayers_;
 };
+
+TEST(ConnectorSlotsTest, HaveTheirOperationsInOrder) {
+    using ORVO::Test::constSlotOf;
+    using ORVO::Test::slotOf;
+    // The destructor stands first.
+    EXPECT_EQ(2, constSlotOf(&Connector::datatype));
+    EXPECT_EQ(3, slotOf(&Connector::setBoundData));
+    EXPECT_EQ(4, slotOf(&InputConnector::fetchInput));
+    EXPECT_EQ(5, slotOf(&InputConnector::removeData));
+    EXPECT_EQ(6, slotOf(&InputConnector::canConnect));
+    EXPECT_EQ(7, slotOf(&InputConnector::flushInput));
+    EXPECT_EQ(4, slotOf(&OutputConnector::flushOutput));
+    using AnyOutput = OutputTemplate<Payload>;
+    EXPECT_EQ(5, slotOf(static_cast<void (AnyOutput::*)(Input<Payload>&)>(&AnyOutput::moveTo)));
+    EXPECT_EQ(6, slotOf(static_cast<void (AnyOutput::*)(ConstInput<Payload>&)>(&AnyOutput::moveTo)));
+}
 
 TEST_F(ConnectorTest, KnowsItsNameNodeAndType) {
     TestNode oNode("n");

@@ -4,6 +4,7 @@
 #include "orvo/core/memory/AllocationFailure.h"
 #include "orvo/data_flow/connectors/Connect.h"
 #include "tests/data_flow/nodes/TestNode.h"
+#include "tests/data_flow/parameters/ParameterFlags.h"
 #include "tests/support/DataFlowLayers.h"
 #include "tests/support/Expect.h"
 
@@ -16,6 +17,8 @@
 namespace {
 
 using namespace ORVO::DataFlow;
+using ORVO::Test::expectAllFlags;
+using ORVO::Test::setAllClean;
 using ORVO::Test::TestNode;
 
 using OwnedInput = std::unique_ptr<InputConnector, ORVO::ORVODeleter<InputConnector>>;
@@ -70,17 +73,15 @@ TEST_F(ParameterInputTest, EveryRunSetsTheParameter) {
 TEST_F(ParameterInputTest, AnUnchangedValueTouchesNoFlag) {
     InputConnector& oInput = convert();
     Connect(oInput, oOutput_);
-    oRadius_.setClean();
-    oRadius_.setCleanSimpleCaching();
-    oRadius_.setCleanGlyphcast();
+    setAllClean(oRadius_);
     fNext_ = 1.0f;
     oProducer_.process();
     oNode_.process();
-    EXPECT_FALSE(oRadius_.isDirty() || oRadius_.isDirtySimpleCaching() || oRadius_.isDirtyGlyphcast());
+    expectAllFlags(oRadius_, false);
     fNext_ = 2.0f;
     oProducer_.process();
     oNode_.process();
-    EXPECT_TRUE(oRadius_.isDirty() && oRadius_.isDirtySimpleCaching() && oRadius_.isDirtyGlyphcast());
+    expectAllFlags(oRadius_, true);
 }
 
 TEST_F(ParameterInputTest, AKeptValueIsShared) {
@@ -114,6 +115,16 @@ TEST_F(ParameterInputTest, FetchingNeedsAPartnerAndAValue) {
 TEST_F(ParameterInputTest, NullParametersAreRefused) {
     ORVO_EXPECT_INTERNAL(oNode_.convertToConnector(nullptr), "Enforce pParameter != NULL");
     ORVO_EXPECT_INTERNAL(ParameterInput<float>("x", &oNode_, nullptr), "Enforce pParameter != NULL");
+    EXPECT_EQ(0u, oNode_.numberOfInputs());
+}
+
+TEST_F(ParameterInputTest, AParameterThatMakesNoInputIsRefused) {
+    struct Closed : Parameter<float> {
+        Closed() : Parameter<float>(1.0f, "closed") {}
+        InputConnector* createProxyConnector(Node*) override { return nullptr; }
+    };
+    Closed oClosed;
+    ORVO_EXPECT_INTERNAL(oNode_.convertToConnector(&oClosed), "Enforce pInput != NULL");
     EXPECT_EQ(0u, oNode_.numberOfInputs());
 }
 

@@ -1,9 +1,9 @@
 #pragma once
 
-#include "orvo/core/exceptions/SharedException.h"
 #include "orvo/data_flow/controllers/Controller.h"
 #include "orvo/data_flow/controllers/SchedulingHooks.h"
 
+#include "tests/data_flow/controllers/SharedFailure.h"
 #include "tests/data_flow/controllers/TestNodes.h"
 #include "tests/support/DataFlowLayers.h"
 #include "tests/support/Expect.h"
@@ -31,17 +31,10 @@ inline void waitForEnd(Controller& controller) { ASSERT_TRUE(controller.wait(60.
 
 inline void failInternally() { ORVO_FAIL("broken"); }
 
-/// The exception that checkException() throws must be a SharedException around an `Exception`; gives its
-/// text.
+/// checkException() must throw a SharedException around an `Exception` with exactly the given message.
 template <typename Exception>
-std::string sharedText(Controller& controller) {
-    try {
-        controller.checkException();
-    } catch (SharedException const& shared) {
-        auto const* pInner = dynamic_cast<Exception const*>(shared.exception().get());
-        return pInner != nullptr ? pInner->message() : std::string("another class: ") + shared.what();
-    }
-    return "nothing was thrown";
+void expectSaved(Controller& controller, std::string const& sMessage) {
+    expectShared<Exception>([&controller] { controller.checkException(); }, sMessage);
 }
 
 /// Counts its sleeps and does not sleep.

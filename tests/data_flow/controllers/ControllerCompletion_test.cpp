@@ -63,7 +63,7 @@ TEST_F(ControllerCompletionTest, CallbackThatThrowsStillCompletesTheFrame) {
     controller.processAsync();
     waitForEnd(controller);
     EXPECT_EQ(0, static_cast<int>(controller.controllerStatus()));
-    EXPECT_EQ("broken", sharedText<InternalException>(controller));
+    expectSaved<InternalException>(controller, "broken");
     EXPECT_EQ(1, chain.sink().result());
     EXPECT_EQ(1, record.nCalls);
 
@@ -216,14 +216,14 @@ TEST_F(ControllerCompletionTest, FrameBodyThatFailsOutsideTheBaseIsSavedAndCompl
     record.registerWith(controller);
     controller.processAsync();
     waitForEnd(controller);
-    EXPECT_EQ("before", sharedText<InternalException>(controller));
+    expectSaved<InternalException>(controller, "before");
     EXPECT_EQ(1, record.nCalls);
     EXPECT_EQ(0, static_cast<int>(controller.controllerStatus()));
 
     controller.bBefore = false;
     controller.processAsync();
     waitForEnd(controller);
-    EXPECT_EQ("after", sharedText<InternalException>(controller));
+    expectSaved<InternalException>(controller, "after");
     EXPECT_EQ(2, record.nCalls);
     EXPECT_EQ(1, chain.sink().result());
 }
@@ -237,7 +237,7 @@ TEST_F(ControllerCompletionTest, NotificationThatFailsIsSaved) {
     Chain chain(controller, 1);
     controller.processAsync();
     waitForEnd(controller);
-    EXPECT_EQ("mute", sharedText<InternalException>(controller));
+    expectSaved<InternalException>(controller, "mute");
     EXPECT_EQ(1, chain.sink().result());
 }
 

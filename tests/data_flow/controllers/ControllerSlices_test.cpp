@@ -1,14 +1,14 @@
-#include "orvo/core/exceptions/CPURuntimeException.h"
-#include "orvo/core/exceptions/SharedException.h"
 #include "orvo/data_flow/controllers/Controller.h"
 #include "orvo/data_flow/controllers/SchedulingHooks.h"
 
+#include "tests/data_flow/controllers/SharedFailure.h"
 #include "tests/data_flow/controllers/TestNodes.h"
 #include "tests/support/DataFlowLayers.h"
 #include "tests/support/Expect.h"
 
 #include <gtest/gtest.h>
 #include <tbb/global_control.h>
+#include <tbb/info.h>
 #include <tbb/parallel_for.h>
 #include <tbb/partitioner.h>
 #include <tbb/task_arena.h>
@@ -155,14 +155,7 @@ TEST_F(ControllerSlicesTest, NodeThatReportsItemsMustOverrideProcessSlice) {
     Careless careless;
     controller.addNode(&careless);
     controller.setSinkNode(careless);
-    try {
-        controller.process();
-        ADD_FAILURE() << "nothing was thrown";
-    } catch (SharedException const& shared) {
-        auto const* pInner = dynamic_cast<InternalException const*>(shared.exception().get());
-        ASSERT_NE(nullptr, pInner);
-        EXPECT_STREQ("0", pInner->message());
-    }
+    expectShared<InternalException>([&] { controller.process(); }, "0");
 }
 
 // Grain
@@ -244,23 +237,23 @@ TEST_F(ControllerSlicesTest, NumberOfThreadsIsHonouredExactly) {
         Crowd crowd(nThreads);
         node.onSlice_ = [&](std::size_t, std::size_t) { crowd.visit(); };
         node.setSlices(64);
-        arena.execute([&] { frame(); });
+        // Workers may wake up late where the machine is busy.
+        for (int i = 0; i < 20 && crowd.most() < nThreads; ++i) {
+            arena.execute([&] { frame(); });
+            EXPECT_EQ(64, node.nItemsDone_);
+        }
         EXPECT_EQ(nThreads, crowd.most());
-        EXPECT_EQ(64, node.nItemsDone_);
     }
 }
 
 TEST_F(ControllerSlicesTest, AsynchronousFrameUsesSeveralThreads) {
-    if (std::thread::hardware_concurrency() < 2) {
-        SUCCEED() << "one processor: slices run on the frame's thread";
-        return;
-    }
-    Crowd crowd(2);
+    int const nThreads = std::min(2, tbb::info::default_concurrency());
+    Crowd crowd(nThreads);
     node.onSlice_ = [&](std::size_t, std::size_t) { crowd.visit(); };
     node.setSlices(64);
     controller.processAsync();
     ASSERT_TRUE(controller.wait(60.0, 0.0005));
-    EXPECT_GE(crowd.most(), 2);
+    EXPECT_GE(crowd.most(), nThreads);
 }
 
 TEST_F(ControllerSlicesTest, SingleThreadModeRunsAllItemsInOneCall) {
@@ -335,14 +328,7 @@ TEST_F(ControllerSlicesTest, FailureInASliceComesBackAsASharedException) {
             ORVO_FAIL("item 250");
         }
     };
-    try {
-        controller.process();
-        ADD_FAILURE() << "nothing was thrown";
-    } catch (SharedException const& shared) {
-        auto const* pInner = dynamic_cast<InternalException const*>(shared.exception().get());
-        ASSERT_NE(nullptr, pInner);
-        EXPECT_STREQ("item 250", pInner->message());
-    }
+    expectShared<InternalException>([&] { controller.process(); }, "item 250");
     EXPECT_EQ(0, static_cast<int>(controller.controllerStatus()));
     EXPECT_NO_THROW(controller.checkException());
     EXPECT_FALSE(node.out().hasData());
@@ -359,14 +345,7 @@ TEST_F(ControllerSlicesTest, FailureInASliceOfAnAsynchronousFrameIsReportedOnce)
     node.onSlice_ = [](std::size_t, std::size_t) { ORVO_FAIL_PARAMETER("kernel"); };
     controller.processAsync();
     ASSERT_TRUE(controller.wait(60.0, 0.0005));
-    try {
-        controller.checkException();
-        ADD_FAILURE() << "nothing was thrown";
-    } catch (SharedException const& shared) {
-        auto const* pInner = dynamic_cast<ParameterException const*>(shared.exception().get());
-        ASSERT_NE(nullptr, pInner);
-        EXPECT_STREQ("kernel", pInner->message());
-    }
+    expectShared<ParameterException>([&] { controller.checkException(); }, "kernel");
     EXPECT_NO_THROW(controller.checkException());
     node.onSlice_ = nullptr;
     frame();
@@ -382,32 +361,30 @@ TEST_F(ControllerSlicesTest, ForeignFailureInASliceBecomesACPURuntimeException) 
             }
             throw 1;
         };
-        try {
-            frame();
-            ADD_FAILURE() << "nothing was thrown";
-        } catch (SharedException const& shared) {
-            auto const* pInner = dynamic_cast<CPURuntimeException const*>(shared.exception().get());
-            ASSERT_NE(nullptr, pInner);
-            EXPECT_EQ(6, static_cast<int>(pInner->condition()));
-        }
+        expectSharedUnknown([&] { frame(); });
     }
 }
 
 TEST_F(ControllerSlicesTest, FailuresInTwoSlicesAtOnceGiveOneException) {
     tbb::global_control const workers(tbb::global_control::max_allowed_parallelism, 2);
     tbb::task_arena arena(2);
-    Crowd crowd(2);
     std::atomic<int> nThrown{0};
     node.setSlices(2);
-    node.onSlice_ = [&](std::size_t, std::size_t) {
-        crowd.visit();
-        ++nThrown;
-        ORVO_FAIL("slice");
-    };
-    EXPECT_THROW(arena.execute([&] { controller.process(); }), SharedException);
-    EXPECT_GE(nThrown, 1);
-    EXPECT_NO_THROW(controller.checkException());
-    EXPECT_EQ(0, static_cast<int>(controller.controllerStatus()));
+    // A worker that wakes up late finds its slice cancelled by the failure of the other.
+    for (int i = 0; i < 100 && nThrown < 2; ++i) {
+        Crowd crowd(2);
+        nThrown = 0;
+        node.onSlice_ = [&](std::size_t begin, std::size_t) {
+            crowd.visit();
+            ++nThrown;
+            ORVO_FAIL(begin == 0 ? "slice 0" : "slice 1");
+        };
+        EXPECT_TRUE(controller.flushGraph());
+        EXPECT_THROW(arena.execute([&] { controller.process(); }), SharedException);
+        EXPECT_NO_THROW(controller.checkException());
+        EXPECT_EQ(0, static_cast<int>(controller.controllerStatus()));
+    }
+    EXPECT_EQ(2, nThrown);
 }
 
 TEST_F(ControllerSlicesTest, FailureCancelsTheSlicesThatHaveNotStarted) {
@@ -444,14 +421,7 @@ TEST_F(ControllerSlicesTest, CancelThatFailsStillStopsTheSlicesAndKeepsTheFailur
     failing.setSinkNode(sliced);
     sliced.setSlices(100000);
     sliced.onSlice_ = [](std::size_t, std::size_t) { ORVO_FAIL("kernel"); };
-    try {
-        failing.process();
-        ADD_FAILURE() << "nothing was thrown";
-    } catch (SharedException const& shared) {
-        auto const* pInner = dynamic_cast<InternalException const*>(shared.exception().get());
-        ASSERT_NE(nullptr, pInner);
-        EXPECT_STREQ("kernel", pInner->message());
-    }
+    expectShared<InternalException>([&] { failing.process(); }, "kernel");
     EXPECT_EQ(0, sliced.nItemsDone_);
 }
 

@@ -1,10 +1,15 @@
 #include "orvo/data_flow/controllers/Controller.h"
 
+#include "orvo/core/exceptions/InternalException.h"
+
+#include "tests/data_flow/controllers/SharedFailure.h"
 #include "tests/data_flow/controllers/TestNodes.h"
 #include "tests/support/DataFlowLayers.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
+#include <pthread.h>
 #include <tbb/info.h>
 
 #include <stdexcept>
@@ -28,10 +33,44 @@ std::vector<Node*> listOf(Controller const& controller) {
     return std::vector<Node*>(controller.nodesBegin(), controller.nodesEnd());
 }
 
+/// Runs a frame on a thread with a stack of 256 KiB.
+void processOnSmallStack(Controller& controller) {
+    pthread_attr_t oSmall;
+    pthread_attr_init(&oSmall);
+    pthread_attr_setstacksize(&oSmall, std::size_t(256) << 10);
+    pthread_t oThread;
+    auto const run = [](void* pController) -> void* {
+        static_cast<Controller*>(pController)->process();
+        return nullptr;
+    };
+    ASSERT_EQ(0, pthread_create(&oThread, &oSmall, run, &controller));
+    pthread_join(oThread, nullptr);
+    pthread_attr_destroy(&oSmall);
+}
+
 using Nodes = std::vector<Node*>;
 using Names = std::vector<std::string>;
 
 } // namespace
+
+TEST(ControllerSlotsTest, HasItsOperationsInOrder) {
+    // The destructor stands first.
+    EXPECT_EQ(2, slotOf(&Controller::addNode));
+    EXPECT_EQ(3, slotOf(&Controller::removeNode));
+    EXPECT_EQ(4, slotOf(&Controller::removeAllNodes));
+    EXPECT_EQ(5, slotOf(&Controller::findUnconnectedNodes));
+    EXPECT_EQ(6, slotOf(&Controller::process));
+    EXPECT_EQ(7, slotOf(&Controller::processAsync));
+    EXPECT_EQ(8, slotOf(&Controller::cancelProcess));
+    EXPECT_EQ(9, slotOf(&Controller::notifyOfCompletion));
+    EXPECT_EQ(10, slotOf(&Controller::threadsAvailable));
+    EXPECT_EQ(11, slotOf(&Controller::stop));
+    EXPECT_EQ(12, slotOf(&Controller::registerProcessingCompletedCallback));
+    EXPECT_EQ(13, slotOf(&Controller::flushGraph));
+    EXPECT_EQ(14, slotOf(&Controller::wait));
+    EXPECT_EQ(15, slotOf(&Controller::sleep));
+    EXPECT_EQ(16, slotOf(&Controller::processFrameFunction));
+}
 
 // The list of nodes
 
@@ -341,10 +380,12 @@ TEST_F(ControllerTest, SecondThreadWaitsForANodeThatIsRunning) {
 }
 
 TEST_F(ControllerTest, LongChainNeedsNoDeepStack) {
+    // A walk that called itself would need several hundred bytes for each node.
+    constexpr int nNodes = 10000;
     Controller controller;
-    Chain chain(controller, 20000);
-    controller.process();
-    EXPECT_EQ(20000, chain.sink().result());
+    Chain chain(controller, nNodes);
+    processOnSmallStack(controller);
+    EXPECT_EQ(nNodes, chain.sink().result());
 }
 
 TEST_F(ControllerTest, CycleIsRefusedAndTheGraphStaysUsable) {
@@ -375,6 +416,39 @@ TEST_F(ControllerTest, LongChainThatEndsInACycleIsRefused) {
     Connect(loop.out(0), loop.in());
     Connect(loop.out(1), chain[1].in());
     ORVO_EXPECT_INTERNAL(controller.process(), "Graph contains a cycle");
+}
+
+TEST_F(ControllerTest, SynchronousFrameKeepsAnOldExceptionForWhoeverChecks) {
+    Controller controller;
+    Chain chain(controller, 2);
+    controller.saveException(new InternalException("file", 1, "old"));
+    controller.process();
+    EXPECT_EQ(2, chain.sink().result());
+    expectShared<InternalException>([&] { controller.checkException(); }, "old");
+
+    // A node that runs slices checks at their end.
+    EXPECT_TRUE(controller.flushGraph());
+    chain[1].setSlices(4);
+    controller.saveException(new InternalException("file", 1, "older"));
+    expectShared<InternalException>([&] { controller.process(); }, "older");
+    EXPECT_EQ(4, chain[1].nItemsDone_);
+    EXPECT_EQ(-1, chain.sink().result());
+}
+
+TEST_F(ControllerTest, FlushGraphFlushesEveryNodeInListOrder) {
+    struct Flushed : SumNode {
+        using SumNode::SumNode;
+        void flush() override { pLog_->add(name()); }
+    };
+    Controller controller;
+    RunLog log;
+    Flushed b("b", 0), a("a", 0), c("c", 0);
+    for (Flushed* pNode : {&b, &a, &c}) {
+        pNode->pLog_ = &log;
+        controller.addNode(pNode);
+    }
+    EXPECT_TRUE(controller.flushGraph());
+    EXPECT_EQ((Names{"b", "a", "c"}), log.take());
 }
 
 TEST_F(ControllerTest, FlushGraphEmptiesOutputsThatAreNotBound) {

@@ -10,6 +10,7 @@
 #include "tests/data_flow/controllers/TestAccess.h"
 #include "tests/support/DataFlowLayers.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -93,6 +94,10 @@ NodeMetaData key(std::string const& name, std::uint32_t iVersion) {
 }
 
 } // namespace
+
+TEST(NodeFactorySlotsTest, CreatesThroughTheSlotAfterTheDestructor) {
+    EXPECT_EQ(2, slotOf(&NodeFactory::create));
+}
 
 // Creating nodes
 
@@ -228,14 +233,16 @@ TEST_F(NodeLibrarianTest, NullsAreRefusedAndStayTheCallers) {
     EXPECT_EQ("n", madeByID("id"));
 }
 
-TEST_F(NodeLibrarianTest, FactoryThatCannotBeMadeLeavesTheRecordToTheCaller) {
-    NodeMetaData* const pMetaData = ORVO_NEW NodeMetaData("n", "s", "v", "text", "id");
+TEST_F(NodeLibrarianTest, RecordIsFreedIfThereIsNoMemoryForItsFactory) {
+    NodeMetaData* const pMetaData = ORVO_NEW CountedMetaData("n", "s", "v", "text", "id");
+    CountedMetaData::nEnded = 0;
     {
         Core::AllocationFailure const failure(1);
         EXPECT_THROW(librarian.add(&createCPUOnly, pMetaData), std::bad_alloc);
     }
+    EXPECT_EQ(1, CountedMetaData::nEnded);
     EXPECT_EQ(librarian.begin(), librarian.end());
-    librarian.add(&createCPUOnly, pMetaData);
+    librarian.add(&createCPUOnly, ORVO_NEW NodeMetaData("n", "s", "v", "text", "id"));
     EXPECT_EQ("cpu only", madeByID("id"));
 }
 
@@ -260,6 +267,22 @@ TEST_F(NodeLibrarianTest, ClearAllFreesEverythingAndTheCatalogueWorksOn) {
     librarian.clearAll();
 }
 
+TEST_F(NodeLibrarianTest, ClearAllFreesTheFactoriesInTheOrderOfTheCatalogue) {
+    struct Logging : NamedFactory {
+        Logging(std::string const& sName, std::vector<std::string>& aEnded)
+            : NamedFactory(sName), sName_(sName), aEnded_(aEnded) {}
+        ~Logging() override { aEnded_.push_back(sName_); }
+        std::string sName_;
+        std::vector<std::string>& aEnded_;
+    };
+    std::vector<std::string> aEnded;
+    for (char const* const pName : {"z", "a", "m"}) {
+        librarian.add(ORVO_NEW Logging(pName, aEnded), ORVO_NEW NodeMetaData(pName, "s", "v", "", ""));
+    }
+    librarian.clearAll();
+    EXPECT_EQ((std::vector<std::string>{"a", "m", "z"}), aEnded);
+}
+
 // The singleton
 
 TEST_F(NodeLibrarianTest, SecondLibrarianIsRefused) {
@@ -279,6 +302,11 @@ TEST(NodeLibrarianLifeTest, ThereIsNoneBeforeCreateAndAfterDestroy) {
     TestAccess::destroyLibrarian();
     EXPECT_FALSE(NodeLibrarian::exists());
     ORVO_EXPECT_INTERNAL(NodeLibrarian::Instance(), "Enforce gpSingleton_ != NULL");
+}
+
+TEST(NodeLibrarianLifeTest, ClientIDsNeedTheLibrarianOfTheProcess) {
+    auto const pLone = TestAccess::makeLoneLibrarian();
+    ORVO_EXPECT_INTERNAL(pLone->createNodeByClientID("id", NODE_TARGET_CPU), "Enforce gpSingleton_ != NULL");
 }
 
 TEST(NodeLibrarianLifeTest, DestroyFreesWhatWasRegistered) {

@@ -239,18 +239,4 @@ TEST_F(NodeGraphTest, AParameterFedByANodeTakesItsValueInTheFrame) {
     spInput->disconnect();
 }
 
-TEST_F(NodeGraphTest, AVeryLongChainRunsOnAUsualStack) {
-    constexpr std::size_t nNodes = 100000;
-    Graph oGraph;
-    for (std::size_t i = 0; i < nNodes; ++i) {
-        oGraph.add(i);
-        if (i > 0) {
-            oGraph.aNodes_[i]->feedFrom(*oGraph.aNodes_[i - 1], i % 2 == 0, i % 3 == 0);
-        }
-    }
-    oGraph.finish();
-    EXPECT_EQ(oGraph.runFrame(), oGraph.aNodes_.back()->iExpected_);
-    EXPECT_EQ("sum [99999]", oGraph.aNodes_.back()->debugId());
-}
-
 } // namespace

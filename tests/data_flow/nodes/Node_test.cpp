@@ -7,6 +7,7 @@
 #include "tests/data_flow/nodes/TestNode.h"
 #include "tests/support/DataFlowLayers.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -31,6 +32,35 @@ protected:
 
     ORVO::Test::DataFlowLayers oLayers_;
 };
+
+TEST(NodeSlotsTest, HasItsOperationsInOrder) {
+    using ORVO::Test::constSlotOf;
+    using ORVO::Test::slotOf;
+    struct OpenNode : Node {
+        using Node::internalProcess;
+        using Node::postProcess;
+        using Node::preProcess;
+    };
+    // The destructor stands first.
+    EXPECT_EQ(2, constSlotOf(&Node::debugWrite));
+    EXPECT_EQ(3, slotOf(&Node::setController));
+    EXPECT_EQ(4, slotOf(&Node::emit));
+    EXPECT_EQ(5, constSlotOf(&Node::canEmit));
+    EXPECT_EQ(6, slotOf(&Node::hasBufferChanged));
+    EXPECT_EQ(7, slotOf(&Node::flush));
+    EXPECT_EQ(8, slotOf(&Node::disconnect));
+    EXPECT_EQ(9, slotOf(&Node::flushOutputs));
+    EXPECT_EQ(10, slotOf(&Node::flushInputs));
+    EXPECT_EQ(11, constSlotOf(&Node::isReady));
+    EXPECT_EQ(12, slotOf(&Node::process));
+    EXPECT_EQ(13, slotOf(&Node::processSlice));
+    EXPECT_EQ(14, constSlotOf<Node>(&Node::asImageFilter));
+    EXPECT_EQ(15, slotOf<Node>(&Node::asImageFilter));
+    EXPECT_EQ(16, slotOf(&Node::rangeToProcess));
+    EXPECT_EQ(17, slotOf(&OpenNode::preProcess));
+    EXPECT_EQ(18, slotOf(&OpenNode::internalProcess));
+    EXPECT_EQ(19, slotOf(&OpenNode::postProcess));
+}
 
 TEST_F(NodeTest, StartsIdleCleanAndEmpty) {
     Node oNode("n");
@@ -154,8 +184,34 @@ TEST_F(NodeTest, RunsItsThreePhasesInOrder) {
     EXPECT_EQ(0, Payload::nAlive);
 }
 
+/// An input that notes what its node does with it.
+class LoggedInput : public ConstInput<Payload> {
+public:
+    LoggedInput(std::string const& sName, TestNode& oNode)
+        : ConstInput<Payload>(sName, &oNode), aCalls_(oNode.aCalls_) {}
+    void fetchInput() override { aCalls_.push_back("fetch " + name()); }
+    void removeData() override { aCalls_.push_back("remove " + name()); }
+    void flushInput() override { aCalls_.push_back("flush " + name()); }
+
+private:
+    std::vector<std::string>& aCalls_;
+};
+
 TEST_F(NodeTest, FetchesAndDropsInInputOrder) {
-    // The order shows in who is refused first: the second input has no partner.
+    TestNode oNode("n");
+    LoggedInput oFirst("first", oNode);
+    LoggedInput oSecond("second", oNode);
+    oNode.addInput(&oFirst);
+    oNode.addInput(&oSecond);
+    oNode.process();
+    oNode.flushInputs();
+    EXPECT_EQ((std::vector<std::string>{"preProcess", "fetch first", "fetch second", "internalProcess",
+                                        "postProcess", "remove first", "remove second", "flush first",
+                                        "flush second"}),
+              oNode.aCalls_);
+}
+
+TEST_F(NodeTest, AFailedFetchLeavesTheInputsBeforeItForTheFlush) {
     TestNode oProducer("p");
     auto& oOutput = oProducer.addConstOutput("out");
     TestNode oConsumer("c");
@@ -191,6 +247,25 @@ TEST_F(NodeTest, AThrowLeavesTheInputsForTheFlush) {
     EXPECT_FALSE(oResult.hasData());
     EXPECT_FALSE(oConsumer.isProcessing());
     EXPECT_EQ(0, Payload::nAlive);
+}
+
+TEST_F(NodeTest, FlushesItsInputsThenItsOutputsAndThenCountsAsIdle) {
+    struct Flushed : TestNode {
+        using TestNode::TestNode;
+        void flushInputs() override {
+            EXPECT_TRUE(isProcessing());
+            aCalls_.emplace_back("inputs");
+        }
+        void flushOutputs() override {
+            EXPECT_TRUE(isProcessing());
+            aCalls_.emplace_back("outputs");
+        }
+    };
+    Flushed oNode("n");
+    oNode.setProcessing(true);
+    oNode.flush();
+    EXPECT_EQ((std::vector<std::string>{"inputs", "outputs"}), oNode.aCalls_);
+    EXPECT_FALSE(oNode.isProcessing());
 }
 
 TEST_F(NodeTest, FlushSparesBoundOutputs) {

@@ -1,31 +1,22 @@
 #include "orvo/data_flow/parameters/IntervalParameter.h"
 
+#include "tests/data_flow/parameters/ParameterFlags.h"
 #include "tests/data_flow/parameters/ParameterSamples.h"
 #include "tests/support/Expect.h"
 
 #include <gtest/gtest.h>
 
 #include <memory>
+#include <ostream>
 #include <sstream>
+#include <stdexcept>
 
 namespace {
 
 using namespace ORVO::DataFlow;
+using ORVO::Test::expectAllFlags;
 using ORVO::Test::Samples;
-
-void setAllClean(ParameterBase& oParameter) {
-    oParameter.setClean();
-    oParameter.setCleanSimpleCaching();
-    oParameter.setCleanGlyphcast();
-}
-
-bool anyFlag(ParameterBase const& oParameter) {
-    return oParameter.isDirty() || oParameter.isDirtySimpleCaching() || oParameter.isDirtyGlyphcast();
-}
-
-bool allFlags(ParameterBase const& oParameter) {
-    return oParameter.isDirty() && oParameter.isDirtySimpleCaching() && oParameter.isDirtyGlyphcast();
-}
+using ORVO::Test::setAllClean;
 
 template <typename T>
 class IntervalParameterTest : public testing::Test {};
@@ -43,7 +34,7 @@ TYPED_TEST(IntervalParameterTest, HasBoundsBesideItsValue) {
     EXPECT_EQ("name", oParameter.name());
     EXPECT_EQ("text", oParameter.description());
     EXPECT_TRUE(oParameter.datatype() == typeid(T));
-    EXPECT_TRUE(allFlags(oParameter));
+    expectAllFlags(oParameter, true);
     IntervalParameter<T> const oShort(Samples<T>::first(), Samples<T>::second(), Samples<T>::first(), "name");
     EXPECT_EQ("", oShort.description());
     auto const spCreated = IntervalParameter<T>::create(Samples<T>::first(), Samples<T>::first(),
@@ -67,7 +58,7 @@ TYPED_TEST(IntervalParameterTest, ClonesItsBounds) {
     EXPECT_TRUE(oClone.upperBound() == Samples<T>::second());
     EXPECT_EQ("name", oClone.name());
     EXPECT_EQ("text", oClone.description());
-    EXPECT_TRUE(allFlags(oClone));
+    expectAllFlags(oClone, true);
     std::shared_ptr<ParameterBase> const spRenamed = oParameter.clone("other");
     EXPECT_EQ("other", spRenamed->name());
     EXPECT_TRUE(spRenamed->isInterval());
@@ -92,7 +83,7 @@ TYPED_TEST(IntervalParameterTest, TakesTheBoundsOfAnIntervalWithoutAFlag) {
     oParameter.setValueFromParameter(oSource);
     EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::second());
     EXPECT_TRUE(oParameter.upperBound() == Samples<T>::second());
-    EXPECT_FALSE(anyFlag(oParameter));
+    expectAllFlags(oParameter, false);
 }
 
 TYPED_TEST(IntervalParameterTest, KeepsItsBoundsWhenTheSourceHasNone) {
@@ -104,7 +95,7 @@ TYPED_TEST(IntervalParameterTest, KeepsItsBoundsWhenTheSourceHasNone) {
     EXPECT_TRUE(oParameter.value() == Samples<T>::second());
     EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::first());
     EXPECT_TRUE(oParameter.upperBound() == Samples<T>::first());
-    EXPECT_TRUE(allFlags(oParameter));
+    expectAllFlags(oParameter, true);
 }
 
 TYPED_TEST(IntervalParameterTest, RefusesAnotherTypeAndKeepsItsBounds) {
@@ -115,7 +106,7 @@ TYPED_TEST(IntervalParameterTest, RefusesAnotherTypeAndKeepsItsBounds) {
     ORVO_EXPECT_INTERNAL(oParameter.setValueFromParameter(oForeign), "isOfType<T>()");
     EXPECT_TRUE(oParameter.value() == Samples<T>::first());
     EXPECT_TRUE(oParameter.lowerBound() == Samples<T>::first());
-    EXPECT_FALSE(anyFlag(oParameter));
+    expectAllFlags(oParameter, false);
 }
 
 TEST(IntervalParameterValueTest, BoundsAreNotEnforced) {
@@ -139,6 +130,43 @@ TEST(IntervalParameterValueTest, APlainParameterTakesTheValueAlone) {
     EXPECT_FALSE(oParameter.isInterval());
 }
 
+/// A number whose copies can be made to fail. Assignments work.
+struct Fragile {
+    explicit Fragile(int iValue) : iValue_(iValue) {}
+    Fragile(Fragile const& oOther) : iValue_(oOther.iValue_) {
+        if (--nCopiesLeft < 0) {
+            throw std::runtime_error("no copy");
+        }
+    }
+    Fragile& operator=(Fragile const&) = default;
+    friend bool operator==(Fragile const& a, Fragile const& b) { return a.iValue_ == b.iValue_; }
+    friend std::ostream& operator<<(std::ostream& oStream, Fragile const& o) { return oStream << o.iValue_; }
+
+    int iValue_;
+    inline static int nCopiesLeft = 0;
+};
+
+TEST(IntervalParameterValueTest, BoundsThatCannotBeCopiedLeaveValueAndBounds) {
+    Fragile::nCopiesLeft = 1000;
+    IntervalParameter<Fragile> oParameter(Fragile(5), Fragile(0), Fragile(9), "name");
+    IntervalParameter<Fragile> const oSource(Fragile(6), Fragile(1), Fragile(8), "source");
+    setAllClean(oParameter);
+    // The lower bound is copied first.
+    for (int const nCopies : {0, 1}) {
+        Fragile::nCopiesLeft = nCopies;
+        EXPECT_THROW(oParameter.setValueFromParameter(oSource), std::runtime_error);
+        EXPECT_EQ(5, oParameter.value().iValue_);
+        EXPECT_EQ(0, oParameter.lowerBound().iValue_);
+        EXPECT_EQ(9, oParameter.upperBound().iValue_);
+        expectAllFlags(oParameter, false);
+    }
+    Fragile::nCopiesLeft = 1000;
+    oParameter.setValueFromParameter(oSource);
+    EXPECT_EQ(6, oParameter.value().iValue_);
+    EXPECT_EQ(1, oParameter.lowerBound().iValue_);
+    EXPECT_EQ(8, oParameter.upperBound().iValue_);
+}
+
 TEST(IntervalParameterValueTest, WritesAsAPlainOne) {
     std::ostringstream oText;
     oText << IntervalParameter<float>(0.5f, 0.0f, 1.0f, "mix", "of both");
@@ -157,7 +185,7 @@ TEST(IntervalParameterValueTest, CopiesTakeBoundsAndFlagsOver) {
         EXPECT_EQ(0, pCopy->lowerBound());
         EXPECT_EQ(2, pCopy->upperBound());
         EXPECT_EQ("name", pCopy->name());
-        EXPECT_FALSE(anyFlag(*pCopy));
+        expectAllFlags(*pCopy, false);
     }
 }
 

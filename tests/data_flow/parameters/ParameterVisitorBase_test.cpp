@@ -4,6 +4,7 @@
 #include "orvo/data_flow/parameters/Parameter.h"
 #include "tests/data_flow/parameters/ParameterSamples.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -84,6 +85,32 @@ std::string expectedOverload() {
         return "int";
     else
         return "base";
+}
+
+template <typename T>
+std::ptrdiff_t slotOfVisit() {
+    return ORVO::Test::slotOf(static_cast<void (ParameterVisitorBase::*)(T*)>(&ParameterVisitorBase::visit));
+}
+
+TEST(ParameterVisitorSlotsTest, HasItsOverloadsInOrder) {
+    // The destructor stands first.
+    EXPECT_EQ(2, slotOfVisit<ParameterBase>());
+    EXPECT_EQ(3, slotOfVisit<Parameter<std::string>>());
+    EXPECT_EQ(4, slotOfVisit<Parameter<float4x4>>());
+    EXPECT_EQ(5, slotOfVisit<Parameter<float3x3>>());
+    EXPECT_EQ(6, slotOfVisit<Parameter<float2x2>>());
+    EXPECT_EQ(7, slotOfVisit<Parameter<float4>>());
+    EXPECT_EQ(8, slotOfVisit<Parameter<float3>>());
+    EXPECT_EQ(9, slotOfVisit<Parameter<float2>>());
+    EXPECT_EQ(10, slotOfVisit<Parameter<float>>());
+    EXPECT_EQ(11, slotOfVisit<Parameter<bool4>>());
+    EXPECT_EQ(12, slotOfVisit<Parameter<bool3>>());
+    EXPECT_EQ(13, slotOfVisit<Parameter<bool2>>());
+    EXPECT_EQ(14, slotOfVisit<Parameter<bool>>());
+    EXPECT_EQ(15, slotOfVisit<Parameter<int4>>());
+    EXPECT_EQ(16, slotOfVisit<Parameter<int3>>());
+    EXPECT_EQ(17, slotOfVisit<Parameter<int2>>());
+    EXPECT_EQ(18, slotOfVisit<Parameter<int>>());
 }
 
 template <typename T>

@@ -1,7 +1,11 @@
 #include "orvo/data_flow/parameters/Parameter.h"
 
+#include "orvo/data_flow/connectors/Connect.h"
+#include "orvo/data_flow/connectors/Outputs.h"
+#include "tests/data_flow/parameters/ParameterFlags.h"
 #include "tests/data_flow/parameters/ParameterSamples.h"
 #include "tests/support/Expect.h"
+#include "tests/support/Slots.h"
 
 #include <gtest/gtest.h>
 
@@ -10,25 +14,17 @@
 #include <memory>
 #include <sstream>
 #include <string>
+#include <type_traits>
 #include <typeinfo>
+#include <utility>
 #include <vector>
 
 namespace {
 
 using namespace ORVO::DataFlow;
+using ORVO::Test::expectAllFlags;
 using ORVO::Test::Samples;
-
-void setAllClean(ParameterBase& oParameter) {
-    oParameter.setClean();
-    oParameter.setCleanSimpleCaching();
-    oParameter.setCleanGlyphcast();
-}
-
-void expectAllFlags(ParameterBase const& oParameter, bool bExpected) {
-    EXPECT_EQ(bExpected, oParameter.isDirty());
-    EXPECT_EQ(bExpected, oParameter.isDirtySimpleCaching());
-    EXPECT_EQ(bExpected, oParameter.isDirtyGlyphcast());
-}
+using ORVO::Test::setAllClean;
 
 template <typename T>
 class ParameterTest : public testing::Test {};
@@ -202,6 +198,52 @@ static_assert(HasCreateArray<float>::value);
 static_assert(HasCreateArray<std::vector<ORVO::float2>>::value);
 static_assert(!HasCreateArray<std::vector<float>>::value);
 static_assert(!HasCreateArray<ORVO::PositionExtentInWorldSpace>::value);
+
+static_assert(std::is_same_v<decltype(std::declval<ParameterBase const&>().name()), std::string>);
+static_assert(std::is_same_v<decltype(std::declval<ParameterBase const&>().description()), std::string>);
+
+TEST(ParameterSlotsTest, HasItsOperationsInOrder) {
+    using ORVO::Test::constSlotOf;
+    using ORVO::Test::slotOf;
+    // The destructor stands first.
+    EXPECT_EQ(
+        2, slotOf(static_cast<std::shared_ptr<ParameterBase> (ParameterBase::*)()>(&ParameterBase::clone)));
+    EXPECT_EQ(3, constSlotOf(&ParameterBase::datatype));
+    EXPECT_EQ(4, constSlotOf(&ParameterBase::isInterval));
+    EXPECT_EQ(5, slotOf(&ParameterBase::createProxyConnector));
+    EXPECT_EQ(6, constSlotOf(&ParameterBase::write));
+    EXPECT_EQ(7, slotOf(&ParameterBase::setValueFromParameter));
+    EXPECT_EQ(8, slotOf(&ParameterBase::resetToDefaultValue));
+    EXPECT_EQ(9, slotOf(&ParameterBase::visit));
+    EXPECT_EQ(10, slotOf(&Parameter<int>::cloneParameter));
+    EXPECT_EQ(11, constSlotOf(&Parameter<int>::value));
+    EXPECT_EQ(12, slotOf(&Parameter<int>::setValue));
+    EXPECT_EQ(13, constSlotOf(&Parameter<int>::defaultValue));
+}
+
+TEST(ParameterOverrideTest, EveryChangeOfTheValueGoesThroughTheSlot) {
+    struct Even : Parameter<int> {
+        Even() : Parameter<int>(0, "even") {}
+        void setValue(int const& value) override { Parameter<int>::setValue(value / 2 * 2); }
+        int const& defaultValue() const override { return iDefault_; }
+        int iDefault_ = 9;
+    };
+    Even oParameter;
+    oParameter.setValueFromParameter(Parameter<int>(5, "source"));
+    EXPECT_EQ(4, oParameter.value());
+    oParameter.resetToDefaultValue();
+    EXPECT_EQ(8, oParameter.value());
+    EXPECT_EQ(9, oParameter.cloneParameter()->defaultValue());
+
+    std::unique_ptr<InputConnector, ORVO::ORVODeleter<InputConnector>> const spInput(
+        oParameter.createProxyConnector(nullptr));
+    ConstOutput<int> oOutput("out", nullptr);
+    Connect(*spInput, oOutput);
+    oOutput.setData(ORVO_NEW int(7));
+    spInput->fetchInput();
+    EXPECT_EQ(6, oParameter.value());
+    spInput->disconnect();
+}
 
 TEST(ParameterFlagsTest, EachSetCleanClearsItsOwnFlag) {
     Parameter<int> oParameter(1, "name");

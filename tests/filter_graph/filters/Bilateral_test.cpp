@@ -11,6 +11,8 @@
 #include "orvo/filter_graph/impl/MetadataItem.h"
 #include "orvo/filter_graph/impl/Parameter.h"
 #include "orvo/filter_graph/internal/Connect.h"
+#include "orvo/filter_graph/internal/GraphExecutable.h"
+#include "orvo/filter_graph/internal/IFilterExecutable.h"
 #include "orvo/filter_graph/internal/ParameterForwarder.h"
 #include "tests/filter_graph/support/PlainFilter.h"
 #include "tests/image_flow/support/BilateralReference.h"
@@ -61,9 +63,16 @@ TEST_F(BilateralTest, ParametersSayTheirBounds) {
 }
 
 TEST_F(BilateralTest, NeverBuildsAnExecutable) {
-    Bilateral const filter;
+    FloatImage output(1, 1);
+    FilterPtr const spGenerator = makeFilter<GeneratorNode>();
+    SinkPtr const spSink = makeSink(output);
+    Connect(spGenerator, spSink);
+    Internal::GraphExecutable graphExecutable(spSink->getIFilter(), cpuOptions(), nullptr);
+    Bilateral filter;
     for (int target = 0; target < 5; ++target) {
         EXPECT_FALSE(filter.canBuildFilterExecutable(static_cast<TargetPlatform>(target)));
+        EXPECT_EQ(nullptr,
+                  filter.buildFilterExecutable(static_cast<TargetPlatform>(target), graphExecutable));
     }
 }
 

@@ -4,6 +4,7 @@
 
 #include "orvo/data_flow/controllers/Controller.h"
 #include "orvo/filter_graph/impl/FilterFactory.h"
+#include "orvo/filter_graph/internal/ImageFlowFilterWrapper.h"
 #include "tests/filter_graph/support/PlainFilter.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ExpectFilterGraph.h"
@@ -158,6 +159,11 @@ TEST(BuiltInFiltersTest, AreInsertedAndRemovedByTheHost) {
         factory.prototype({"VantleFilterGPU", "ImageFlow", "Norvane"})->identifier();
     EXPECT_EQ(identifier.version(), 1);
     EXPECT_FALSE(identifier.ioDataDescriptors().isInitialized());
+    EXPECT_TRUE(dynamic_cast<Internal::ImageFlowFilterWrapper const*>(factory.find(identifier)));
+    // Its node runs in OpenGL alone: without it, a filter without an interface.
+    std::shared_ptr<IFilter> const filter = factory.create(identifier);
+    EXPECT_EQ(filter->getNumberOfInputs(), 0u);
+    EXPECT_EQ(filter->getNumberOfParameters(), 0u);
     ORVO_EXPECT_FILTERGRAPH(Library::insertORVOFilters(),
                             "Cannot insert filter into the factory :  id Filter name:VantleFilterGPU\n"
                             "Filter namespace:ImageFlow\nFilter vendor:Norvane\nFilter version:1\n"

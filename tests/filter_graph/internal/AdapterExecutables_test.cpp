@@ -19,6 +19,15 @@ PositionExtentInWorldSpace world(float x, float y, float width, float height) {
     return {PositionInWorldSpace(x, y), ExtentInWorldSpace(width, height)};
 }
 
+/// The pixel extent that the node's output takes with the next pass.
+PixelExtentInWorldSpace extentOf(ImageFilter& node) {
+    struct Open : ImageFilter {
+        using ImageFilter::outputPixelExtent;
+    };
+    node.computePixelExtents();
+    return (node.*(&Open::outputPixelExtent))();
+}
+
 class AdapterExecutablesTest : public FrameTest {
 protected:
     AdapterExecutablesTest() {
@@ -46,6 +55,7 @@ TEST_F(AdapterExecutablesTest, ASourceIsGivenImageExtentAndRegion) {
     ASSERT_TRUE(node.getImageCPU());
     EXPECT_EQ(node.getImageCPU()->pixels(), reinterpret_cast<unsigned char*>(image.pixels().data()));
     EXPECT_TRUE(node.isReady());
+    EXPECT_EQ(extentOf(node), PixelExtentInWorldSpace(0.5f, 2.0f));
     EXPECT_EQ(node.generated({}), world(1.5f, 8.0f, 1.0f, 4.0f));
     node.setRegionOfInterest(world(1.0f, 2.0f, 3.0f, 4.0f));
     executable.returnStuff();
@@ -74,6 +84,21 @@ TEST_F(AdapterExecutablesTest, ASourceWithoutAnImageStillForwardsItsRegion) {
     EXPECT_FALSE(node.isReady());
 }
 
+TEST_F(AdapterExecutablesTest, RegionsOfImagesNeedImages) {
+    FloatImage image(1, 1);
+    SourcePtr const spSource = makeSource(image);
+    auto const spExecutable = adapter(spSource).buildFilterExecutable(ORVO_TARGET_CPU, *pExecutable_);
+    spSource->setImage(nullptr);
+    ORVO_EXPECT_INTERNAL(spExecutable->forwardStuff(), "Enforce image_ != NULL");
+
+    GeneratorNode sink;
+    OutputAdapterExecutable executable(*pExecutable_, sinkAdapter());
+    executable.bind(&sink);
+    spSink_->setImage(nullptr);
+    ORVO_EXPECT_INTERNAL(executable.forwardStuff(), "Enforce image_ != NULL");
+    ORVO_EXPECT_INTERNAL(executable.getInputTargetPlatform(), "Enforce image_ != NULL");
+}
+
 TEST_F(AdapterExecutablesTest, TheEndOfTheGraphHasNoConnectors) {
     OutputAdapterExecutable executable(*pExecutable_, sinkAdapter());
     EXPECT_EQ(executable.getImageFlowInputConnector("InputImage"), nullptr);
@@ -97,7 +122,7 @@ TEST_F(AdapterExecutablesTest, TheSinkIsBoundToTheImageAndItsGeometry) {
     EXPECT_EQ(static_cast<ORVO::ImageCPU const*>(sink.imageOutput()->data())->pixels(),
               reinterpret_cast<unsigned char*>(oOutput_.pixels().data()));
     EXPECT_EQ(sink.regionOfInterest(), world(2.0f, 1.0f, 6.0f, 2.0f));
-    sink.computePixelExtents();
+    EXPECT_EQ(extentOf(sink), PixelExtentInWorldSpace(2.0f, 0.5f));
     sink.setDomainOfDefinition(world(1.0f, 1.0f, 1.0f, 1.0f));
     executable.returnStuff();
     EXPECT_EQ(spSink_->getDomainOfDefinition(), world(1.0f, 1.0f, 1.0f, 1.0f));

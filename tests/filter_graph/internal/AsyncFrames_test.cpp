@@ -8,6 +8,7 @@
 
 #include "orvo/core/exceptions/CPURuntimeException.h"
 #include "orvo/core/exceptions/SharedException.h"
+#include "orvo/data_flow/controllers/Controller.h"
 #include "orvo/filter_graph/impl/FilterGraphLibrary.h"
 #include "orvo/filter_graph/internal/Processor.h"
 #include "tests/support/Expect.h"
@@ -308,10 +309,29 @@ TEST_F(AsyncFramesTest, ManyFramesCancelledAtRandomMoments) {
 
 // ---- Dying early
 
+/// A slow node that tells which controller runs it.
+class TellingNode : public SlowNode {
+public:
+    void processSlice(std::size_t begin, std::size_t end) override {
+        pRunning = controller();
+        SlowNode::processSlice(begin, end);
+    }
+
+    static inline std::atomic<DataFlow::Controller*> pRunning{nullptr};
+};
+
 TEST_F(AsyncFramesTest, TheProcessorMayDieDuringAFrame) {
+    FilterPtr const spTelling = makeFilter<TellingNode>("telling");
+    DisconnectAll(spSlow_.get());
+    Connect(spAdd_, spTelling);
+    Connect(spTelling, spThrowing_);
     launchAndHold();
+    // The gate opens when the frame was cancelled; until then the held slice keeps the controller alive.
     std::thread opener([] {
-        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        while (TellingNode::pRunning.load()->controllerStatus() !=
+               DataFlow::Controller::CONTROLLER_CANCELLED) {
+            std::this_thread::yield();
+        }
         SlowNode::openGate();
     });
     spProcessor_.reset();

@@ -330,6 +330,20 @@ TEST_F(GraphExecutableTest, TheIntermediatePrecisionReplacesDefaultHints) {
     }
 }
 
+TEST_F(GraphExecutableTest, TheIntermediatePrecisionIsForImageNodes) {
+    ImageFlowFilter<HardwareGenerator> filter(IFilter::Identifier("gl", "test", "ORVO", 1), ORVO_TARGET_GL);
+    filter.initialize();
+    TextureHandle texture;
+    spSink_->setImage(&texture);
+    FilterPtr const spGenerator = filter.clone();
+    Connect(spGenerator, spSink_);
+    build(OptimizationOptions());
+    DataFlow::Node stranger("stranger");
+    pExecutable_->controller()->addNode(&stranger);
+    ORVO_EXPECT_INTERNAL(pExecutable_->processFrame(), "iff!=0");
+    pExecutable_.reset();
+}
+
 // ---- Frames
 
 TEST_F(GraphExecutableTest, KnowsWhetherAFrameIsComplete) {

@@ -3,6 +3,7 @@
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
+#include "tests/support/Slots.h"
 
 namespace ORVO {
 
@@ -30,6 +31,13 @@ struct Planted {
     ImageFlowController oController_;
     Bedding oBedding_;
 };
+
+TEST_F(BeddingTest, hasItsOperationsInOrder) {
+    // The destructor stands first.
+    EXPECT_EQ(2, ORVO::Test::slotOf(&Bedding::process));
+    EXPECT_EQ(3, ORVO::Test::slotOf(&Bedding::processAsync));
+    EXPECT_EQ(4, ORVO::Test::slotOf(&Bedding::wait));
+}
 
 TEST_F(BeddingTest, theMasterTreeIsTheSink) {
     Planted graph;

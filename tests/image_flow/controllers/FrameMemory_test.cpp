@@ -2,6 +2,8 @@
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/ImageFlowLayers.h"
 
+#include <gtest/gtest.h>
+
 #include <atomic>
 #include <deque>
 

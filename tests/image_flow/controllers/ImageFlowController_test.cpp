@@ -7,8 +7,9 @@
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
 
+#include <array>
 #include <deque>
-#include <initializer_list>
+#include <limits>
 
 namespace ORVO {
 
@@ -17,8 +18,10 @@ namespace {
 using DataFlow::Node;
 using Hint = ImageFilter::teOutputPrecisionHint;
 using Test::feed;
+using Test::ForeignNode;
 using Test::infiniteWorld;
 using Test::pixels;
+using Test::plant;
 using Test::TestFilter;
 using Test::world;
 
@@ -41,14 +44,6 @@ private:
     }
 };
 
-/// A node of another kind with an image output.
-class ForeignNode : public Node {
-public:
-    ForeignNode() : Node("foreign"), oOutput_("out", this) { addOutput(&oOutput_); }
-    ~ForeignNode() override { disconnect(); }
-    DataFlow::ConstOutput<ImageCPU> oOutput_;
-};
-
 /// a feeds b, and c on a clone; both feed d. x stands apart.
 struct Diamond {
     Diamond() : a(0, true, "a"), b(1, true, "b"), c(1, true, "c"), d(2, true, "d"), x(0, true, "x") {
@@ -56,36 +51,80 @@ struct Diamond {
         feed(c, 0, a);
         feed(d, 0, b);
         feed(d, 1, c);
-        for (TestFilter* pFilter : {&a, &b, &x, &c, &d}) {
-            oController_.addNode(pFilter);
-        }
-        oController_.setImageSink(d);
+        plant(oController_, {&a, &b, &x, &c, &d}, d);
         a.setGeneratedRegion(world(0, 0, 100, 100));
     }
+
+    /// The nodes that the sink reaches.
+    std::array<TestFilter*, 4> reached() { return {&a, &b, &c, &d}; }
+    std::array<TestFilter*, 5> all() { return {&a, &b, &c, &d, &x}; }
+
     TestFilter a, b, c, d, x;
     ImageFlowController oController_;
 };
 
-TEST_F(ImageFlowControllerTest, walksDepthFirst) {
-    Diamond graph;
-    Recorder recorder;
-    graph.oController_.depthFirstSearch(recorder);
-    EXPECT_EQ("+d +b +a -a -b +c -c -d", recorder.sVisits_);
-    for (TestFilter* pFilter : {&graph.a, &graph.b, &graph.c, &graph.d}) {
-        EXPECT_EQ(Node::COLOR_DISCOVERED, pFilter->color());
+TEST_F(ImageFlowControllerTest, walksReachEachNodeOnce) {
+    struct Row {
+        void (ImageFlowController::*pWalk)(Visitor&);
+        char const* visits;
+        Node::teColor color;
+    };
+    for (Row const& row :
+         {Row{&ImageFlowController::depthFirstSearch, "+d +b +a -a -b +c -c -d", Node::COLOR_DISCOVERED},
+          Row{&ImageFlowController::breadthFirstSearch, "+d -d +b -b +c -c +a -a", Node::COLOR_FINISHED}}) {
+        Diamond graph;
+        Recorder recorder;
+        (graph.oController_.*row.pWalk)(recorder);
+        EXPECT_EQ(row.visits, recorder.sVisits_);
+        for (TestFilter const* pFilter : graph.reached()) {
+            EXPECT_EQ(row.color, pFilter->color()) << row.visits;
+        }
+        EXPECT_EQ(Node::COLOR_NOT_VISITED, graph.x.color());
     }
-    EXPECT_EQ(Node::COLOR_NOT_VISITED, graph.x.color());
 }
 
-TEST_F(ImageFlowControllerTest, walksBreadthFirst) {
-    Diamond graph;
-    Recorder recorder;
-    graph.oController_.breadthFirstSearch(recorder);
-    EXPECT_EQ("+d -d +b -b +c -c +a -a", recorder.sVisits_);
-    for (TestFilter* pFilter : {&graph.a, &graph.b, &graph.c, &graph.d}) {
-        EXPECT_EQ(Node::COLOR_FINISHED, pFilter->color());
+/// A controller whose walks can be begun at any node.
+class OpenController : public ImageFlowController {
+public:
+    using ImageFlowController::depthFirstVisit;
+};
+
+/// Begins a walk of its own in the middle of one.
+class Wanderer : public Visitor {
+public:
+    explicit Wanderer(ImageFlowController& controller) : controller_(controller) {}
+    void preVisitImageNode(ImageFilter* /*pImageFilter*/) override { ++nVisits_; }
+    void postVisitImageNode(ImageFilter* /*pImageFilter*/) override {
+        Recorder recorder;
+        controller_.depthFirstSearch(recorder);
     }
-    EXPECT_EQ(Node::COLOR_NOT_VISITED, graph.x.color());
+    ImageFlowController& controller_;
+    int nVisits_ = 0;
+};
+
+TEST_F(ImageFlowControllerTest, thereIsNoVisitorBetweenWalks) {
+    constexpr char const* pText = "Enforce pVisitor_ != NULL";
+    TestFilter sink(0, false, "sink");
+    OpenController controller;
+    plant(controller, {&sink}, sink);
+    ORVO_EXPECT_INTERNAL(controller.depthFirstVisit(&sink), pText);
+    Recorder recorder;
+    controller.depthFirstSearch(recorder);
+    ORVO_EXPECT_INTERNAL(controller.depthFirstVisit(&sink), pText);
+    controller.breadthFirstSearch(recorder);
+    ORVO_EXPECT_INTERNAL(controller.depthFirstVisit(&sink), pText);
+    EXPECT_EQ("+sink -sink +sink -sink", recorder.sVisits_);
+}
+
+TEST_F(ImageFlowControllerTest, aWalkWithinAWalkEndsTheOuterOne) {
+    constexpr char const* pText = "Enforce pVisitor_ != NULL";
+    Diamond graph;
+    Wanderer depth(graph.oController_);
+    ORVO_EXPECT_INTERNAL(graph.oController_.depthFirstSearch(depth), pText);
+    EXPECT_EQ(3, depth.nVisits_); // d, b and a, on leaving which the other walk begins
+    Wanderer breadth(graph.oController_);
+    ORVO_EXPECT_INTERNAL(graph.oController_.breadthFirstSearch(breadth), pText);
+    EXPECT_EQ(1, breadth.nVisits_);
 }
 
 TEST_F(ImageFlowControllerTest, walksNeedASinkAndFullInputs) {
@@ -102,8 +141,7 @@ TEST_F(ImageFlowControllerTest, walksNeedASinkAndFullInputs) {
     EXPECT_EQ("", recorder.sVisits_);
 
     TestFilter sink(1, false, "sink");
-    controller.addNode(&sink);
-    controller.setImageSink(sink);
+    plant(controller, {&sink}, sink);
     EXPECT_EQ(&sink, static_cast<ImageFlowController const&>(controller).imageSink());
     ORVO_EXPECT_INTERNAL(controller.depthFirstSearch(recorder), "Enforce pOutput != NULL");
     ORVO_EXPECT_INTERNAL(controller.breadthFirstSearch(recorder), "Enforce pOutput != NULL");
@@ -128,9 +166,7 @@ TEST_F(ImageFlowControllerTest, walksPassNodesOfAnotherKindAsNull) {
     TestFilter sink(1, false, "sink");
     DataFlow::Connect(sink.in(), foreign.oOutput_);
     ImageFlowController controller;
-    controller.addNode(&foreign);
-    controller.addNode(&sink);
-    controller.setImageSink(sink);
+    plant(controller, {&foreign, &sink}, sink);
     Recorder depth;
     controller.depthFirstSearch(depth);
     EXPECT_EQ("+sink +null -null -sink", depth.sVisits_);
@@ -150,9 +186,7 @@ TEST_F(ImageFlowControllerTest, aCycleEndsTheWalk) {
     feed(a, 0, b);
     feed(b, 0, a);
     ImageFlowController controller;
-    controller.addNode(&a);
-    controller.addNode(&b);
-    controller.setImageSink(a);
+    plant(controller, {&a, &b}, a);
     Recorder depth;
     controller.depthFirstSearch(depth);
     EXPECT_EQ("+a +b -b -a", depth.sVisits_);
@@ -245,12 +279,12 @@ TEST_F(ImageFlowControllerTest, theSameRegionsMakeNothingDirty) {
     graph.oController_.setDirtyState();
     graph.oController_.computeRegions(world(0, 0, 10, 10));
     graph.oController_.setDirtyState();
-    for (TestFilter* pFilter : {&graph.a, &graph.b, &graph.c, &graph.d}) {
+    for (TestFilter* pFilter : graph.reached()) {
         EXPECT_FALSE(pFilter->isDirty()) << pFilter->name();
     }
     graph.oController_.computeRegions(world(0, 0, 10, 11));
     graph.oController_.setDirtyState();
-    for (TestFilter* pFilter : {&graph.a, &graph.b, &graph.c, &graph.d}) {
+    for (TestFilter* pFilter : graph.reached()) {
         EXPECT_TRUE(pFilter->isDirty()) << pFilter->name();
     }
 }
@@ -262,6 +296,11 @@ TEST_F(ImageFlowControllerTest, infiniteComputeRegionsAreRefused) {
     graph.a.setGeneratedRegion(infiniteWorld());
     graph.oController_.computeRegions(world(0, 0, 8, 8));
     EXPECT_EQ(world(0, 0, 8, 8), graph.a.computeRegionParameter().value());
+    // One endless direction is enough.
+    float const infinity = std::numeric_limits<float>::infinity();
+    for (auto const& asked : {world(0, 0, infinity, 8), world(0, 0, 8, infinity)}) {
+        ORVO_EXPECT_INTERNAL(graph.oController_.computeRegions(asked), "Output region can't be infinite.");
+    }
     ORVO_EXPECT_INTERNAL(graph.oController_.computeRegions(infiniteWorld()),
                          "Output region can't be infinite.");
     // The first node in the list has its region; those after it keep their old one.
@@ -292,10 +331,7 @@ TEST_F(ImageFlowControllerTest, regionsOfAFailedPassAreForgotten) {
     feed(sink, 0, first);
     feed(sink, 1, second);
     ImageFlowController controller;
-    for (TestFilter* pFilter : std::initializer_list<TestFilter*>{&source, &first, &second, &sink}) {
-        controller.addNode(pFilter);
-    }
-    controller.setImageSink(sink);
+    plant(controller, {&source, &first, &second, &sink}, sink);
     source.setGeneratedRegion(world(0, 0, 100, 100));
     ORVO_EXPECT_INTERNAL(controller.computeRegions(world(50, 50, 4, 4)), "helpless");
     // The source is left with the region of one consumer of two.
@@ -305,6 +341,17 @@ TEST_F(ImageFlowControllerTest, regionsOfAFailedPassAreForgotten) {
     EXPECT_EQ(world(0, 0, 4, 4), source.regionOfInterest());
     EXPECT_EQ(world(0, 0, 4, 4), source.computeRegionParameter().value());
     EXPECT_TRUE(source.aParentROIs_.empty());
+}
+
+TEST_F(ImageFlowControllerTest, theSinkKeepsTheRegionOfAPassThatFailed) {
+    TestFilter source(0, true, "source");
+    TestFilter sink(2, false, "sink");
+    feed(sink, 0, source);
+    ImageFlowController controller;
+    plant(controller, {&source, &sink}, sink);
+    ORVO_EXPECT_INTERNAL(controller.propagateROIs(world(1, 2, 3, 4)), "Enforce pOutput != NULL");
+    EXPECT_EQ(world(1, 2, 3, 4), sink.regionOfInterest());
+    EXPECT_FALSE(source.regionOfInterest().extent().isDefined());
 }
 
 TEST_F(ImageFlowControllerTest, anOutputThatNobodyConsumesFailsThePass) {
@@ -326,10 +373,7 @@ TEST_F(ImageFlowControllerTest, aTreeCanBeAskedBreadthFirst) {
     feed(sink, 0, a);
     feed(sink, 1, b);
     ImageFlowController controller;
-    controller.addNode(&a);
-    controller.addNode(&b);
-    controller.addNode(&sink);
-    controller.setImageSink(sink);
+    plant(controller, {&a, &b, &sink}, sink);
     sink.setRegionOfInterest(world(0, 0, 3, 3));
     PropagateROIVisitor visitor;
     controller.breadthFirstSearch(visitor);
@@ -354,7 +398,7 @@ TEST_F(ImageFlowControllerTest, theSinksImageDecidesThePrecisionOfAllNodes) {
         Diamond graph;
         ImageCPU image(row.format, pixels(0, 0, 2, 2), PixelExtentInWorldSpace(), ExtentInPixelSpace());
         graph.d.setBoundOutputImage(&image);
-        for (TestFilter* pFilter : {&graph.a, &graph.b, &graph.c, &graph.d, &graph.x}) {
+        for (TestFilter* pFilter : graph.all()) {
             pFilter->outputPrecisionHintParameter().setValue(ImageFilter::OUTPUT_PRECISION_DEFAULT);
         }
         graph.c.outputPrecisionHintParameter().setValue(ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT);
@@ -371,17 +415,6 @@ TEST_F(ImageFlowControllerTest, theSinksImageDecidesThePrecisionOfAllNodes) {
     }
 }
 
-TEST_F(ImageFlowControllerTest, aSinkOnTheGPUSaysNothingAboutCPUFormats) {
-    Diamond graph;
-    ImageCPU image(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 2, 2), PixelExtentInWorldSpace(),
-                   ExtentInPixelSpace());
-    graph.d.setBoundOutputImage(&image);
-    graph.d.outputTarget_ = ORVO_TARGET_GL;
-    ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true),
-                         "Not implemented: ImageGPU Pixel format not supported");
-    graph.d.outputTarget_ = ORVO_TARGET_CPU;
-}
-
 TEST_F(ImageFlowControllerTest, channelCountsFlowFromTheSourcesWhateverTheOrderOfTheList) {
     TestFilter source(0, true, "source");
     TestFilter middle(1, true, "middle");
@@ -392,10 +425,7 @@ TEST_F(ImageFlowControllerTest, channelCountsFlowFromTheSourcesWhateverTheOrderO
     feed(middle, 0, source);
     feed(sink, 0, middle);
     ImageFlowController controller;
-    for (TestFilter* pFilter : {&sink, &middle, &source}) { // as a compiler adds its converters: last
-        controller.addNode(pFilter);
-    }
-    controller.setImageSink(sink);
+    plant(controller, {&sink, &middle, &source}, sink); // as a compiler adds its converters: last
     ImageCPU image(ImageCPU::PIXEL_FORMAT_RGB8, pixels(0, 0, 2, 2), PixelExtentInWorldSpace(),
                    ExtentInPixelSpace());
     sink.setBoundOutputImage(&image);
@@ -411,6 +441,9 @@ TEST_F(ImageFlowControllerTest, formatsFromTheSinkNeedAnImageThere) {
     Diamond graph;
     constexpr char const* pText = "(pSink->imageOutput()->hasData()) == true";
     ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true), pText);
+    // The image is asked for before the walk finds the gap.
+    graph.c.in().disconnect();
+    ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true), pText);
     TestFilter sink(1, false, "sink");
     feed(sink, 0, graph.d);
     graph.oController_.addNode(&sink);
@@ -418,18 +451,57 @@ TEST_F(ImageFlowControllerTest, formatsFromTheSinkNeedAnImageThere) {
     ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true), pText);
 }
 
+/// The diamond with an image bound to its sink and no precision chosen.
+struct BoundDiamond : Diamond {
+    BoundDiamond()
+        : oImage_(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 2, 2), PixelExtentInWorldSpace(),
+                  ExtentInPixelSpace()) {
+        d.setBoundOutputImage(&oImage_);
+        for (TestFilter* pFilter : all()) {
+            pFilter->outputPrecisionHintParameter().setValue(ImageFilter::OUTPUT_PRECISION_DEFAULT);
+        }
+    }
+    ImageCPU oImage_;
+};
+
+TEST_F(ImageFlowControllerTest, aSinkOnTheGPUSaysNothingAboutCPUFormats) {
+    BoundDiamond graph;
+    graph.d.outputTarget_ = ORVO_TARGET_GL;
+    ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true),
+                         "Not implemented: ImageGPU Pixel format not supported");
+    graph.d.outputTarget_ = ORVO_TARGET_CPU;
+}
+
+TEST_F(ImageFlowControllerTest, aFailureLeavesThePrecisionOfAllNodes) {
+    BoundDiamond graph;
+    auto const expectUntouched = [&] {
+        for (TestFilter* pFilter : graph.all()) {
+            EXPECT_EQ(ImageFilter::OUTPUT_PRECISION_DEFAULT, pFilter->outputPrecisionHint())
+                << pFilter->name();
+        }
+    };
+    graph.c.in().disconnect();
+    ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true), "Enforce pOutput != NULL");
+    expectUntouched();
+    feed(graph.c, 0, graph.x);
+    ForeignNode foreign;
+    graph.oController_.addNode(&foreign);
+    ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true), "iff!=0");
+    expectUntouched();
+}
+
 TEST_F(ImageFlowControllerTest, formatsComeFromTheSourcesUnlessTheSinkHoldsAnImage) {
-    Diamond graph;
-    ImageCPU image(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 2, 2), PixelExtentInWorldSpace(),
-                   ExtentInPixelSpace());
-    graph.d.setBoundOutputImage(&image);
-    graph.oController_.setNodeImageDescriptorInfo(false);
-    for (TestFilter* pFilter : {&graph.a, &graph.b, &graph.c, &graph.d, &graph.x}) {
+    BoundDiamond graph;
+    ForeignNode foreign;
+    graph.oController_.addNode(&foreign);
+    graph.oController_.setNodeImageDescriptorInfo(false); // stops at the first node
+    for (TestFilter* pFilter : graph.all()) {
         EXPECT_FALSE(pFilter->getImageDescInfoFromSource());
     }
+    graph.oController_.removeNode(&foreign);
     graph.d.setBoundOutputImage(nullptr);
     graph.oController_.setNodeImageDescriptorInfo(false);
-    for (TestFilter* pFilter : {&graph.a, &graph.b, &graph.c, &graph.d, &graph.x}) {
+    for (TestFilter* pFilter : graph.all()) {
         EXPECT_TRUE(pFilter->getImageDescInfoFromSource());
     }
 }

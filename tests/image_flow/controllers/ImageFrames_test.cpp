@@ -22,6 +22,7 @@ using Test::feed;
 using Test::floatImage;
 using Test::pixelAt;
 using Test::pixels;
+using Test::plant;
 using Test::TestFilter;
 using Test::world;
 using ImagePtr = std::unique_ptr<ImageCPU, ORVODeleter<ImageCPU>>;
@@ -43,11 +44,7 @@ struct Graph {
         oBlur_.iRadius_ = 2;
         oLeft_.iRadius_ = 1;
         oRight_.oOffset_.setValue(8.0f);
-        for (ImageFilter* pFilter :
-             std::initializer_list<ImageFilter*>{&oSource_, &oBlur_, &oLeft_, &oRight_, &oJoin_, &oSink_}) {
-            oController_.addNode(pFilter);
-        }
-        oController_.setImageSink(oSink_);
+        plant(oController_, {&oSource_, &oBlur_, &oLeft_, &oRight_, &oJoin_, &oSink_}, oSink_);
         oSource_.setImageCPUWithNoOwnership(upImage_.get());
     }
     ~Graph() { oSink_.disconnect(); }
@@ -59,6 +56,18 @@ struct Graph {
     void prepare() {
         emitAll(oController_);
         oController_.computeRegions(world(-8, -4, 40, 30));
+    }
+
+    /// A frame of the whole picture.
+    void run() {
+        prepare();
+        oController_.process();
+    }
+
+    /// Waits for an asynchronous frame and throws its failure.
+    void finish() {
+        ASSERT_TRUE(oController_.wait(60, 0.0005));
+        oController_.checkException();
     }
 
     /// The picture's mean over 5 by 5 pixels, cut off at its edges.
@@ -84,6 +93,12 @@ struct Graph {
             }
         }
         return sum / 9;
+    }
+
+    /// A frame after whatever went before is right.
+    void expectNextFrameRight() {
+        run();
+        expectRight();
     }
 
     /// Whether the sink holds what an evaluation by hand gives.
@@ -125,13 +140,10 @@ TEST_F(ImageFramesTest, resultsDoNotDependOnThreadsOrGrain) {
                 Controller::setMinimumGrainSize(nGrain);
                 Graph graph;
                 graph.oController_.setSingleThreadMode(bSingle);
-                graph.prepare();
-                graph.oController_.process();
-                graph.expectRight();
+                graph.expectNextFrameRight();
                 graph.prepare();
                 graph.oController_.processAsync();
-                ASSERT_TRUE(graph.oController_.wait(60, 0.0005));
-                graph.oController_.checkException();
+                graph.finish();
                 graph.expectRight();
             }
         }
@@ -140,8 +152,7 @@ TEST_F(ImageFramesTest, resultsDoNotDependOnThreadsOrGrain) {
 
 TEST_F(ImageFramesTest, everyNodeRunsOnceAFrame) {
     Graph graph;
-    graph.prepare();
-    graph.oController_.process();
+    graph.run();
     for (TestFilter* pFilter : {&graph.oBlur_, &graph.oLeft_, &graph.oRight_, &graph.oJoin_}) {
         EXPECT_EQ(1, pFilter->nRuns_) << pFilter->name();
         // The window of `left` reaches one row beyond the picture on each side, and so does the blur before
@@ -160,8 +171,7 @@ TEST_F(ImageFramesTest, theFrameAfterAFailedOneIsRight) {
             auto const frame = [&] {
                 if (bAsync) {
                     graph.oController_.processAsync();
-                    EXPECT_TRUE(graph.oController_.wait(60, 0.0005));
-                    graph.oController_.checkException();
+                    graph.finish();
                 } else {
                     graph.oController_.process();
                 }
@@ -186,9 +196,7 @@ TEST_F(ImageFramesTest, aFailureInSingleThreadModeComesOutAsItIs) {
     ORVO_EXPECT_INTERNAL(graph.oController_.process(), "slice failed");
     graph.oRight_.bThrow_ = false;
     graph.oController_.flushGraph();
-    graph.prepare();
-    graph.oController_.process();
-    graph.expectRight();
+    graph.expectNextFrameRight();
 }
 
 TEST_F(ImageFramesTest, theFrameAfterABadRegionIsRight) {
@@ -200,9 +208,7 @@ TEST_F(ImageFramesTest, theFrameAfterABadRegionIsRight) {
         graph.oController_.computeRegions(PositionExtentInWorldSpace(ExtentInWorldSpace(infinity, infinity))),
         "Output region can't be infinite.");
     graph.oSource_.setGeneratedRegion(world(-8, -4, 40, 30));
-    graph.prepare();
-    graph.oController_.process();
-    graph.expectRight();
+    graph.expectNextFrameRight();
 }
 
 TEST_F(ImageFramesTest, regionsWithoutPixelsGiveEmptyImages) {
@@ -215,9 +221,7 @@ TEST_F(ImageFramesTest, regionsWithoutPixelsGiveEmptyImages) {
         EXPECT_EQ(0u, graph.oSink_.getImageCPU()->numberOfPixels());
         EXPECT_EQ(0u, graph.oJoin_.nRows_);
     }
-    graph.prepare();
-    graph.oController_.process();
-    graph.expectRight();
+    graph.expectNextFrameRight();
 }
 
 TEST_F(ImageFramesTest, cancelledFramesLeaveNothingBehind) {
@@ -231,9 +235,7 @@ TEST_F(ImageFramesTest, cancelledFramesLeaveNothingBehind) {
         ASSERT_TRUE(graph.oController_.wait(60, 0.0005));
         graph.oController_.flushGraph();
         if (i % 20 == 0) {
-            graph.prepare();
-            graph.oController_.process();
-            graph.expectRight();
+            graph.expectNextFrameRight();
         }
     }
 }
@@ -244,8 +246,7 @@ TEST_F(ImageFramesTest, aRelaunchWaitsForTheFrameUnderWay) {
         graph.prepare();
         graph.oController_.processAsync();
         graph.oController_.processAsync(); // joins the one before
-        ASSERT_TRUE(graph.oController_.wait(60, 0.0005));
-        graph.oController_.checkException();
+        graph.finish();
         graph.expectRight();
     }
 }
@@ -296,10 +297,7 @@ TEST_F(ImageFramesTest, aChainMayChangeTheResolution) {
     feed(halving, 0, source);
     feed(after, 0, halving);
     feed(sink, 0, after);
-    for (ImageFilter* pFilter : std::initializer_list<ImageFilter*>{&source, &halving, &after, &sink}) {
-        controller.addNode(pFilter);
-    }
-    controller.setImageSink(sink);
+    plant(controller, {&source, &halving, &after, &sink}, sink);
     source.setImageCPUWithNoOwnership(upImage.get());
     source.emit();
     controller.computeRegions(world(0, 0, 4, 2));
@@ -325,10 +323,8 @@ TEST_F(ImageFramesTest, everyAllocationOfAFrameMayFail) {
         {
             Core::AllocationFailure failure(n);
             try {
-                graph.prepare();
-                graph.oController_.process();
-                graph.prepare();
-                graph.oController_.process();
+                graph.run();
+                graph.run();
             } catch (std::exception const&) {
                 EXPECT_TRUE(failure.hasFired());
             }
@@ -340,9 +336,7 @@ TEST_F(ImageFramesTest, everyAllocationOfAFrameMayFail) {
         }
         ++nFailures;
         graph.oController_.flushGraph();
-        graph.prepare();
-        graph.oController_.process();
-        graph.expectRight();
+        graph.expectNextFrameRight();
     }
     EXPECT_GE(nFailures, 10); // four images of two blocks each, and the sink's copies
 }

@@ -1,8 +1,8 @@
 #include "orvo/image_flow/filters/ConvertFromSIMDOptimized.h"
 #include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
 
-#include "orvo/core/exceptions/SharedException.h"
 #include "orvo/image_runtime/BlankSIMDOptimizedImageCPU.h"
+#include "tests/image_flow/support/FilterRoad.h"
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
@@ -17,53 +17,10 @@ namespace {
 
 using Hint = ImageFilter::teOutputPrecisionHint;
 using Test::feed;
+using Test::FilterRoad;
 using Test::pixelAt;
 using Test::pixels;
 using Test::world;
-
-/// A source, a converter and a sink.
-template <typename Converter>
-struct Road {
-    Road() {
-        feed(oConverter_, 0, oSource_);
-        oController_.addNode(&oSource_);
-        oController_.addNode(&oConverter_);
-        oController_.setImageSink(oConverter_);
-    }
-    ~Road() {
-        oConverter_.disconnect();
-        oSink_.disconnect();
-    }
-
-    /// Runs a frame into an image of the graph's own.
-    ImageCPU const& run(ImageCPU& image, PositionExtentInWorldSpace const& region) {
-        if (oConverter_.imageOutput()->connectedInput() == nullptr) {
-            feed(oSink_, 0, oConverter_);
-            oController_.addNode(&oSink_);
-            oController_.setImageSink(oSink_);
-        }
-        launch(image, region);
-        return *oSink_.getImageCPU();
-    }
-
-    /// Runs a frame into the client's image.
-    void runInto(ImageCPU& image, ImageCPU& target, PositionExtentInWorldSpace const& region) {
-        oConverter_.setBoundOutputImage(&target);
-        launch(image, region);
-    }
-
-    void launch(ImageCPU& image, PositionExtentInWorldSpace const& region) {
-        oSource_.setImageCPUWithNoOwnership(&image);
-        oSource_.emit();
-        oController_.computeRegions(region);
-        oController_.process();
-    }
-
-    ImageFlowController oController_;
-    ImageCPUInput oSource_;
-    Converter oConverter_;
-    ImageCPUOutput oSink_;
-};
 
 ImageCPU makeImage(ImageCPU::tePixelFormat format, PositionExtentInPixelSpace const& region,
                    int capacityWidth) {
@@ -139,10 +96,10 @@ TEST_F(ConvertSIMDOptimizedTest, everyFormatBecomesFloat) {
     for (int format = 1; format <= 14; ++format) {
         auto const eFormat = static_cast<ImageCPU::tePixelFormat>(format);
         SCOPED_TRACE(testing::Message() << eFormat);
-        Road<ConvertToSIMDOptimized> road;
+        FilterRoad<ConvertToSIMDOptimized> road;
         ImageCPU image = makeImage(eFormat, pixels(-7, 3, 19, 6), 23);
         paint(image);
-        ImageCPU const& result = road.run(image, world(-7, 3, 19, 6));
+        ImageCPU const& result = *road.run(image, world(-7, 3, 19, 6));
         EXPECT_EQ(32u, channelSizeBits(result.pixelFormat()));
         ASSERT_EQ(nChannels(eFormat), nChannels(result.pixelFormat()));
         ASSERT_EQ(pixels(-7, 3, 19, 6), result.positionExtent());
@@ -157,7 +114,7 @@ TEST_F(ConvertSIMDOptimizedTest, everyFormatBecomesFloat) {
 }
 
 TEST_F(ConvertSIMDOptimizedTest, halfFloatsAreRefused) {
-    Road<ConvertToSIMDOptimized> road;
+    FilterRoad<ConvertToSIMDOptimized> road;
     ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA16F, pixels(0, 0, 4, 4), 4);
     ORVO_EXPECT_INTERNAL(road.run(image, world(0, 0, 4, 4)),
                          "Pixel format not supported by ORVO in CPU mode");
@@ -169,11 +126,11 @@ TEST_F(ConvertSIMDOptimizedTest, floatBecomesEveryFormatOfTheHints) {
              {ImageCPU::PIXEL_FORMAT_LUMINANCE32F, ImageCPU::PIXEL_FORMAT_LUMINANCE_ALPHA32F,
               ImageCPU::PIXEL_FORMAT_RGB32F, ImageCPU::PIXEL_FORMAT_RGBA32F}) {
             SCOPED_TRACE(testing::Message() << format << ", hint " << hint);
-            Road<ConvertFromSIMDOptimized> road;
-            road.oConverter_.outputPrecisionHintParameter().setValue(static_cast<Hint>(hint));
+            FilterRoad<ConvertFromSIMDOptimized> road;
+            road.filter().outputPrecisionHintParameter().setValue(static_cast<Hint>(hint));
             ImageCPU image = makeImage(format, pixels(2, -3, 13, 5), 16);
             paint(image);
-            ImageCPU const& result = road.run(image, world(2, -3, 13, 5));
+            ImageCPU const& result = *road.run(image, world(2, -3, 13, 5));
             EXPECT_EQ(hint == 0 ? 8u : hint == 1 ? 16u : 32u, channelSizeBits(result.pixelFormat()));
             ASSERT_EQ(nChannels(format), nChannels(result.pixelFormat()));
             // The first and last few bytes of a row are truncated, the others rounded.
@@ -192,13 +149,13 @@ TEST_F(ConvertSIMDOptimizedTest, floatBecomesEveryFormatOfTheHints) {
 TEST_F(ConvertSIMDOptimizedTest, backAndForthBytesAndWordsStayWhatTheyAre) {
     for (ImageCPU::tePixelFormat const format :
          {ImageCPU::PIXEL_FORMAT_RGBA8, ImageCPU::PIXEL_FORMAT_RGBA16}) {
-        Road<ConvertToSIMDOptimized> there;
+        FilterRoad<ConvertToSIMDOptimized> there;
         ImageCPU image = makeImage(format, pixels(0, 0, 16, 8), 16);
         paint(image);
         ImageCPU simd = makeImage(ImageCPU::PIXEL_FORMAT_RGBA32F, pixels(0, 0, 16, 8), 16);
         there.runInto(image, simd, world(0, 0, 16, 8));
         ASSERT_TRUE(simd.isInSIMDOptimizedFormat());
-        Road<ConvertFromSIMDOptimized> back;
+        FilterRoad<ConvertFromSIMDOptimized> back;
         ImageCPU result = makeImage(format, pixels(0, 0, 16, 8), 16);
         back.runInto(simd, result, world(0, 0, 16, 8));
         EXPECT_EQ(0, std::memcmp(image.pixels(), result.pixels(), 16 * 8 * pixelSizeBytes(format)));
@@ -206,25 +163,25 @@ TEST_F(ConvertSIMDOptimizedTest, backAndForthBytesAndWordsStayWhatTheyAre) {
 }
 
 TEST_F(ConvertSIMDOptimizedTest, workOnTheComputeRegionAlone) {
-    Road<ConvertToSIMDOptimized> road;
+    FilterRoad<ConvertToSIMDOptimized> road;
     ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(-20, -10, 50, 40), 64);
     paint(image);
-    ImageCPU const& result = road.run(image, world(-13, 4, 6, 9));
+    ImageCPU const& result = *road.run(image, world(-13, 4, 6, 9));
     EXPECT_EQ(pixels(-13, 4, 6, 9), result.positionExtent());
     EXPECT_NEAR(numberAt(image, -8, 12, 2), numberAt(result, -8, 12, 2), 1e-6);
     EXPECT_NEAR(numberAt(image, -13, 4, 0), numberAt(result, -13, 4, 0), 1e-6);
 
-    Road<ConvertFromSIMDOptimized> back;
-    back.oConverter_.outputPrecisionHintParameter().setValue(ImageFilter::OUTPUT_PRECISION_16_BIT_INT);
+    FilterRoad<ConvertFromSIMDOptimized> back;
+    back.filter().outputPrecisionHintParameter().setValue(ImageFilter::OUTPUT_PRECISION_16_BIT_INT);
     ImageCPU simd = makeImage(ImageCPU::PIXEL_FORMAT_LUMINANCE32F, pixels(-20, -10, 50, 40), 64);
     paint(simd);
-    ImageCPU const& words = back.run(simd, world(-13, 4, 6, 9));
+    ImageCPU const& words = *back.run(simd, world(-13, 4, 6, 9));
     EXPECT_EQ(pixels(-13, 4, 6, 9), words.positionExtent());
     EXPECT_NEAR(numberAt(simd, -8, 12, 0), numberAt(words, -8, 12, 0), 0.5 / 32768 + 1e-7);
 }
 
 TEST_F(ConvertSIMDOptimizedTest, theRestOfABoundImageStaysAsItIs) {
-    Road<ConvertToSIMDOptimized> road;
+    FilterRoad<ConvertToSIMDOptimized> road;
     ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 32, 16), 32);
     paint(image);
     ImageCPU target = makeImage(ImageCPU::PIXEL_FORMAT_RGBA32F, pixels(-4, -4, 40, 24), 40);
@@ -242,7 +199,7 @@ TEST_F(ConvertSIMDOptimizedTest, theRestOfABoundImageStaysAsItIs) {
         }
     }
 
-    Road<ConvertFromSIMDOptimized> back;
+    FilterRoad<ConvertFromSIMDOptimized> back;
     ImageCPU bytes = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(-1, -1, 40, 30), 43);
     std::memset(bytes.pixels(), 0x41, 43 * 30 * 4);
     paint(target);
@@ -256,39 +213,54 @@ TEST_F(ConvertSIMDOptimizedTest, theRestOfABoundImageStaysAsItIs) {
 }
 
 TEST_F(ConvertSIMDOptimizedTest, refuseABoundImageThatDoesNotHoldTheRegion) {
-    Road<ConvertToSIMDOptimized> road;
+    FilterRoad<ConvertToSIMDOptimized> road;
     ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 32, 16), 32);
     paint(image);
     ImageCPU target = makeImage(ImageCPU::PIXEL_FORMAT_RGBA32F, pixels(0, 0, 16, 16), 16);
     ORVO_EXPECT_INTERNAL(road.runInto(image, target, world(0, 0, 17, 16)),
                          "Compute region lies outside the bound output image");
-    road.oController_.flushGraph();
     road.runInto(image, target, world(0, 0, 16, 16));
     EXPECT_NEAR(numberAt(image, 15, 15, 3), numberAt(target, 15, 15, 3), 1e-6);
-    Road<ConvertFromSIMDOptimized> back;
+    FilterRoad<ConvertFromSIMDOptimized> back;
     ImageCPU bytes = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 8, 8), 8);
     ORVO_EXPECT_INTERNAL(back.runInto(target, bytes, world(1, 1, 8, 7)),
                          "Compute region lies outside the bound output image");
 }
 
-TEST_F(ConvertSIMDOptimizedTest, refuseAnInputThatDoesNotCoverTheRegion) {
-    Road<ConvertToSIMDOptimized> road;
-    ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 8, 8), 8);
-    paint(image);
-    road.oSource_.setGeneratedRegion(world(0, 0, 12, 8));
-    try {
-        road.run(image, world(2, 0, 8, 8));
-        ADD_FAILURE() << "nothing thrown";
-    } catch (SharedException const& exception) {
-        auto const* const pInner = dynamic_cast<InternalException const*>(exception.exception().get());
-        ASSERT_NE(nullptr, pInner);
-        EXPECT_EQ("endX <= int( inputImage.position().x() + inputImage.extent().width() )",
-                  std::string(pInner->message()));
+template <typename Converter>
+void expectRefusals() {
+    struct Row {
+        PositionExtentInWorldSpace region;
+        char const* text;
+    };
+    // Columns are counted from the input's left edge where the region begins before it, and rows likewise.
+    for (Row const& row :
+         {Row{world(2, 0, 8, 8), "endX <= int( inputImage.position().x() + inputImage.extent().width() )"},
+          Row{world(-4, 0, 8, 8),
+              "endX <= int( pOutputImage->position().x() + pOutputImage->extent().width() )"},
+          Row{world(-9, 0, 8, 8),
+              "endX <= int( pOutputImage->position().x() + pOutputImage->extent().width() )"},
+          Row{world(9, 0, 8, 8), "endX <= int( inputImage.position().x() + inputImage.extent().width() )"},
+          Row{world(0, 2, 8, 8), "endY <= int( inputImage.position().y() + inputImage.extent().height() )"},
+          Row{world(0, -4, 8, 8),
+              "endY <= int( pOutputImage->position().y() + pOutputImage->extent().height() )"}}) {
+        SCOPED_TRACE(testing::Message() << row.region);
+        FilterRoad<Converter> road;
+        ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA32F, pixels(0, 0, 8, 8), 8);
+        paint(image);
+        road.source().setGeneratedRegion(world(-20, -20, 40, 40));
+        road.filter().outputPrecisionHintParameter().setValue(ImageFilter::OUTPUT_PRECISION_32_BIT_FLOAT);
+        road.controller().setSingleThreadMode(true);
+        ORVO_EXPECT_INTERNAL(road.run(image, row.region), row.text);
+        // The frame after the failed one is right.
+        ImageCPU const& result = *road.run(image, world(0, 0, 8, 8));
+        EXPECT_EQ(numberAt(image, 7, 7, 3), numberAt(result, 7, 7, 3));
     }
-    // The frame after the failed one is right.
-    road.oController_.flushGraph();
-    ImageCPU const& result = road.run(image, world(0, 0, 8, 8));
-    EXPECT_NEAR(numberAt(image, 7, 7, 3), numberAt(result, 7, 7, 3), 1e-6);
+}
+
+TEST_F(ConvertSIMDOptimizedTest, refuseAnInputThatDoesNotCoverTheRegion) {
+    expectRefusals<ConvertToSIMDOptimized>();
+    expectRefusals<ConvertFromSIMDOptimized>();
 }
 
 /// The converter with its image in the making.
@@ -345,12 +317,12 @@ TEST_F(ConvertSIMDOptimizedTest, aNewImageIsTransparentBlackWhereNothingIsConver
 }
 
 TEST_F(ConvertSIMDOptimizedTest, columnsBeyondTheInputStayTransparentBlack) {
-    Road<ConvertToSIMDOptimized> road;
+    FilterRoad<ConvertToSIMDOptimized> road;
     ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 8, 4), 8);
     std::memset(image.pixels(), 255, 8 * 4 * 4);
-    road.oSource_.setGeneratedRegion(world(0, 0, 12, 4));
+    road.source().setGeneratedRegion(world(0, 0, 12, 4));
     soilStorage(4, ExtentInPixelSpace(12, 4));
-    ImageCPU const& result = road.run(image, world(0, 0, 12, 4));
+    ImageCPU const& result = *road.run(image, world(0, 0, 12, 4));
     ASSERT_EQ(pixels(0, 0, 12, 4), result.positionExtent());
     for (int y = 0; y < 4; ++y) {
         for (int x = 0; x < 12; ++x) {
@@ -405,10 +377,10 @@ TEST_F(ConvertSIMDOptimizedTest, followThePixelExtentOfTheSource) {
                    ExtentInPixelSpace(4, 2));
     std::memset(image.pixels(), 255, 8);
     image.pixels()[7] = 0;
-    Road<ConvertToSIMDOptimized> road;
-    road.oSource_.setOutputPixelExtent(PixelExtentInWorldSpace(2, 0.5f));
+    FilterRoad<ConvertToSIMDOptimized> road;
+    road.source().setOutputPixelExtent(PixelExtentInWorldSpace(2, 0.5f));
     // The columns -1 to 2 and the row 2 of pixels that are 2 wide and 0.5 high.
-    ImageCPU const& result = road.run(image, world(-2, 1, 6, 0.5f));
+    ImageCPU const& result = *road.run(image, world(-2, 1, 6, 0.5f));
     EXPECT_EQ(pixels(-1, 2, 3, 1), result.positionExtent());
     EXPECT_EQ(PixelExtentInWorldSpace(2, 0.5f), result.pixelExtent());
     EXPECT_NEAR(1.0f, *pixelAt(result, -1, 2), 1e-6f);
@@ -425,13 +397,38 @@ TEST_F(ConvertSIMDOptimizedTest, needAChannelCountAndAHint) {
                          "Not implemented: pixelFormat not supported in ImageFilter::allocateOutputImage()");
 }
 
+TEST_F(ConvertSIMDOptimizedTest, aFailedAllocationLeavesNoImage) {
+    OpenConverter converter;
+    converter.setImageDescInfoFromSource(true);
+    converter.setInput(ORVO_NEW ImageCPU(ImageCPU::PIXEL_FORMAT_RGB8, pixels(0, 0, 4, 4),
+                                         PixelExtentInWorldSpace(), ExtentInPixelSpace()));
+    converter.computeRegionParameter().setValue(world(0, 0, 4, 4));
+    converter.allocateOutputImage();
+    ASSERT_NE(nullptr, converter.spOutputImage_.get());
+    // The image there is too small for the next region, and there is no image as large as that.
+    converter.computeRegionParameter().setValue(world(0, 0, 100000, 100000));
+    ORVO_EXPECT_PARAMETER(converter.allocateOutputImage(), "Image size exceeds 4294967295 bytes");
+    EXPECT_EQ(nullptr, converter.spOutputImage_.get());
+}
+
+/// A converter back that makes no image.
+class ImagelessConverter : public ConvertFromSIMDOptimized {
+public:
+    void allocateOutputImage() override {}
+};
+
+TEST_F(ConvertSIMDOptimizedTest, theWayBackNeedsAnImage) {
+    ImagelessConverter converter;
+    ORVO_EXPECT_INTERNAL(converter.prepareForRender(), "pOutputImage_");
+}
+
 TEST_F(ConvertSIMDOptimizedTest, anEmptyRegionConvertsNothing) {
-    Road<ConvertToSIMDOptimized> road;
+    FilterRoad<ConvertToSIMDOptimized> road;
     ImageCPU image = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 8, 8), 8);
     paint(image);
-    EXPECT_EQ(0u, road.run(image, world(100, 100, 4, 4)).numberOfPixels());
+    EXPECT_EQ(0u, road.run(image, world(100, 100, 4, 4))->numberOfPixels());
     ImageCPU empty = makeImage(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 0, 0), 0);
-    EXPECT_EQ(0u, road.run(empty, world(0, 0, 4, 4)).numberOfPixels());
+    EXPECT_EQ(0u, road.run(empty, world(0, 0, 4, 4))->numberOfPixels());
 }
 
 } // namespace

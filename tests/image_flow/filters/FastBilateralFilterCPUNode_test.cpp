@@ -227,9 +227,8 @@ TEST_F(FastBilateralFilterCPUNodeTest, EmptyRegionsGiveEmptyImages) {
     FilterImage image(ImageCPU::PIXEL_FORMAT_RGBA32F, Picture(0, 0, 4, 4), 4);
     Road road;
     ImageCPU const* const pResult = road.run(image.image(), world(1000, 1000, 5, 5));
-    if (pResult != nullptr) {
-        EXPECT_EQ(0U, pResult->numberOfPixels());
-    }
+    ASSERT_NE(nullptr, pResult);
+    EXPECT_EQ(0U, pResult->numberOfPixels());
 }
 
 /// Cancels its controller after a number of slices.

@@ -18,9 +18,11 @@ using namespace ORVO::Test;
 
 float const kNaN = std::numeric_limits<float>::quiet_NaN();
 
-class SimpleBilateralFilterCPUTest : public testing::Test {
+/// Every test runs with each instruction set, the plain version among them.
+class SimpleBilateralFilterCPUOf : public testing::TestWithParam<ImageRuntime::InstructionSet> {
 protected:
     ImageFlowLayers oLayers_;
+    ScopedInstructionSet oActive_{GetParam()};
 };
 
 /// Lets the node run on images and a region of the test's choice.
@@ -91,7 +93,7 @@ Picture expected(Picture const& source, double spatialSigma, double rangeSigma, 
     return clamped(result);
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, HasItsNameConnectorsAndParameters) {
+TEST_P(SimpleBilateralFilterCPUOf, HasItsNameConnectorsAndParameters) {
     SimpleBilateralFilterCPU node;
     EXPECT_EQ("ORVO::SimpleBilateralFilterCPU", node.name());
     EXPECT_EQ(ORVO_TARGET_CPU, node.getInputTargetPlatform());
@@ -110,7 +112,7 @@ TEST_F(SimpleBilateralFilterCPUTest, HasItsNameConnectorsAndParameters) {
     EXPECT_FALSE(node.colorize().value());
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, RegionsGrowByThePlainSigma) {
+TEST_P(SimpleBilateralFilterCPUOf, RegionsGrowByThePlainSigma) {
     SimpleBilateralFilterCPU node;
     node.spatialSigma().setValue(2.5F);
     EXPECT_EQ(world(-2.5F, -2.5F, 15, 25), node.needed(world(0, 0, 10, 20), "InputImage", {}));
@@ -119,7 +121,7 @@ TEST_F(SimpleBilateralFilterCPUTest, RegionsGrowByThePlainSigma) {
     EXPECT_EQ(world(0, 0, 10, 20), node.needed(world(0, 0, 10, 20), "InputImage", {}));
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, WindowOfOnePixelGivesThePixelItself) {
+TEST_P(SimpleBilateralFilterCPUOf, WindowOfOnePixelGivesThePixelItself) {
     Picture const source = randomPicture(0, 0, 7, 5, 41);
     // ceil(0.1 * 2.146) = 1, halved 0; the same for NaN and below 0.
     for (float sigma : {0.1F, 0.46F, kNaN, -3.0F}) {
@@ -144,7 +146,7 @@ TEST_F(SimpleBilateralFilterCPUTest, WindowOfOnePixelGivesThePixelItself) {
     }
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, SigmaOfZeroGivesWhatTheFloatsGive) {
+TEST_P(SimpleBilateralFilterCPUOf, SigmaOfZeroGivesWhatTheFloatsGive) {
     // exp(-0 / 0) is NaN, at the only pixel of the window.
     Picture const source = randomPicture(0, 0, 3, 3, 42);
     for (bool colorize : {false, true}) {
@@ -153,7 +155,7 @@ TEST_F(SimpleBilateralFilterCPUTest, SigmaOfZeroGivesWhatTheFloatsGive) {
     }
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, TwoByTwoPixelsAreWorkedOutByHand) {
+TEST_P(SimpleBilateralFilterCPUOf, TwoByTwoPixelsAreWorkedOutByHand) {
     // Sigma 0.9: ceil(1.9314) = 2, halved 1: a window of 3 by 3. At (0, 0), with a = exp(-1 / 1.62), b =
     // exp(-2 / 1.62): positions left and above count as column 2 and row 2, which are the last pixel (row 2)
     // or the first of the next row (column 2 of row 0 is pixel 2, of row 1 pixel 4, beyond the last).
@@ -173,7 +175,7 @@ TEST_F(SimpleBilateralFilterCPUTest, TwoByTwoPixelsAreWorkedOutByHand) {
     EXPECT_NEAR(sum / total, result.at(0, 0).x, 1e-6);
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, AgreesWithDoublePrecision) {
+TEST_P(SimpleBilateralFilterCPUOf, AgreesWithDoublePrecision) {
     Picture const source = randomPicture(0, 0, 23, 17, 43);
     for (float sigma : {0.1F, 0.9F, 1.4F, 2.0F, 3.5F}) {
         for (float range : {0.1F, 0.5F}) {
@@ -185,7 +187,7 @@ TEST_F(SimpleBilateralFilterCPUTest, AgreesWithDoublePrecision) {
     }
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, PaddingAndPositionChangeNothing) {
+TEST_P(SimpleBilateralFilterCPUOf, PaddingAndPositionChangeNothing) {
     Picture const source = randomPicture(0, 0, 19, 14, 44);
     Picture const plain = applied(source, source, 2.0F, 0.3F, true);
     EXPECT_TRUE(areIdentical(plain, applied(source, source, 2.0F, 0.3F, true, 5)));
@@ -202,7 +204,7 @@ TEST_F(SimpleBilateralFilterCPUTest, PaddingAndPositionChangeNothing) {
     }
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, OutputBeyondTheInputHasATransparentCentre) {
+TEST_P(SimpleBilateralFilterCPUOf, OutputBeyondTheInputHasATransparentCentre) {
     Picture const source(0, 0, 4, 3, float4(0.5F, 0.5F, 0.5F, 1.0F));
     // A window of one: all neighbours of a pixel outside are pixels of the image, at a distance of 0.5 from
     // black; their weights cancel.
@@ -210,17 +212,17 @@ TEST_F(SimpleBilateralFilterCPUTest, OutputBeyondTheInputHasATransparentCentre) 
     expectNear(result, Picture(-3, -2, 10, 8, float4(0.5F, 0.5F, 0.5F, 0.0F)), 1e-6F);
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, InputWithoutPixelsIsTransparentBlack) {
+TEST_P(SimpleBilateralFilterCPUOf, InputWithoutPixelsIsTransparentBlack) {
     Picture const result = applied(Picture(0, 0, 0, 0), Picture(0, 0, 3, 2, float4(0.7F)), 1.0F, 0.3F, true);
     expectNear(result, Picture(0, 0, 3, 2), 0.0F);
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, SigmaBeyondTheImageIsServed) {
+TEST_P(SimpleBilateralFilterCPUOf, SigmaBeyondTheImageIsServed) {
     Picture const source = randomPicture(0, 0, 3, 2, 45);
     expectNear(applied(source, source, 20.0F, 0.5F, false), expected(source, 20.0F, 0.5F, false), 2e-5F);
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, FramesRunOnThreadsAndGiveTheSame) {
+TEST_P(SimpleBilateralFilterCPUOf, FramesRunOnThreadsAndGiveTheSame) {
     Picture const source = randomPicture(3, -2, 60, 50, 46);
     Picture const exact = applied(source, source, 1.5F, 0.3F, true);
     FilterImage image(ImageCPU::PIXEL_FORMAT_RGBA32F, source, 61);
@@ -233,7 +235,7 @@ TEST_F(SimpleBilateralFilterCPUTest, FramesRunOnThreadsAndGiveTheSame) {
     EXPECT_TRUE(areIdentical(exact, target.picture()));
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, EveryServedFormatGoesInAndOut) {
+TEST_P(SimpleBilateralFilterCPUOf, EveryServedFormatGoesInAndOut) {
     Picture const source = randomPicture(0, 0, 16, 12, 47);
     for (auto format :
          {ImageCPU::PIXEL_FORMAT_BGR8, ImageCPU::PIXEL_FORMAT_BGRA8, ImageCPU::PIXEL_FORMAT_RGB8,
@@ -260,7 +262,7 @@ TEST_F(SimpleBilateralFilterCPUTest, EveryServedFormatGoesInAndOut) {
     }
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, OtherFormatsAreRefused) {
+TEST_P(SimpleBilateralFilterCPUOf, OtherFormatsAreRefused) {
     FilterImage good(ImageCPU::PIXEL_FORMAT_RGBA32F, Picture(0, 0, 4, 4), 4);
     for (auto format :
          {ImageCPU::PIXEL_FORMAT_RGB16, ImageCPU::PIXEL_FORMAT_RGBA16, ImageCPU::PIXEL_FORMAT_LUMINANCE8,
@@ -279,7 +281,7 @@ TEST_F(SimpleBilateralFilterCPUTest, OtherFormatsAreRefused) {
     }
 }
 
-TEST_F(SimpleBilateralFilterCPUTest, MissingImagesFail) {
+TEST_P(SimpleBilateralFilterCPUOf, MissingImagesFail) {
     OpenNode node;
     node.oOutputRegionInPixels_ = pixels(0, 0, 2, 2);
     ORVO_EXPECT_INTERNAL(node.processSlice(0, 1), "Enforce spData_.get() != NULL");
@@ -287,5 +289,7 @@ TEST_F(SimpleBilateralFilterCPUTest, MissingImagesFail) {
     node.spOutputImage_.setDataWithNoOwnership(&image.image());
     ORVO_EXPECT_INTERNAL(node.processSlice(0, 1), "Enforce spData_.get() != NULL");
 }
+
+INSTANTIATE_TEST_SUITE_P(All, SimpleBilateralFilterCPUOf, testing::ValuesIn(instructionSets()));
 
 } // namespace

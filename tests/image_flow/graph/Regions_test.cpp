@@ -3,6 +3,8 @@
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/ImageFlowLayers.h"
 
+#include <gtest/gtest.h>
+
 #include <optional>
 #include <random>
 
@@ -11,6 +13,7 @@ namespace ORVO {
 namespace {
 
 using Test::feed;
+using Test::plant;
 using Test::TestFilter;
 using Test::world;
 
@@ -204,9 +207,7 @@ TEST(RegionsTest, theRegionOfTheSinkReachesTheSourceOfAChain) {
     TestFilter sink(1, false);
     feed(sink, 0, source);
     ImageFlowController controller;
-    controller.addNode(&source);
-    controller.addNode(&sink);
-    controller.setImageSink(sink);
+    plant(controller, {&source, &sink}, sink);
     source.setGeneratedRegion(world(-3, -4, 20, 30));
     controller.computeRegions(world(1, 2, 3, 4));
     EXPECT_EQ(world(-3, -4, 20, 30), sink.domainOfDefinition());

@@ -6,12 +6,14 @@
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
+#include "tests/support/Slots.h"
 
 namespace ORVO {
 
 namespace {
 
 using Test::feed;
+using Test::plant;
 using Test::TestFilter;
 using Test::world;
 
@@ -19,6 +21,12 @@ class VisitorsTest : public testing::Test {
 protected:
     ORVO::Test::ImageFlowLayers oLayers_;
 };
+
+TEST(VisitorTest, hasItsOperationsInOrder) {
+    // The destructor stands first.
+    EXPECT_EQ(2, ORVO::Test::slotOf(&Visitor::preVisitImageNode));
+    EXPECT_EQ(3, ORVO::Test::slotOf(&Visitor::postVisitImageNode));
+}
 
 TEST_F(VisitorsTest, nodesThatAreNoImageNodesAreReported) {
     constexpr char const* pText = "Enforce pImageFilter != NULL";
@@ -80,10 +88,7 @@ TEST_F(VisitorsTest, theStackHoldsEachNodeOnceAfterItsProducers) {
     feed(d, 0, b);
     feed(d, 1, c);
     ImageFlowController controller;
-    for (TestFilter* pFilter : {&d, &c, &b, &a}) {
-        controller.addNode(pFilter);
-    }
-    controller.setImageSink(d);
+    plant(controller, {&d, &c, &b, &a}, d);
     DFSPostStackVisitor visitor;
     controller.depthFirstSearch(visitor);
     EXPECT_EQ((std::vector<ImageFilter*>{&a, &b, &c, &d}), visitor.stack());
@@ -98,10 +103,7 @@ TEST_F(VisitorsTest, aDirtySourceMakesAllDownstreamDirtyAndNothingElse) {
     feed(down, 0, changed);
     feed(sink, 0, down);
     ImageFlowController controller;
-    for (TestFilter* pFilter : {&up, &changed, &down, &sink}) {
-        controller.addNode(pFilter);
-    }
-    controller.setImageSink(sink);
+    plant(controller, {&up, &changed, &down, &sink}, sink);
     controller.setDirtyState();
     EXPECT_TRUE(up.isDirty()); // parameters are born dirty
     controller.setDirtyState();

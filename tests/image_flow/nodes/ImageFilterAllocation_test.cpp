@@ -272,6 +272,15 @@ TEST_F(ImageFilterAllocationTest, writesIntoTheBoundImageAndOwnsNothing) {
     }
 }
 
+TEST_F(ImageFilterAllocationTest, clonesOfABoundOutputStayWithTheClientsImage) {
+    Bound graph(pixels(0, 0, 4, 4));
+    DataFlow::OutputConnector const& clone = *graph.oFilter_.cloneImageOutput();
+    graph.run(world(0, 0, 4, 4));
+    EXPECT_EQ(16u, graph.touchedPixels());
+    EXPECT_TRUE(clone.bound());
+    EXPECT_EQ(&graph.oImage_, clone.data());
+}
+
 TEST_F(ImageFilterAllocationTest, refusesARegionThatLeavesTheBoundImage) {
     Bound graph(pixels(-4, -3, 10, 8));
     for (auto const& region : {world(-5, -3, 2, 2), world(-4, -4, 2, 2), world(5, 0, 2, 2), world(0, 4, 2, 2),

@@ -7,6 +7,7 @@ namespace ORVO {
 namespace {
 
 using Test::feed;
+using Test::ForeignNode;
 using Test::infiniteWorld;
 using Test::TestFilter;
 using Test::world;
@@ -20,12 +21,13 @@ PixelExtentInWorldSpace inputExtent(TestFilter const& filter, char const* name =
     return filter.spPixelExtentSet()->aInputPixelExtents_.at(name);
 }
 
-/// A consumer whose producer is no image node.
-class ForeignNode : public DataFlow::Node {
-public:
-    ForeignNode() : Node("foreign"), oOutput_("out", this) { addOutput(&oOutput_); }
-    ~ForeignNode() override { disconnect(); }
-    DataFlow::ConstOutput<ImageCPU> oOutput_;
+/// Two producers of one filter.
+struct Pair {
+    Pair() : a(0), b(0), filter(2) {
+        feed(filter, 0, a);
+        feed(filter, 1, b);
+    }
+    TestFilter a, b, filter;
 };
 
 TEST_F(ImageFilterGeometryTest, aSourceHasPixelsOfOne) {
@@ -52,19 +54,15 @@ TEST_F(ImageFilterGeometryTest, aForcedPixelExtentIsInherited) {
 }
 
 TEST_F(ImageFilterGeometryTest, theFirstInputDecides) {
-    TestFilter a(0);
-    TestFilter b(0);
-    TestFilter filter(2);
-    a.setOutputPixelExtent(PixelExtentInWorldSpace(3, 4));
-    b.setOutputPixelExtent(PixelExtentInWorldSpace(5, 6));
-    feed(filter, 0, b);
-    feed(filter, 1, a);
-    a.computePixelExtents();
-    b.computePixelExtents();
-    filter.computePixelExtents();
-    EXPECT_EQ(PixelExtentInWorldSpace(5, 6), inputExtent(filter, "in0"));
-    EXPECT_EQ(PixelExtentInWorldSpace(3, 4), inputExtent(filter, "in1"));
-    EXPECT_EQ(PixelExtentInWorldSpace(5, 6), filter.outputPixelExtent());
+    Pair graph;
+    graph.a.setOutputPixelExtent(PixelExtentInWorldSpace(5, 6));
+    graph.b.setOutputPixelExtent(PixelExtentInWorldSpace(3, 4));
+    graph.b.computePixelExtents();
+    graph.a.computePixelExtents();
+    graph.filter.computePixelExtents();
+    EXPECT_EQ(PixelExtentInWorldSpace(5, 6), inputExtent(graph.filter, "in0"));
+    EXPECT_EQ(PixelExtentInWorldSpace(3, 4), inputExtent(graph.filter, "in1"));
+    EXPECT_EQ(PixelExtentInWorldSpace(5, 6), graph.filter.outputPixelExtent());
 }
 
 TEST_F(ImageFilterGeometryTest, aSinkHasInputExtentsOnly) {
@@ -116,51 +114,59 @@ TEST_F(ImageFilterGeometryTest, neededAndChangedPassTheRegionThrough) {
 }
 
 TEST_F(ImageFilterGeometryTest, theDomainIsTheUnionOfWhatInputsAndNodeContribute) {
-    TestFilter a(0);
-    TestFilter b(0);
-    TestFilter filter(2);
-    filter.iRadius_ = 1;
-    feed(filter, 0, b);
-    feed(filter, 1, a);
-    a.setDomainOfDefinition(world(0, 0, 10, 10));
-    b.setDomainOfDefinition(world(20, 0, 5, 5));
-    EXPECT_EQ(world(-1, -1, 27, 12), filter.computeDomainOfDefinition());
-    EXPECT_EQ((std::vector<std::string>{"in0", "in1"}), filter.aChanged_);
-    filter.setGeneratedRegion(world(-10, 0, 1, 1));
-    EXPECT_EQ(world(-10, -1, 36, 12), filter.computeDomainOfDefinition());
+    Pair graph;
+    graph.filter.iRadius_ = 1;
+    graph.a.setDomainOfDefinition(world(20, 0, 5, 5));
+    graph.b.setDomainOfDefinition(world(0, 0, 10, 10));
+    EXPECT_EQ(world(-1, -1, 27, 12), graph.filter.computeDomainOfDefinition());
+    EXPECT_EQ((std::vector<std::string>{"in0", "in1"}), graph.filter.aChanged_);
+    graph.filter.setGeneratedRegion(world(-10, 0, 1, 1));
+    EXPECT_EQ(world(-10, -1, 36, 12), graph.filter.computeDomainOfDefinition());
     // A node without an output generates nothing.
     TestFilter sink(1, false);
-    feed(sink, 0, filter);
-    filter.setDomainOfDefinition(world(0, 0, 2, 2));
+    feed(sink, 0, graph.filter);
+    graph.filter.setDomainOfDefinition(world(0, 0, 2, 2));
     sink.setGeneratedRegion(world(-10, 0, 1, 1));
     EXPECT_EQ(world(0, 0, 2, 2), sink.computeDomainOfDefinition());
 }
 
+TEST_F(ImageFilterGeometryTest, inputsContributeInTheOrderOfTheirNames) {
+    TestFilter producer(0);
+    TestFilter filter(11); // "in10" stands between "in1" and "in2"
+    for (std::size_t i = 0; i < 11; ++i) {
+        feed(filter, i, producer);
+    }
+    filter.computeDomainOfDefinition();
+    EXPECT_EQ((std::vector<std::string>{"in0", "in1", "in10", "in2", "in3", "in4", "in5", "in6", "in7", "in8",
+                                        "in9"}),
+              filter.aChanged_);
+}
+
 TEST_F(ImageFilterGeometryTest, undefinedDomainsContributeNothingAndInfiniteOnesStay) {
-    TestFilter a(0);
-    TestFilter b(0);
-    TestFilter filter(2);
-    feed(filter, 0, a);
-    feed(filter, 1, b);
-    EXPECT_FALSE(filter.computeDomainOfDefinition().extent().isDefined());
-    a.setDomainOfDefinition(world(1, 1, 2, 2));
-    EXPECT_EQ(world(1, 1, 2, 2), filter.computeDomainOfDefinition());
-    b.setDomainOfDefinition(infiniteWorld());
-    EXPECT_TRUE(filter.computeDomainOfDefinition().isInfinite());
+    Pair graph;
+    EXPECT_FALSE(graph.filter.computeDomainOfDefinition().extent().isDefined());
+    graph.a.setDomainOfDefinition(world(1, 1, 2, 2));
+    EXPECT_EQ(world(1, 1, 2, 2), graph.filter.computeDomainOfDefinition());
+    graph.b.setDomainOfDefinition(infiniteWorld());
+    EXPECT_TRUE(graph.filter.computeDomainOfDefinition().isInfinite());
 }
 
 TEST_F(ImageFilterGeometryTest, handsItsROIToTheProducers) {
-    TestFilter a(0);
-    TestFilter b(0);
-    TestFilter filter(2);
-    filter.iRadius_ = 2;
-    feed(filter, 0, a);
-    feed(filter, 1, b);
-    filter.setRegionOfInterest(world(0, 0, 4, 4));
-    filter.computeAndSetChildROIs();
-    ASSERT_EQ(1u, a.aParentROIs_.size());
-    EXPECT_EQ(world(-2, -2, 8, 8), a.aParentROIs_[0]);
-    ASSERT_EQ(1u, b.aParentROIs_.size());
+    Pair graph;
+    graph.filter.iRadius_ = 2;
+    graph.filter.setRegionOfInterest(world(0, 0, 4, 4));
+    graph.filter.computeAndSetChildROIs();
+    ASSERT_EQ(1u, graph.a.aParentROIs_.size());
+    EXPECT_EQ(world(-2, -2, 8, 8), graph.a.aParentROIs_[0]);
+    ASSERT_EQ(1u, graph.b.aParentROIs_.size());
+    EXPECT_EQ(world(-2, -2, 8, 8), graph.b.aParentROIs_[0]);
+}
+
+TEST_F(ImageFilterGeometryTest, handsNothingOnWhereAnInputIsUnconnected) {
+    Pair graph;
+    graph.filter.in(1).disconnect();
+    ORVO_EXPECT_INTERNAL(graph.filter.computeAndSetChildROIs(), "Enforce pOutput != NULL");
+    EXPECT_TRUE(graph.a.aParentROIs_.empty());
 }
 
 TEST_F(ImageFilterGeometryTest, takesOneParentROIForEachOutput) {
@@ -170,6 +176,7 @@ TEST_F(ImageFilterGeometryTest, takesOneParentROIForEachOutput) {
     filter.setParentROI(world(0, 0, 1, 1));
     ORVO_EXPECT_INTERNAL(filter.computeUnionOfParentROIs(),
                          "aParentROIs_.size() == totalNumberOfAllImageOutputs()");
+    EXPECT_EQ(world(50, 50, 1, 1), filter.regionOfInterest());
     filter.setParentROI(world(2, 2, 1, 1));
     ORVO_EXPECT_INTERNAL(filter.setParentROI(world(4, 4, 1, 1)),
                          "aParentROIs_.size() < totalNumberOfAllImageOutputs()");

@@ -1,6 +1,7 @@
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
+#include "tests/support/Slots.h"
 
 #include <sstream>
 #include <typeinfo>
@@ -62,6 +63,27 @@ std::string dumpOf(ImageFilter::teOutputPrecisionHint hint) {
     std::ostringstream stream;
     stream << hint;
     return stream.str();
+}
+
+TEST_F(ImageFilterTest, addsItsOperationsInOrder) {
+    using ORVO::Test::constSlotOf;
+    using ORVO::Test::slotOf;
+    std::ptrdiff_t slot = slotOf(&TestFilter::postProcess); // the base's last
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::needed));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::changed));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::computeDomainOfDefinition));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::computeAndSetChildROIs));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::generated));
+    EXPECT_EQ(++slot, constSlotOf(&ImageFilter::domainOfDefinition));
+    EXPECT_EQ(++slot, constSlotOf(&ImageFilter::regionOfInterest));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::setGeneratedRegion));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::willRunInHardware));
+    EXPECT_EQ(++slot, constSlotOf(&ImageFilter::isSIMD));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::setBoundOutputImage));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::prepareForRender));
+    EXPECT_EQ(++slot, slotOf(&ImageFilter::allocateOutputImage));
+    EXPECT_EQ(++slot, slotOf(&TestFilter::getNumChannelsOutput));
+    EXPECT_EQ(++slot, slotOf(&TestFilter::outputPrecisionHint));
 }
 
 TEST_F(ImageFilterTest, hintsWriteTheirNames) {
@@ -190,6 +212,7 @@ TEST_F(ImageFilterTest, refusesToBindAnImageThatLivesElsewhere) {
     ORVO_EXPECT_INTERNAL(homeless.setBoundOutputImage(upImage.get()), "outputTarget_ == p->targetPlatform()");
     TestFilter sink(1, false);
     ORVO_EXPECT_INTERNAL(sink.setBoundOutputImage(upImage.get()), "Enforce pImageOutput_ != NULL");
+    ORVO_EXPECT_INTERNAL(sink.setBoundOutputImage(&image), "outputTarget_ == p->targetPlatform()");
 }
 
 TEST_F(ImageFilterTest, aTakenAwayImageIsNeverWrittenAgain) {

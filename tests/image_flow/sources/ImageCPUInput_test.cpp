@@ -3,6 +3,7 @@
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
+#include "tests/support/Slots.h"
 
 #include <climits>
 
@@ -13,6 +14,7 @@ namespace {
 using Test::feed;
 using Test::floatImage;
 using Test::pixels;
+using Test::plant;
 using Test::TestFilter;
 using Test::world;
 using ImagePtr = std::unique_ptr<ImageCPU, ORVODeleter<ImageCPU>>;
@@ -33,6 +35,19 @@ public:
 };
 
 constexpr char const* pNoImage = "No ImageCPU set yet.";
+
+TEST_F(ImageCPUInputTest, addsItsOperationsInOrder) {
+    std::ptrdiff_t const last = ORVO::Test::slotOf(&TestFilter::outputPrecisionHint);
+    EXPECT_EQ(last + 1, ORVO::Test::slotOf(&ImageCPUInput::setImageCPUWithRegularOwnership));
+    EXPECT_EQ(last + 2, ORVO::Test::slotOf(&ImageCPUInput::setImageCPUWithNoOwnership));
+    EXPECT_EQ(last + 3, ORVO::Test::slotOf(&ImageCPUInput::setImageCPU));
+    EXPECT_EQ(last + 4, ORVO::Test::slotOf(&ImageCPUInput::releaseImageCPU));
+    EXPECT_EQ(last + 5,
+              ORVO::Test::slotOf(static_cast<ImageCPU* (ImageCPUInput::*)()>(&ImageCPUInput::getImageCPU)));
+    EXPECT_EQ(last + 6, ORVO::Test::constSlotOf(static_cast<ImageCPU const* (ImageCPUInput::*)() const>(
+                            &ImageCPUInput::getImageCPU)));
+    EXPECT_EQ(last + 7, ORVO::Test::constSlotOf(&ImageCPUInput::operator->));
+}
 
 TEST_F(ImageCPUInputTest, hasNamesAndTargets) {
     ImageCPUInput source;
@@ -196,9 +211,7 @@ TEST_F(ImageCPUInputTest, thePullStopsAtASourceThatHasNothingNew) {
     TestFilter sink(1, false);
     feed(sink, 0, source);
     ImageFlowController controller;
-    controller.addNode(&source);
-    controller.addNode(&sink);
-    controller.setImageSink(sink);
+    plant(controller, {&source, &sink}, sink);
     ImagePtr const upImage = image();
     source.setImageCPUWithNoOwnership(upImage.get());
     controller.process();
@@ -241,52 +254,52 @@ struct LayoutRow {
     ImageCPU::tePixelFormat format;
 };
 
-TEST_F(ImageCPUInputTest, loadsBytes) {
-    unsigned char const aPixels[64] = {1, 2, 3, 4};
-    for (LayoutRow const& row :
-         {LayoutRow{0, ImageCPU::PIXEL_FORMAT_BGRA8}, LayoutRow{1, ImageCPU::PIXEL_FORMAT_RGBA8},
-          LayoutRow{2, ImageCPU::PIXEL_FORMAT_BGRA8}, LayoutRow{3, ImageCPU::PIXEL_FORMAT_LUMINANCE_ALPHA8},
-          LayoutRow{4, ImageCPU::PIXEL_FORMAT_BGRA8}}) {
+/// Loads 3 by 4 pixels at a pitch of 4 and compares what the source makes of each layout.
+template <typename Channel, typename Load>
+void expectLayouts(Load load, std::initializer_list<LayoutRow> rows) {
+    Channel const aPixels[64] = {};
+    for (LayoutRow const& row : rows) {
+        SCOPED_TRACE(testing::Message() << "layout " << row.layout);
         ImageCPUInput source;
-        source.load8BitUnsignedImageData(aPixels, pixels(-1, 2, 3, 4), PixelExtentInWorldSpace(2, 3),
-                                         static_cast<tePixelFormat>(row.layout), 4);
-        EXPECT_EQ(row.format, source->pixelFormat()) << row.layout;
-        EXPECT_EQ(aPixels, source->pixels());
+        (source.*load)(aPixels, pixels(-1, 2, 3, 4), PixelExtentInWorldSpace(2, 3),
+                       static_cast<tePixelFormat>(row.layout), 4);
+        EXPECT_EQ(row.format, source->pixelFormat());
+        EXPECT_EQ(static_cast<void const*>(aPixels), source->pixels());
         EXPECT_EQ(pixels(-1, 2, 3, 4), source->positionExtent());
         EXPECT_EQ(PixelExtentInWorldSpace(2, 3), source->pixelExtent());
         EXPECT_EQ(ExtentInPixelSpace(4, 4), source->capacityExtent());
         EXPECT_TRUE(source.hasBufferChanged());
         ORVO_EXPECT_INTERNAL(source.releaseImageCPU(), "Enforce deleter != NULL"); // regular ownership
-        source.load8BitUnsignedImageData(aPixels, pixels(0, 0, 1, 1), PixelExtentInWorldSpace(),
-                                         PIXEL_LAYOUT_RGBA, 0);
+        (source.*load)(aPixels, pixels(0, 0, 1, 1), PixelExtentInWorldSpace(),
+                       static_cast<tePixelFormat>(row.layout), 0);
         EXPECT_EQ(ExtentInPixelSpace(1, 1), source->capacityExtent());
     }
 }
 
+TEST_F(ImageCPUInputTest, loadsBytes) {
+    expectLayouts<unsigned char>(&ImageCPUInput::load8BitUnsignedImageData,
+                                 {{0, ImageCPU::PIXEL_FORMAT_BGRA8},
+                                  {1, ImageCPU::PIXEL_FORMAT_RGBA8},
+                                  {2, ImageCPU::PIXEL_FORMAT_BGRA8},
+                                  {3, ImageCPU::PIXEL_FORMAT_LUMINANCE_ALPHA8},
+                                  {4, ImageCPU::PIXEL_FORMAT_BGRA8}});
+}
+
 TEST_F(ImageCPUInputTest, loadsWords) {
-    unsigned short const aPixels[64] = {};
-    for (LayoutRow const& row :
-         {LayoutRow{0, ImageCPU::PIXEL_FORMAT_RGBA16}, LayoutRow{1, ImageCPU::PIXEL_FORMAT_RGBA16},
-          LayoutRow{2, ImageCPU::PIXEL_FORMAT_RGBA16}, LayoutRow{3, ImageCPU::PIXEL_FORMAT_LUMINANCE16}}) {
-        ImageCPUInput source;
-        source.load16BitUnsignedImageData(aPixels, pixels(0, 0, 3, 4), PixelExtentInWorldSpace(),
-                                          static_cast<tePixelFormat>(row.layout), 4);
-        EXPECT_EQ(row.format, source->pixelFormat()) << row.layout;
-        EXPECT_EQ(static_cast<void const*>(aPixels), source->pixels());
-    }
+    expectLayouts<unsigned short>(&ImageCPUInput::load16BitUnsignedImageData,
+                                  {{0, ImageCPU::PIXEL_FORMAT_RGBA16},
+                                   {1, ImageCPU::PIXEL_FORMAT_RGBA16},
+                                   {2, ImageCPU::PIXEL_FORMAT_RGBA16},
+                                   {3, ImageCPU::PIXEL_FORMAT_LUMINANCE16},
+                                   {4, ImageCPU::PIXEL_FORMAT_RGBA16}});
 }
 
 TEST_F(ImageCPUInputTest, loadsFloats) {
-    float const aPixels[64] = {};
-    for (LayoutRow const& row :
-         {LayoutRow{0, ImageCPU::PIXEL_FORMAT_RGBA32F}, LayoutRow{1, ImageCPU::PIXEL_FORMAT_RGBA32F},
-          LayoutRow{2, ImageCPU::PIXEL_FORMAT_RGBA32F}, LayoutRow{3, ImageCPU::PIXEL_FORMAT_LUMINANCE32F}}) {
-        ImageCPUInput source;
-        source.load32BitFloatImageData(aPixels, pixels(0, 0, 3, 4), PixelExtentInWorldSpace(),
-                                       static_cast<tePixelFormat>(row.layout), 4);
-        EXPECT_EQ(row.format, source->pixelFormat()) << row.layout;
-        EXPECT_EQ(static_cast<void const*>(aPixels), source->pixels());
-    }
+    expectLayouts<float>(&ImageCPUInput::load32BitFloatImageData, {{0, ImageCPU::PIXEL_FORMAT_RGBA32F},
+                                                                   {1, ImageCPU::PIXEL_FORMAT_RGBA32F},
+                                                                   {2, ImageCPU::PIXEL_FORMAT_RGBA32F},
+                                                                   {3, ImageCPU::PIXEL_FORMAT_LUMINANCE32F},
+                                                                   {4, ImageCPU::PIXEL_FORMAT_RGBA32F}});
 }
 
 TEST_F(ImageCPUInputTest, loadsNoHalves) {

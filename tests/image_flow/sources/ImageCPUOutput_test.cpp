@@ -3,6 +3,7 @@
 #include "tests/image_flow/support/TestNodes.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
+#include "tests/support/Slots.h"
 
 namespace ORVO {
 
@@ -12,6 +13,7 @@ using Test::feed;
 using Test::floatImage;
 using Test::pixelAt;
 using Test::pixels;
+using Test::plant;
 using Test::TestFilter;
 using Test::world;
 
@@ -27,10 +29,7 @@ struct Graph {
     Graph() : upImage_(floatImage(pixels(0, 0, 4, 3), [](int x, int y) { return float(x + 10 * y); })) {
         feed(oFilter_, 0, oSource_);
         feed(oSink_, 0, oFilter_);
-        for (ImageFilter* pFilter : std::initializer_list<ImageFilter*>{&oSource_, &oFilter_, &oSink_}) {
-            oController_.addNode(pFilter);
-        }
-        oController_.setImageSink(oSink_);
+        plant(oController_, {&oSource_, &oFilter_, &oSink_}, oSink_);
         oSource_.setImageCPUWithNoOwnership(upImage_.get());
     }
     ~Graph() { oSink_.disconnect(); }
@@ -47,6 +46,12 @@ struct Graph {
     TestFilter oFilter_;
     ImageCPUOutput oSink_;
 };
+
+TEST_F(ImageCPUOutputTest, addsItsOperationsInOrder) {
+    std::ptrdiff_t const last = ORVO::Test::slotOf(&TestFilter::outputPrecisionHint);
+    EXPECT_EQ(last + 1, ORVO::Test::constSlotOf(&ImageCPUOutput::getImageCPU));
+    EXPECT_EQ(last + 2, ORVO::Test::slotOf(&ImageCPUOutput::releaseImageCPU));
+}
 
 TEST_F(ImageCPUOutputTest, hasNamesAndNoOutput) {
     ImageCPUOutput sink;
@@ -107,9 +112,7 @@ TEST_F(ImageCPUOutputTest, neverHandsOutTheClientsOwnImage) {
     ImageCPUInput source;
     ImageCPUOutput sink;
     feed(sink, 0, source);
-    controller.addNode(&source);
-    controller.addNode(&sink);
-    controller.setImageSink(sink);
+    plant(controller, {&source, &sink}, sink);
     source.setImageCPUWithNoOwnership(upImage.get());
     source.emit();
     controller.process();

@@ -22,6 +22,7 @@ public:
         oSink_.disconnect();
     }
 
+    ImageCPUInput& source() { return oSource_; }
     Filter& filter() { return oFilter_; }
     ImageFlowController& controller() { return oController_; }
 

@@ -13,6 +13,7 @@
 #include <algorithm>
 #include <atomic>
 #include <cstring>
+#include <initializer_list>
 #include <limits>
 #include <memory>
 #include <string>
@@ -175,6 +176,23 @@ inline void feed(ImageFilter& consumer, std::size_t iInput, ImageFilter& produce
     }
     DataFlow::Connect(*consumer.imageInput(iInput), *pOutput);
 }
+
+/// Gives the nodes to a controller, in this order, and tells it the sink.
+inline void plant(ImageFlowController& controller, std::initializer_list<DataFlow::Node*> nodes,
+                  ImageFilter& sink) {
+    for (DataFlow::Node* pNode : nodes) {
+        controller.addNode(pNode);
+    }
+    controller.setImageSink(sink);
+}
+
+/// A node of another kind with an image output "out".
+class ForeignNode : public DataFlow::Node {
+public:
+    ForeignNode() : Node("foreign"), oOutput_("out", this) { addOutput(&oOutput_); }
+    ~ForeignNode() override { disconnect(); }
+    DataFlow::ConstOutput<ImageCPU> oOutput_;
+};
 
 /// A new image of one-channel floats; `value(x, y)` is called in pixel space.
 template <typename Value>

@@ -6,22 +6,23 @@
 #include "orvo/core/utility/SharedPtr.h"
 #include "orvo/image_flow/filters/bilateral/GridShape.h"
 #include "orvo/image_flow/filters/bilateral/HaltBilateralException.h"
+#include "orvo/image_flow/filters/bilateral/RowAccess.h"
 #include "orvo/image_flow/filters/lab/LabTransform.h"
 #include "orvo/image_runtime/images/ImageCPU.h"
 #include "orvo/image_runtime/images/ImageReadAccessor.h"
 #include "orvo/image_runtime/images/ImageWriteAccessor.h"
+#include "orvo/image_runtime/kernels/Rows.h"
 
 #include <algorithm>
 #include <array>
 #include <cmath>
 #include <limits>
 #include <type_traits>
+#include <vector>
 
 namespace ORVO::ImageFlow::bilateral {
 
 namespace {
-
-float4 const kLuminanceWeights(0.39F, 0.5F, 0.11F, 0.0F);
 
 std::shared_ptr<ImageCPU> makeImage(ImageCPU::tePixelFormat format,
                                     PositionExtentInPixelSpace const& rectangle) {
@@ -55,19 +56,106 @@ Pixel interpolate(Pixel const& first, Pixel const& second, float fraction) {
     return first * (1.0F - fraction) + second * fraction;
 }
 
-bool isInside(int x, int y, PositionExtentInPixelSpace const& rectangle) {
-    long long const column = static_cast<long long>(x) - rectangle.position().x();
-    long long const row = static_cast<long long>(y) - rectangle.position().y();
-    return column >= 0 && column < rectangle.extent().width() && row >= 0 &&
-           row < rectangle.extent().height();
+/// The largest whole number that is not above v. Written out, since std::floor is a call of a function where
+/// there is no instruction for it.
+inline float floorOf(float v) {
+    if (!(std::fabs(v) < 8388608.0F)) {
+        return v;
+    }
+    float const truncated = static_cast<float>(static_cast<int>(v));
+    return truncated > v ? truncated - 1.0F : truncated;
 }
 
-float4 premultipliedPixelAt(ImageReadAccessor const& source, int x, int y) {
-    float4 pixel(0.0F, 0.0F, 0.0F, 0.0F);
-    if (isInside(x, y, source.positionExtent())) {
-        pixel = source.getRGBAFloat4PixelAt(x, y);
+/// clampedCell(), where the compiler sees it.
+inline std::size_t cellOf(float cell, std::size_t count) {
+    if (!(cell > 0.0F)) {
+        return 0;
     }
-    return {pixel.x * pixel.w, pixel.y * pixel.w, pixel.z * pixel.w, pixel.w};
+    return cell < static_cast<float>(count - 1) ? static_cast<std::size_t>(cell) : count - 1;
+}
+
+inline float intensityOf(PixelLuminanceAlpha32F const& pixel) { return pixel.l; }
+inline float intensityOf(PixelRGBA32F const& pixel) { return pixel.r; }
+
+inline PixelLuminanceAlpha32F sample3DGrid(PixelLuminanceAlpha32F const* pGrid, std::size_t index) {
+    return pGrid[index];
+}
+
+inline PixelRGBA32F sample3DGrid(PixelRGBA32F const* pGrid, std::size_t index) { return pGrid[index]; }
+
+inline PixelLuminanceAlpha32F sample3DGridAndDivide(PixelLuminanceAlpha32F const* pGrid, std::size_t index) {
+    PixelLuminanceAlpha32F const cell = pGrid[index];
+    return {cell.a != 0.0F ? cell.l / cell.a : 0.0F, cell.a};
+}
+
+inline PixelRGBA32F sample3DGridAndDivide(PixelRGBA32F const* pGrid, std::size_t index) {
+    PixelRGBA32F const cell = pGrid[index];
+    if (cell.a == 0.0F) {
+        return {0.0F, 0.0F, 0.0F, 0.0F};
+    }
+    return {cell.r / cell.a, cell.g / cell.a, cell.b / cell.a, cell.a};
+}
+
+inline void setResultInGrid(PixelLuminanceAlpha32F* pGrid, std::size_t index,
+                            PixelLuminanceAlpha32F const& result) {
+    pGrid[index] = result;
+}
+
+inline void setResultInGrid(PixelRGBA32F* pGrid, std::size_t index, PixelRGBA32F const& result) {
+    pGrid[index] = result;
+}
+
+/// The blur at a position of a line whose cells are `step` apart, of the taps `before` it to `after` it.
+template <class Pixel>
+inline Pixel sumOfTaps(Pixel const* pSource, std::size_t index, std::size_t step, std::size_t before,
+                       std::size_t after) {
+    Pixel sum = sample3DGrid(pSource, index - before * step) * kBlurWeights[before];
+    for (std::size_t distance = before; distance-- > 0;) {
+        sum += sample3DGrid(pSource, index - distance * step) * kBlurWeights[distance];
+    }
+    for (std::size_t distance = 1; distance <= after; ++distance) {
+        sum += sample3DGrid(pSource, index + distance * step) * kBlurWeights[distance];
+    }
+    return sum;
+}
+
+// The padding of the grid gives every axis at least 8 cells, so the three head positions, the interior and
+// the three tail positions do not overlap.
+template <class Pixel>
+inline void blurLine(Pixel const* pSource, Pixel* pDestination, std::size_t first, std::size_t step,
+                     std::size_t count) {
+    auto const blurAt = [=](std::size_t position, std::size_t before, std::size_t after) {
+        std::size_t const index = first + position * step;
+        setResultInGrid(pDestination, index, sumOfTaps(pSource, index, step, before, after));
+    };
+    blurAt(0, 0, 3);
+    blurAt(1, 1, 3);
+    blurAt(2, 2, 3);
+    for (std::size_t i = 3; i + 3 < count; ++i) {
+        blurAt(i, 3, 3);
+    }
+    blurAt(count - 3, 3, 2);
+    blurAt(count - 2, 3, 1);
+    blurAt(count - 1, 3, 0);
+}
+
+/// Writes all pixels, made by `convert` from those of the working image.
+template <class Pixel, class Convert>
+void writeRows(ImageCPU const& working, ImageWriteAccessor& destination, Convert const& convert) {
+    int const beginX = working.position().x();
+    std::vector<float> aRow(4 * widthOf(working));
+    Pixel const* pPixel = pixelsOf<Pixel>(working);
+    for (int row = 0; row < working.extent().height(); ++row) {
+        for (std::size_t i = 0; i < aRow.size(); i += 4, ++pPixel) {
+            float4 const pixel = convert(*pPixel);
+            aRow[i] = pixel.x;
+            aRow[i + 1] = pixel.y;
+            aRow[i + 2] = pixel.z;
+            aRow[i + 3] = pixel.w;
+        }
+        ImageRuntime::writeRowFromRGBAFloat(destination, working.position().y() + row, beginX,
+                                            beginX + working.extent().width(), aRow.data());
+    }
 }
 
 } // namespace
@@ -100,15 +188,16 @@ bool PlainBilateralFilter::applyFilter(ImageReadAccessor const& source, ImageWri
     }
     nGridHeight_ = cellsAlong(extent.height(), fSigmaY_, fPaddingXY_, fGridOffset_);
     nGridWidth_ = cellsAlong(extent.width(), fSigmaX_, fPaddingXY_, fGridOffset_);
+    RowSource const rows(source, destination.positionExtent());
     try {
-        runPhases(source, destination);
+        runPhases(rows, destination);
     } catch (HaltBilateralException const&) {
         return false;
     }
     return true;
 }
 
-void PlainBilateralFilter::runPhases(ImageReadAccessor const& source, ImageWriteAccessor& destination) {
+void PlainBilateralFilter::runPhases(RowSource const& source, ImageWriteAccessor& destination) {
     ImageCPU::tePixelFormat const format =
         bColorize_ ? ImageCPU::PIXEL_FORMAT_RGBA32F : ImageCPU::PIXEL_FORMAT_LUMINANCE_ALPHA32F;
     ImagePointer spWorking = makeImage(format, destination.positionExtent());
@@ -125,8 +214,8 @@ void PlainBilateralFilter::runPhases(ImageReadAccessor const& source, ImageWrite
             ImagePointer const spGrid = blurGrid<PixelRGBA32F>(constructDownsampled3DGridLAB(*spWorking));
             sliceGridAndLABImage(*spGrid, *spWorking);
         } else {
-            ImagePointer const spScratch = makeImage(format, destination.positionExtent());
-            convertToLuminance(source, *spScratch);
+            // The rows are counted as converted a second time, which would give the same.
+            askCallback(heightOf(*spWorking));
             ImagePointer const spGrid =
                 blurGrid<PixelLuminanceAlpha32F>(constructDownsampled3DGrid(*spWorking));
             sliceGridAndLumaImage(*spGrid, *spWorking);
@@ -146,71 +235,48 @@ bool PlainBilateralFilter::gridServes() const {
     return gridServesFor(nGridWidth_, nGridHeight_, nGridDepth_, fRangeSigma_, fSigmaX_, fSigmaY_);
 }
 
-void PlainBilateralFilter::askCallback() const {
-    if (pfnCallback_ != nullptr && !pfnCallback_(pCallbackData_)) {
-        throw HaltBilateralException();
+void PlainBilateralFilter::askCallback(std::size_t nTimes) const {
+    for (std::size_t i = 0; pfnCallback_ != nullptr && i < nTimes; ++i) {
+        if (!pfnCallback_(pCallbackData_)) {
+            throw HaltBilateralException();
+        }
     }
 }
 
-void PlainBilateralFilter::finishValueRange(float lowest, float highest) {
+template <class Pixel, class Convert>
+void PlainBilateralFilter::convertRows(RowSource const& source, ImageCPU& working, Convert const& convert) {
+    float lowest = std::numeric_limits<float>::max();
+    float highest = -std::numeric_limits<float>::max();
+    std::size_t const nWidth = widthOf(working);
+    std::vector<float> aBuffer(4 * nWidth);
+    Pixel* pPixel = pixelsOf<Pixel>(working);
+    for (std::size_t row = 0; row < heightOf(working); ++row) {
+        float const* pRGBA = source.row(row, aBuffer.data());
+        for (Pixel const* const pEnd = pPixel + nWidth; pPixel != pEnd; ++pPixel, pRGBA += 4) {
+            float const alpha = pRGBA[3];
+            *pPixel = convert(float4(pRGBA[0] * alpha, pRGBA[1] * alpha, pRGBA[2] * alpha, alpha));
+            float const intensity = intensityOf(*pPixel);
+            lowest = intensity < lowest ? intensity : lowest;
+            highest = intensity > highest ? intensity : highest;
+        }
+        askCallback();
+    }
     ValueRange const range = valueRange(lowest, highest);
     fValueMin_ = range.fMin;
     fValueExtent_ = range.fExtent;
 }
 
-void PlainBilateralFilter::convertToLuminance(ImageReadAccessor const& source, ImageCPU& working) {
-    float lowest = std::numeric_limits<float>::max();
-    float highest = -std::numeric_limits<float>::max();
-    PixelLuminanceAlpha32F* pPixel = working.pixels_LuminanceAlpha32F();
-    for (int row = 0; row < working.extent().height(); ++row) {
-        for (int column = 0; column < working.extent().width(); ++column, ++pPixel) {
-            float4 const pixel =
-                premultipliedPixelAt(source, working.position().x() + column, working.position().y() + row);
-            float const luminance = dot(pixel, kLuminanceWeights);
-            lowest = luminance < lowest ? luminance : lowest;
-            highest = luminance > highest ? luminance : highest;
-            *pPixel = {luminance, pixel.w};
-        }
-        askCallback();
-    }
-    finishValueRange(lowest, highest);
+void PlainBilateralFilter::convertToLuminance(RowSource const& source, ImageCPU& working) {
+    convertRows<PixelLuminanceAlpha32F>(source, working, [](float4 const& pixel) {
+        return PixelLuminanceAlpha32F{dot(pixel, float4(0.39F, 0.5F, 0.11F, 0.0F)), pixel.w};
+    });
 }
 
-void PlainBilateralFilter::convertToLAB(ImageReadAccessor const& source, ImageCPU& working) {
-    float lowest = std::numeric_limits<float>::max();
-    float highest = -std::numeric_limits<float>::max();
-    PixelRGBA32F* pPixel = working.pixels_RGBA32F();
-    for (int row = 0; row < working.extent().height(); ++row) {
-        for (int column = 0; column < working.extent().width(); ++column, ++pPixel) {
-            float4 const pixel = lab::sRGBToLab(
-                premultipliedPixelAt(source, working.position().x() + column, working.position().y() + row));
-            lowest = pixel.x < lowest ? pixel.x : lowest;
-            highest = pixel.x > highest ? pixel.x : highest;
-            *pPixel = {pixel.x, pixel.y, pixel.z, pixel.w};
-        }
-        askCallback();
-    }
-    finishValueRange(lowest, highest);
-}
-
-std::size_t PlainBilateralFilter::cellIndex(std::size_t x, std::size_t y, std::size_t z) const {
-    return (y * nGridDepth_ + z) * nGridWidth_ + x;
-}
-
-float PlainBilateralFilter::rangeStep() const { return fRangeSigma_ / fValueExtent_; }
-
-std::size_t PlainBilateralFilter::cellX(std::size_t px) const {
-    return cellAlong(px, fSigmaX_, fPaddingXY_, fGridOffset_, nGridWidth_);
-}
-
-std::size_t PlainBilateralFilter::cellY(std::size_t py) const {
-    return cellAlong(py, fSigmaY_, fPaddingXY_, fGridOffset_, nGridHeight_);
-}
-
-std::size_t PlainBilateralFilter::cellZ(float value) const {
-    float const cell =
-        std::floor((value - fValueMin_) / fValueExtent_ / rangeStep() + 0.5F) + fGridOffset_ + fPaddingZ_;
-    return clampedCell(cell, nGridDepth_);
+void PlainBilateralFilter::convertToLAB(RowSource const& source, ImageCPU& working) {
+    convertRows<PixelRGBA32F>(source, working, [](float4 const& pixel) {
+        float4 const lab = lab::sRGBToLab(pixel);
+        return PixelRGBA32F{lab.x, lab.y, lab.z, lab.w};
+    });
 }
 
 PlainBilateralFilter::ImagePointer PlainBilateralFilter::makeGrid(ImageCPU const& working) const {
@@ -222,160 +288,151 @@ PlainBilateralFilter::ImagePointer PlainBilateralFilter::makeGrid(ImageCPU const
     return spGrid;
 }
 
-PlainBilateralFilter::ImagePointer
-PlainBilateralFilter::constructDownsampled3DGrid(ImageCPU const& working) const {
+template <class Pixel, class Summand>
+PlainBilateralFilter::ImagePointer PlainBilateralFilter::constructGrid(ImageCPU const& working,
+                                                                       Summand const& summandOf) const {
     ImagePointer spGrid = makeGrid(working);
-    PixelLuminanceAlpha32F* const pGrid = spGrid->pixels_LuminanceAlpha32F();
-    PixelLuminanceAlpha32F const* pPixel = working.pixels_LuminanceAlpha32F();
+    Pixel* const pGrid = pixelsOf<Pixel>(*spGrid);
+    Pixel const* pPixel = pixelsOf<Pixel>(working);
+    std::vector<std::size_t> aCellX(widthOf(working));
+    for (std::size_t px = 0; px < aCellX.size(); ++px) {
+        aCellX[px] = cellAlong(px, fSigmaX_, fPaddingXY_, fGridOffset_, nGridWidth_);
+    }
+    // Kept at hand: the compiler must assume that pixels are stored over the fields.
+    float const valueMin = fValueMin_;
+    float const valueExtent = fValueExtent_;
+    float const rangeStep = fRangeSigma_ / fValueExtent_;
+    float const gridOffset = fGridOffset_;
+    float const paddingZ = fPaddingZ_;
+    std::size_t const nWidth = nGridWidth_;
+    std::size_t const nDepth = nGridDepth_;
     for (std::size_t py = 0; py < heightOf(working); ++py) {
-        for (std::size_t px = 0; px < widthOf(working); ++px, ++pPixel) {
-            std::size_t const index = cellIndex(cellX(px), cellY(py), cellZ(pPixel->l));
-            setResultInGrid(pGrid, index,
-                            sample3DGrid(pGrid, index) + PixelLuminanceAlpha32F{pPixel->l, 1.0F});
+        Pixel* const pLayer =
+            pGrid + cellIndex(0, cellAlong(py, fSigmaY_, fPaddingXY_, fGridOffset_, nGridHeight_), 0);
+        for (std::size_t const cellX : aCellX) {
+            float const value = intensityOf(*pPixel);
+            float const level = floorOf((value - valueMin) / valueExtent / rangeStep + 0.5F);
+            std::size_t const index = cellOf(level + gridOffset + paddingZ, nDepth) * nWidth + cellX;
+            setResultInGrid(pLayer, index, sample3DGrid(pLayer, index) + summandOf(*pPixel));
+            ++pPixel;
         }
         askCallback();
     }
     return spGrid;
+}
+
+PlainBilateralFilter::ImagePointer
+PlainBilateralFilter::constructDownsampled3DGrid(ImageCPU const& working) const {
+    return constructGrid<PixelLuminanceAlpha32F>(working, [](PixelLuminanceAlpha32F const& pixel) {
+        return PixelLuminanceAlpha32F{pixel.l, 1.0F};
+    });
 }
 
 PlainBilateralFilter::ImagePointer
 PlainBilateralFilter::constructDownsampled3DGridLAB(ImageCPU const& working) const {
-    ImagePointer spGrid = makeGrid(working);
-    PixelRGBA32F* const pGrid = spGrid->pixels_RGBA32F();
-    PixelRGBA32F const* pPixel = working.pixels_RGBA32F();
-    for (std::size_t py = 0; py < heightOf(working); ++py) {
-        for (std::size_t px = 0; px < widthOf(working); ++px, ++pPixel) {
-            std::size_t const index = cellIndex(cellX(px), cellY(py), cellZ(pPixel->r));
-            setResultInGrid(pGrid, index,
-                            sample3DGrid(pGrid, index) + PixelRGBA32F{pPixel->r, pPixel->g, pPixel->b, 1.0F});
-        }
-        askCallback();
-    }
-    return spGrid;
-}
-
-// The padding of the grid gives every axis at least 8 cells, so the three head positions, the interior and
-// the three tail positions do not overlap.
-template <class Pixel>
-void PlainBilateralFilter::blurLine(ImageCPU const& source, ImageCPU& destination, std::size_t first,
-                                    std::size_t step, std::size_t count) const {
-    Pixel const* const pSource = pixelsOf<Pixel>(source);
-    Pixel* const pDestination = pixelsOf<Pixel>(destination);
-    auto const tap = [&](std::size_t position, std::size_t weight) {
-        return sample3DGrid(pSource, first + position * step) * kBlurWeights[weight];
-    };
-    auto const sumOfTaps = [&](std::size_t position, std::size_t before, std::size_t after) {
-        Pixel sum = tap(position - before, before);
-        for (std::size_t i = position - before + 1; i <= position + after; ++i) {
-            sum += tap(i, i < position ? position - i : i - position);
-        }
-        return sum;
-    };
-    for (std::size_t i = 0; i < 3; ++i) {
-        setResultInGrid(pDestination, first + i * step, sumOfTaps(i, i, 3));
-    }
-    for (std::size_t i = 3; i + 3 < count; ++i) {
-        setResultInGrid(pDestination, first + i * step, sumOfTaps(i, 3, 3));
-    }
-    for (std::size_t i = count - 3; i < count; ++i) {
-        setResultInGrid(pDestination, first + i * step, sumOfTaps(i, 3, count - 1 - i));
-    }
+    return constructGrid<PixelRGBA32F>(working, [](PixelRGBA32F const& pixel) {
+        return PixelRGBA32F{pixel.r, pixel.g, pixel.b, 1.0F};
+    });
 }
 
 template <class Pixel>
 PlainBilateralFilter::ImagePointer PlainBilateralFilter::blurGrid(ImagePointer const& spGrid) const {
     ImagePointer spScratch = makeGrid(*spGrid);
+    Pixel* const pGrid = pixelsOf<Pixel>(*spGrid);
+    Pixel* const pScratch = pixelsOf<Pixel>(*spScratch);
     for (std::size_t y = 0; y < nGridHeight_; ++y) {
         for (std::size_t z = 0; z < nGridDepth_; ++z) {
-            blurLine<Pixel>(*spGrid, *spScratch, cellIndex(0, y, z), 1, nGridWidth_);
+            blurLine(pGrid, pScratch, cellIndex(0, y, z), 1, nGridWidth_);
         }
         askCallback();
     }
     spGrid->initializeToTransparentBlack();
     for (std::size_t x = 0; x < nGridWidth_; ++x) {
         for (std::size_t z = 0; z < nGridDepth_; ++z) {
-            blurLine<Pixel>(*spScratch, *spGrid, cellIndex(x, 0, z), nGridDepth_ * nGridWidth_, nGridHeight_);
+            blurLine(pScratch, pGrid, cellIndex(x, 0, z), nGridDepth_ * nGridWidth_, nGridHeight_);
         }
         askCallback();
     }
     for (std::size_t x = 0; x < nGridWidth_; ++x) {
         for (std::size_t y = 0; y < nGridHeight_; ++y) {
-            blurLine<Pixel>(*spGrid, *spScratch, cellIndex(x, y, 0), nGridWidth_, nGridDepth_);
+            blurLine(pGrid, pScratch, cellIndex(x, y, 0), nGridWidth_, nGridDepth_);
         }
         askCallback();
     }
     return spScratch;
 }
 
-template <class Pixel>
-Pixel PlainBilateralFilter::sampleCube(ImageCPU const& grid, std::size_t px, std::size_t py,
-                                       float value) const {
-    float const fx = static_cast<float>(px) / fSigmaX_ + fGridOffset_ + fPaddingXY_;
-    float const fy = static_cast<float>(py) / fSigmaY_ + fGridOffset_ + fPaddingXY_;
-    float const fz = (value - fValueMin_) / fValueExtent_ / rangeStep() + fGridOffset_ + fPaddingZ_;
-    std::array<std::size_t, 2> const x = {clampedCell(std::floor(fx), nGridWidth_),
-                                          clampedCell(std::floor(fx) + 1.0F, nGridWidth_)};
-    std::array<std::size_t, 2> const y = {clampedCell(std::floor(fy), nGridHeight_),
-                                          clampedCell(std::floor(fy) + 1.0F, nGridHeight_)};
-    std::array<std::size_t, 2> const z = {clampedCell(std::floor(fz), nGridDepth_),
-                                          clampedCell(std::floor(fz) + 1.0F, nGridDepth_)};
-    Pixel const* const pGrid = pixelsOf<Pixel>(grid);
-    std::array<Pixel, 2> planes;
-    for (std::size_t k = 0; k < 2; ++k) {
-        std::array<Pixel, 2> lines;
-        for (std::size_t j = 0; j < 2; ++j) {
-            lines[j] =
-                interpolate(sample3DGridAndDivide(pGrid, cellIndex(x[0], y[j], z[k])),
-                            sample3DGridAndDivide(pGrid, cellIndex(x[1], y[j], z[k])), fx - std::floor(fx));
-        }
-        planes[k] = interpolate(lines[0], lines[1], fy - std::floor(fy));
+template <class Pixel, class Store>
+void PlainBilateralFilter::sliceGrid(ImageCPU& grid, ImageCPU& working, Store const& store) const {
+    Pixel* const pGrid = pixelsOf<Pixel>(grid);
+    for (std::size_t i = 0; i < nGridWidth_ * nGridDepth_ * nGridHeight_; ++i) {
+        setResultInGrid(pGrid, i, sample3DGridAndDivide(pGrid, i));
     }
-    return interpolate(planes[0], planes[1], fz - std::floor(fz));
+    auto const placeOf = [](float place, std::size_t count) {
+        float const whole = floorOf(place);
+        return Place{cellOf(whole, count), cellOf(whole + 1.0F, count), place - whole};
+    };
+    std::vector<Place> aColumns(widthOf(working));
+    for (std::size_t px = 0; px < aColumns.size(); ++px) {
+        aColumns[px] = placeOf(static_cast<float>(px) / fSigmaX_ + fGridOffset_ + fPaddingXY_, nGridWidth_);
+    }
+    // Kept at hand: the compiler must assume that pixels are stored over the fields.
+    float const valueMin = fValueMin_;
+    float const valueExtent = fValueExtent_;
+    float const rangeStep = fRangeSigma_ / fValueExtent_;
+    float const gridOffset = fGridOffset_;
+    float const paddingZ = fPaddingZ_;
+    std::size_t const nWidth = nGridWidth_;
+    std::size_t const nDepth = nGridDepth_;
+    Pixel* pPixel = pixelsOf<Pixel>(working);
+    for (std::size_t py = 0; py < heightOf(working); ++py) {
+        Place const y = placeOf(static_cast<float>(py) / fSigmaY_ + fGridOffset_ + fPaddingXY_, nGridHeight_);
+        std::array<Pixel const*, 2> const apLayers = {pGrid + cellIndex(0, y.nFirst, 0),
+                                                      pGrid + cellIndex(0, y.nSecond, 0)};
+        for (Place const& x : aColumns) {
+            float const level = (intensityOf(*pPixel) - valueMin) / valueExtent / rangeStep;
+            Place const z = placeOf(level + gridOffset + paddingZ, nDepth);
+            auto const alongX = [&](Pixel const* pLayer, std::size_t nLevel) {
+                Pixel const* const pLine = pLayer + nLevel * nWidth;
+                return interpolate(pLine[x.nFirst], pLine[x.nSecond], x.fFraction);
+            };
+            auto const alongXY = [&](std::size_t nLevel) {
+                return interpolate(alongX(apLayers[0], nLevel), alongX(apLayers[1], nLevel), y.fFraction);
+            };
+            store(*pPixel, interpolate(alongXY(z.nFirst), alongXY(z.nSecond), z.fFraction));
+            ++pPixel;
+        }
+    }
 }
 
-void PlainBilateralFilter::sliceGridAndLumaImage(ImageCPU const& grid, ImageCPU& working) const {
-    PixelLuminanceAlpha32F* pPixel = working.pixels_LuminanceAlpha32F();
-    for (std::size_t py = 0; py < heightOf(working); ++py) {
-        for (std::size_t px = 0; px < widthOf(working); ++px, ++pPixel) {
-            pPixel->l = sampleCube<PixelLuminanceAlpha32F>(grid, px, py, pPixel->l).l;
-        }
-    }
+void PlainBilateralFilter::sliceGridAndLumaImage(ImageCPU& grid, ImageCPU& working) const {
+    sliceGrid<PixelLuminanceAlpha32F>(
+        grid, working,
+        [](PixelLuminanceAlpha32F& pixel, PixelLuminanceAlpha32F const& result) { pixel.l = result.l; });
 }
 
-void PlainBilateralFilter::sliceGridAndLABImage(ImageCPU const& grid, ImageCPU& working) const {
-    PixelRGBA32F* pPixel = working.pixels_RGBA32F();
-    for (std::size_t py = 0; py < heightOf(working); ++py) {
-        for (std::size_t px = 0; px < widthOf(working); ++px, ++pPixel) {
-            PixelRGBA32F const result = sampleCube<PixelRGBA32F>(grid, px, py, pPixel->r);
-            *pPixel = {result.r, result.g, result.b, pPixel->a};
-        }
-    }
+void PlainBilateralFilter::sliceGridAndLABImage(ImageCPU& grid, ImageCPU& working) const {
+    sliceGrid<PixelRGBA32F>(grid, working, [](PixelRGBA32F& pixel, PixelRGBA32F const& result) {
+        pixel = {result.r, result.g, result.b, pixel.a};
+    });
 }
 
 void PlainBilateralFilter::writeLuminanceImage(ImageCPU const& working,
                                                ImageWriteAccessor& destination) const {
-    PixelLuminanceAlpha32F const* pPixel = working.pixels_LuminanceAlpha32F();
-    for (int row = 0; row < working.extent().height(); ++row) {
-        for (int column = 0; column < working.extent().width(); ++column, ++pPixel) {
-            float const grey = pPixel->a != 0.0F ? pPixel->l / pPixel->a : pPixel->l;
-            destination.writeRGBAFloatPixel4At(float4(grey, grey, grey, pPixel->a),
-                                               working.position().x() + column, working.position().y() + row);
-        }
-    }
+    writeRows<PixelLuminanceAlpha32F>(working, destination, [](PixelLuminanceAlpha32F const& pixel) {
+        float const grey = pixel.a != 0.0F ? pixel.l / pixel.a : pixel.l;
+        return float4(grey, grey, grey, pixel.a);
+    });
 }
 
 void PlainBilateralFilter::convertToRGB(ImageCPU const& working, ImageWriteAccessor& destination) const {
-    PixelRGBA32F const* pPixel = working.pixels_RGBA32F();
-    for (int row = 0; row < working.extent().height(); ++row) {
-        for (int column = 0; column < working.extent().width(); ++column, ++pPixel) {
-            float4 pixel = lab::LabTosRGB(float4(pPixel->r, pPixel->g, pPixel->b, pPixel->a));
-            if (pixel.w != 0.0F) {
-                pixel = float4(pixel.x / pixel.w, pixel.y / pixel.w, pixel.z / pixel.w, pixel.w);
-            }
-            destination.writeRGBAFloatPixel4At(pixel, working.position().x() + column,
-                                               working.position().y() + row);
+    writeRows<PixelRGBA32F>(working, destination, [](PixelRGBA32F const& pixel) {
+        float4 const rgb = lab::LabTosRGB(float4(pixel.r, pixel.g, pixel.b, pixel.a));
+        if (rgb.w == 0.0F) {
+            return rgb;
         }
-    }
+        return float4(rgb.x / rgb.w, rgb.y / rgb.w, rgb.z / rgb.w, rgb.w);
+    });
 }
 
 // A tap is skipped by its place in memory alone: past the left or right edge it is in the neighbouring row.
@@ -450,39 +507,6 @@ PlainBilateralFilter::applyBruteForceFilterLAB(ImageCPU const& working) const {
         return PixelRGBA32F{sum.r * scale, sum.g * scale, sum.b * scale, centre.a};
     };
     return filterDirectly<PixelRGBA32F>(working, average);
-}
-
-PixelLuminanceAlpha32F PlainBilateralFilter::sample3DGrid(PixelLuminanceAlpha32F const* pGrid,
-                                                          std::size_t index) const {
-    return pGrid[index];
-}
-
-PixelRGBA32F PlainBilateralFilter::sample3DGrid(PixelRGBA32F const* pGrid, std::size_t index) const {
-    return pGrid[index];
-}
-
-PixelLuminanceAlpha32F PlainBilateralFilter::sample3DGridAndDivide(PixelLuminanceAlpha32F const* pGrid,
-                                                                   std::size_t index) const {
-    PixelLuminanceAlpha32F const cell = pGrid[index];
-    return {cell.a != 0.0F ? cell.l / cell.a : 0.0F, cell.a};
-}
-
-PixelRGBA32F PlainBilateralFilter::sample3DGridAndDivide(PixelRGBA32F const* pGrid, std::size_t index) const {
-    PixelRGBA32F const cell = pGrid[index];
-    if (cell.a == 0.0F) {
-        return {0.0F, 0.0F, 0.0F, 0.0F};
-    }
-    return {cell.r / cell.a, cell.g / cell.a, cell.b / cell.a, cell.a};
-}
-
-void PlainBilateralFilter::setResultInGrid(PixelLuminanceAlpha32F* pGrid, std::size_t index,
-                                           PixelLuminanceAlpha32F const& result) const {
-    pGrid[index] = result;
-}
-
-void PlainBilateralFilter::setResultInGrid(PixelRGBA32F* pGrid, std::size_t index,
-                                           PixelRGBA32F const& result) const {
-    pGrid[index] = result;
 }
 
 } // namespace ORVO::ImageFlow::bilateral

@@ -5,6 +5,7 @@
 
 #include <cstddef>
 #include <memory>
+#include <vector>
 
 namespace ORVO {
 class ImageCPU;
@@ -14,9 +15,13 @@ class ImageWriteAccessor;
 
 namespace ORVO::ImageFlow::bilateral {
 
-/// The fast bilateral filter written down plainly: scalar floats, one thread, pixel by pixel through the
-/// accessors. It defines the results of FastBilateralCPUFilter, runs in its place where the portable
-/// instruction set was chosen, and is what tests and benchmarks compare with.
+class RowSource;
+
+/// The fast bilateral filter written down plainly, as an ordinary scalar program: one thread, row by row and
+/// pixel by pixel. It defines the results of FastBilateralCPUFilter, runs in its place where the portable
+/// instruction set was chosen, and is what tests and benchmarks compare with. What does not depend on the
+/// pixel is worked out once, so that the comparison is a fair one: the columns of the grid once a call, the
+/// quotients of its cells once a cell.
 ///
 /// A grid is an image of nGridWidth_ * nGridDepth_ by nGridHeight_ pixels; the cell (x, y, z) is the pixel
 /// (y * nGridDepth_ + z) * nGridWidth_ + x, holding the sums of the channels and, as the last channel, the
@@ -35,27 +40,34 @@ public:
 private:
     using ImagePointer = std::shared_ptr<ImageCPU>;
 
-    void runPhases(ImageReadAccessor const& source, ImageWriteAccessor& destination);
-    bool gridServes() const;
-    void askCallback() const;
-    void finishValueRange(float lowest, float highest);
+    /// The two cells of an axis that something stands between, and how far it is from the first.
+    struct Place {
+        std::size_t nFirst;
+        std::size_t nSecond;
+        float fFraction;
+    };
 
-    void convertToLuminance(ImageReadAccessor const& source, ImageCPU& working);
-    void convertToLAB(ImageReadAccessor const& source, ImageCPU& working);
+    void runPhases(RowSource const& source, ImageWriteAccessor& destination);
+    bool gridServes() const;
+    void askCallback(std::size_t nTimes = 1) const;
+
+    void convertToLuminance(RowSource const& source, ImageCPU& working);
+    void convertToLAB(RowSource const& source, ImageCPU& working);
+    template <class Pixel, class Convert>
+    void convertRows(RowSource const& source, ImageCPU& working, Convert const& convert);
 
     ImagePointer constructDownsampled3DGrid(ImageCPU const& working) const;
     ImagePointer constructDownsampled3DGridLAB(ImageCPU const& working) const;
+    template <class Pixel, class Summand>
+    ImagePointer constructGrid(ImageCPU const& working, Summand const& summandOf) const;
     ImagePointer makeGrid(ImageCPU const& working) const;
     template <class Pixel>
     ImagePointer blurGrid(ImagePointer const& spGrid) const;
-    template <class Pixel>
-    void blurLine(ImageCPU const& source, ImageCPU& destination, std::size_t first, std::size_t step,
-                  std::size_t count) const;
 
-    void sliceGridAndLumaImage(ImageCPU const& grid, ImageCPU& working) const;
-    void sliceGridAndLABImage(ImageCPU const& grid, ImageCPU& working) const;
-    template <class Pixel>
-    Pixel sampleCube(ImageCPU const& grid, std::size_t px, std::size_t py, float value) const;
+    void sliceGridAndLumaImage(ImageCPU& grid, ImageCPU& working) const;
+    void sliceGridAndLABImage(ImageCPU& grid, ImageCPU& working) const;
+    template <class Pixel, class Store>
+    void sliceGrid(ImageCPU& grid, ImageCPU& working, Store const& store) const;
 
     ImagePointer applyBruteForceFilterLuminance(ImageCPU const& working) const;
     ImagePointer applyBruteForceFilterLAB(ImageCPU const& working) const;
@@ -67,19 +79,9 @@ private:
     void writeLuminanceImage(ImageCPU const& working, ImageWriteAccessor& destination) const;
     void convertToRGB(ImageCPU const& working, ImageWriteAccessor& destination) const;
 
-    std::size_t cellIndex(std::size_t x, std::size_t y, std::size_t z) const;
-    std::size_t cellX(std::size_t px) const;
-    std::size_t cellY(std::size_t py) const;
-    std::size_t cellZ(float value) const;
-    float rangeStep() const;
-    PixelLuminanceAlpha32F sample3DGrid(PixelLuminanceAlpha32F const* pGrid, std::size_t index) const;
-    PixelRGBA32F sample3DGrid(PixelRGBA32F const* pGrid, std::size_t index) const;
-    PixelLuminanceAlpha32F sample3DGridAndDivide(PixelLuminanceAlpha32F const* pGrid,
-                                                 std::size_t index) const;
-    PixelRGBA32F sample3DGridAndDivide(PixelRGBA32F const* pGrid, std::size_t index) const;
-    void setResultInGrid(PixelLuminanceAlpha32F* pGrid, std::size_t index,
-                         PixelLuminanceAlpha32F const& result) const;
-    void setResultInGrid(PixelRGBA32F* pGrid, std::size_t index, PixelRGBA32F const& result) const;
+    std::size_t cellIndex(std::size_t x, std::size_t y, std::size_t z) const {
+        return (y * nGridDepth_ + z) * nGridWidth_ + x;
+    }
 
     float fPaddingXY_;
     float fPaddingZ_;
