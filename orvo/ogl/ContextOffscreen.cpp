@@ -22,17 +22,6 @@ void destroyNative(NativeContext const& native) noexcept {
         Internal::GLXPlatform::destroy(native);
 }
 
-/// A native context with its surface, destroyed with this object.
-class OwnedContext {
-public:
-    explicit OwnedContext(NativeContext const& native) noexcept : oNative_(native) {}
-    ~OwnedContext() { destroyNative(oNative_); }
-    OwnedContext(OwnedContext const&) = delete;
-    OwnedContext& operator=(OwnedContext const&) = delete;
-
-    NativeContext const oNative_;
-};
-
 NativeContext createNative(NativeContext const& shareWith) {
     if (shareWith.pContext_ == nullptr)
         return Internal::EGLPlatform::createHeadless();
@@ -84,6 +73,17 @@ public:
     Internal::ContextRecord const& record() const noexcept { return *oRecord_; }
 
 private:
+    /// A native context with its surface, destroyed with this object.
+    class OwnedContext {
+    public:
+        explicit OwnedContext(NativeContext const& native) noexcept : oNative_(native) {}
+        ~OwnedContext() { destroyNative(oNative_); }
+        OwnedContext(OwnedContext const&) = delete;
+        OwnedContext& operator=(OwnedContext const&) = delete;
+
+        NativeContext const oNative_;
+    };
+
     OwnedContext oContext_;
     std::optional<Internal::ContextRecord> oRecord_;
 };

@@ -16,17 +16,6 @@ namespace ORVO::OGL {
 
 namespace {
 
-struct Shader {
-    unsigned nStage_;
-    unsigned nName_;
-    Internal::ShaderSource oSource_;
-};
-
-struct Uniform {
-    int iLocation_;
-    unsigned nType_;
-};
-
 char const* compileMessage(unsigned nStage) noexcept {
     return nStage == GL_VERTEX_SHADER ? "Vertex shader did not compile" : "Fragment shader did not compile";
 }
@@ -44,20 +33,31 @@ std::string logOf(unsigned nName, PFNGLGETSHADERIVPROC get, PFNGLGETSHADERINFOLO
     return sLog;
 }
 
-/// Of the shaders that were linked, the one whose part of the log comes first.
-Internal::ShaderSource const* sourceOfLog(std::vector<Shader> const& aShaders, std::string const& sLog) {
-    std::size_t const nVertex = sLog.find("ertex");
-    std::size_t const nFragment = sLog.find("ragment");
-    unsigned const nStage = nVertex < nFragment ? GL_VERTEX_SHADER : GL_FRAGMENT_SHADER;
-    for (Shader const& shader : aShaders)
-        if (shader.nStage_ == nStage)
-            return &shader.oSource_;
-    return aShaders.empty() ? nullptr : &aShaders.front().oSource_;
-}
-
 } // namespace
 
 struct Program::Details {
+    struct Shader {
+        unsigned nStage_;
+        unsigned nName_;
+        Internal::ShaderSource oSource_;
+    };
+
+    struct Uniform {
+        int iLocation_;
+        unsigned nType_;
+    };
+
+    /// Of the shaders that were linked, the one whose part of the log comes first.
+    Internal::ShaderSource const* sourceOfLog(std::string const& sLog) const {
+        std::size_t const nVertex = sLog.find("ertex");
+        std::size_t const nFragment = sLog.find("ragment");
+        unsigned const nStage = nVertex < nFragment ? GL_VERTEX_SHADER : GL_FRAGMENT_SHADER;
+        for (Shader const& shader : aShaders_)
+            if (shader.nStage_ == nStage)
+                return &shader.oSource_;
+        return aShaders_.empty() ? nullptr : &aShaders_.front().oSource_;
+    }
+
     std::vector<Shader> aShaders_;
     bool bLinked_ = false;
     /// By name; of arrays also by the name without "[0]".
@@ -93,7 +93,7 @@ void Program::loadShader(unsigned nStage, unsigned count, char const* const* ppS
         ORVO_ENFORCE(ppSources[i], "ppSources");
     ORVO_OGL_REQUIRE_CONTEXT();
     pDetails_->aShaders_.reserve(pDetails_->aShaders_.size() + 1);
-    Shader shader{nStage, 0, Internal::ShaderSource(count, ppSources, pLengths)};
+    Details::Shader shader{nStage, 0, Internal::ShaderSource(count, ppSources, pLengths)};
     shader.nName_ = glCreateShader(nStage);
     if (shader.nName_ == 0)
         ORVO_OGL_FAIL("The shader could not be created", GL_OUT_OF_MEMORY);
@@ -116,7 +116,7 @@ void Program::loadShader(unsigned nStage, unsigned count, char const* const* ppS
 }
 
 void Program::releaseShaders() noexcept {
-    for (Shader const& shader : pDetails_->aShaders_) {
+    for (Details::Shader const& shader : pDetails_->aShaders_) {
         glDetachShader(objectID(), shader.nName_);
         glDeleteShader(shader.nName_);
     }
@@ -133,8 +133,7 @@ void Program::link(bool bReleaseShaders) {
     std::string sFailure;
     if (nLinked == GL_FALSE) {
         std::string const sLog = logOf(objectID(), glGetProgramiv, glGetProgramInfoLog);
-        sFailure =
-            Internal::describeFailure("Program did not link", sLog, sourceOfLog(pDetails_->aShaders_, sLog));
+        sFailure = Internal::describeFailure("Program did not link", sLog, pDetails_->sourceOfLog(sLog));
     }
     if (bReleaseShaders)
         releaseShaders();
@@ -159,7 +158,7 @@ void Program::readUniforms() {
         glGetActiveUniform(objectID(), static_cast<GLuint>(i), static_cast<GLsizei>(aName.size()), &nLength,
                            &nElements, &nType, aName.data());
         std::string const sName(aName.data(), static_cast<std::size_t>(nLength));
-        Uniform const uniform{glGetUniformLocation(objectID(), sName.c_str()), nType};
+        Details::Uniform const uniform{glGetUniformLocation(objectID(), sName.c_str()), nType};
         pDetails_->aUniforms_[sName] = uniform;
         std::size_t const nBracket = sName.rfind("[0]");
         if (nBracket != std::string::npos && nBracket + 3 == sName.size())

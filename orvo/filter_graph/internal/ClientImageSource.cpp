@@ -11,7 +11,7 @@ ClientImageSource::ClientImageSource()
 
 ClientImageSource::~ClientImageSource() = default;
 
-void ClientImageSource::noteContent(ImageCPU const* pImage, std::uint64_t contentStamp) {
+void ClientImageSource::noteContent(ORVO::ImageCPU const* pImage, std::uint64_t contentStamp) {
     if (oWatch_.mayHaveChanged(pImage, pImage ? pImage->pixels() : nullptr, contentStamp)) {
         oChange_.setValue(oChange_.value() + 1);
     }

@@ -11,7 +11,7 @@ ClientTextureSource::ClientTextureSource()
 
 ClientTextureSource::~ClientTextureSource() = default;
 
-void ClientTextureSource::noteContent(ImageGPU const* pImage, std::uint64_t contentStamp) {
+void ClientTextureSource::noteContent(ORVO::ImageGPU const* pImage, std::uint64_t contentStamp) {
     if (oWatch_.mayHaveChanged(pImage, pImage ? pImage->texture() : nullptr, contentStamp)) {
         oChange_.setValue(oChange_.value() + 1);
     }

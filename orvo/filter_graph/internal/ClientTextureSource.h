@@ -22,7 +22,7 @@ public:
     /// To be called with the image of each frame (not owned, may be null) and its content stamp. Counts a
     /// change unless `contentStamp` is not 0 and image, texture, rectangle (pixel space) and stamp are those
     /// of the last call.
-    void noteContent(ImageGPU const* pImage, std::uint64_t contentStamp);
+    void noteContent(ORVO::ImageGPU const* pImage, std::uint64_t contentStamp);
 
 private:
     DataFlow::Parameter<unsigned long long> oChange_;

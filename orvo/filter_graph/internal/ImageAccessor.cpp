@@ -106,9 +106,15 @@ ImageDescriptor::eChannelType channelTypeOf(GPU::tePixelFormat ePixelFormat) {
     case GPU::PIXEL_FORMAT_LUMINANCE32F:
     case GPU::PIXEL_FORMAT_LUMINANCE_ALPHA32F:
         return ImageDescriptor::CHANNEL_TYPE_FLOAT32;
-    default:
-        ORVO_FAIL("Not implemented: ePixelFormat in mapPixelFormatToDescriptorFormat");
+    case GPU::PIXEL_FORMAT_RGBA32F:
+    case GPU::PIXEL_FORMAT_RGBA16:
+    case GPU::PIXEL_FORMAT_RGB16:
+    case GPU::PIXEL_FORMAT_LUMINANCE16F:
+    case GPU::PIXEL_FORMAT_LUMINANCE_ALPHA16:
+    case GPU::PIXEL_FORMAT_UNDEFINED:
+        break;
     }
+    ORVO_FAIL("Not implemented: ePixelFormat in mapPixelFormatToDescriptorFormat");
 }
 
 std::shared_ptr<FilterGraph::ImageBase> wrapPixels(CPU& image) {

@@ -77,14 +77,12 @@ std::shared_ptr<Filter> InputAdapter::clone() {
 std::shared_ptr<IFilterExecutable> InputAdapter::buildFilterExecutable(TargetPlatform,
                                                                        GraphExecutable& graphExecutable) {
     // What the source is made for follows from where the image lives, not from the target of the graph.
-    switch (getImageDescriptor().type()) {
-    case ORVO_TARGET_GL:
+    TargetPlatform const type = getImageDescriptor().type();
+    if (type == ORVO_TARGET_GL)
         return std::make_shared<InputAdapterExecutableGL>(graphExecutable, *this);
-    case ORVO_TARGET_CPU:
+    if (type == ORVO_TARGET_CPU)
         return std::make_shared<InputAdapterExecutableCPU>(graphExecutable, *this);
-    default:
-        ORVO_FAIL_PARAMETER("false");
-    }
+    ORVO_FAIL_PARAMETER("false");
 }
 
 } // namespace ORVO::FilterGraph::Internal
