@@ -146,8 +146,8 @@ public:
     }
 
     void unmap() {
-        bMapped_ = false;
         pBuffer_->unmap();
+        bMapped_ = false;
     }
 
     void giveBack() {
