@@ -145,8 +145,9 @@ public:
     }
 
     void unmap() {
-        bMapped_ = false;
+        // What fails here is tried once more at the end: a buffer that stays mapped could not be used again.
         pBuffer_->unmap();
+        bMapped_ = false;
     }
 
     void giveBack() {

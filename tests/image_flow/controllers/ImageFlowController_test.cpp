@@ -371,17 +371,6 @@ TEST_F(ImageFlowControllerTest, theSinksImageDecidesThePrecisionOfAllNodes) {
     }
 }
 
-TEST_F(ImageFlowControllerTest, aSinkOnTheGPUSaysNothingAboutCPUFormats) {
-    Diamond graph;
-    ImageCPU image(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 2, 2), PixelExtentInWorldSpace(),
-                   ExtentInPixelSpace());
-    graph.d.setBoundOutputImage(&image);
-    graph.d.outputTarget_ = ORVO_TARGET_GL;
-    ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true),
-                         "Not implemented: ImageGPU Pixel format not supported");
-    graph.d.outputTarget_ = ORVO_TARGET_CPU;
-}
-
 TEST_F(ImageFlowControllerTest, channelCountsFlowFromTheSourcesWhateverTheOrderOfTheList) {
     TestFilter source(0, true, "source");
     TestFilter middle(1, true, "middle");
