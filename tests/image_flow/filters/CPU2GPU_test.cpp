@@ -259,16 +259,16 @@ TEST_F(CPU2GPUTest, everyCallMayFail) {
         road.oChain_.run(worldOf(pixels(0, 0, 3, 2)));
         ImageGPUPtr(road.oSink_.releaseImageGPU());
     };
-    auto const aFailed = ORVO::Test::failEveryCallBeforeThePool(run, [&] {
+    auto const check = [&] {
         this->host().makeCurrent();
         road.oChain_.oController_.flushGraph();
         road.oChain_.run(worldOf(pixels(0, 0, 3, 2)));
         ASSERT_NE(nullptr, road.oSink_.getImageGPU());
         EXPECT_EQ(std::vector<unsigned char>(24, 77), readTexels(*road.oSink_.getImageGPU()));
-    });
-    EXPECT_EQ(1u, aFailed.count("glTexSubImage2D"));
-    EXPECT_EQ(1u, aFailed.count("glTexImage2D"));
-    EXPECT_EQ(1u, aFailed.count("glGenTextures"));
+    };
+    ORVO::Test::failEveryCallBeforeThePool(run, check,
+                                           {"glGenTextures", "glTexImage2D", "glBeginQuery", "glMapBuffer",
+                                            "glUnmapBuffer", "glTexSubImage2D", "eglMakeCurrent"});
 }
 
 } // namespace
