@@ -18,7 +18,7 @@ namespace ORVO {
 namespace {
 
 /// Buffers are made in steps of this size, and one that is larger than asked for by more is not taken.
-constexpr std::int64_t nStep = 0x40000;
+constexpr std::int64_t nPBOStep = 0x40000;
 constexpr std::size_t nMaximumPBOBytes = 0x8000000;
 
 OGL::FunctionTable const& gl() noexcept { return *OGL::ExtensionManager::Instance()->table(); }
@@ -38,7 +38,7 @@ PBOQueue::Entries::iterator PBOQueue::findFree(unsigned sizeInBytes) {
     unsigned const nCurrent = currentSampleQuery();
     auto const isFree = [nCurrent, sizeInBytes](Entry const& entry) {
         long long const nExcess = entry.pBuffer_->size() - static_cast<long long>(sizeInBytes);
-        if (entry.bOutstanding_ || nExcess < 0 || nExcess > nStep)
+        if (entry.bOutstanding_ || nExcess < 0 || nExcess > nPBOStep)
             return false;
         // A number of another context's query says nothing here, and one that is active must not be asked.
         if (!isOfCurrentContext(entry))
@@ -57,7 +57,7 @@ PBOQueue::Entries::iterator PBOQueue::findFree(unsigned sizeInBytes) {
 PBOQueue::Entries::iterator PBOQueue::append(unsigned sizeInBytes) {
     if (oEntries_.size() == oEntries_.max_size())
         throw std::length_error("list<T> too long");
-    long long const nBytes = (static_cast<long long>(sizeInBytes) + nStep - 1) / nStep * nStep;
+    long long const nBytes = (static_cast<long long>(sizeInBytes) + nPBOStep - 1) / nPBOStep * nPBOStep;
     ScopedPtr<OGL::Buffer> pBuffer(ORVO_NEW OGL::Buffer(nBytes, OGL::Buffer::TYPE_PIXEL_UNPACK,
                                                         OGL::Buffer::USAGE_STREAM_DRAW, nullptr));
     oEntries_.push_back(Entry{pBuffer.get(), 0, false, false, nullptr});

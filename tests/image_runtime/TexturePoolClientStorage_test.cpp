@@ -5,6 +5,15 @@
 
 #include <gtest/gtest.h>
 
+#include <epoxy/egl.h>
+#include <epoxy/gl.h>
+
+#include <algorithm>
+#include <cstdint>
+#include <set>
+#include <utility>
+#include <vector>
+
 namespace ORVO {
 namespace {
 
@@ -147,6 +156,74 @@ TEST_F(TexturePoolClientStorage, HandsOutTheOldestThatFits) {
     EXPECT_EQ(pSmall, take(64, 64));
     giveBack(pLarge);
     giveBack(pSmall);
+}
+
+/// A driver that tells when it has done with a texture's memory, played by replaced entry points.
+class TexturePoolFencedStorage : public TexturePoolClientStorage {
+protected:
+    void SetUp() override {
+        TexturePoolClientStorage::SetUp();
+        aBusy_.clear();
+        aFinished_.clear();
+        pGetStringi_ = reinterpret_cast<decltype(pGetStringi_)>(eglGetProcAddress("glGetStringi"));
+        ASSERT_NE(nullptr, pGetStringi_);
+        epoxy_glGetStringi = [](GLenum name, GLuint i) {
+            bool const bFence = name == GL_EXTENSIONS && i == 0;
+            return bFence ? reinterpret_cast<GLubyte const*>("GL_APPLE_fence") : pGetStringi_(name, i);
+        };
+        pTestObject_ = std::exchange(epoxy_glTestObjectAPPLE, [](GLenum object, GLuint name) -> GLboolean {
+            EXPECT_EQ(static_cast<GLenum>(GL_TEXTURE), object);
+            return aBusy_.count(name) == 0;
+        });
+        pFinishObject_ = std::exchange(epoxy_glFinishObjectAPPLE, [](GLenum object, GLint name) {
+            EXPECT_EQ(static_cast<GLenum>(GL_TEXTURE), object);
+            EXPECT_TRUE(glIsTexture(static_cast<GLuint>(name)));
+            aFinished_.push_back(static_cast<GLuint>(name));
+        });
+    }
+    void TearDown() override {
+        pPool_.reset();
+        epoxy_glGetStringi = pGetStringi_;
+        epoxy_glTestObjectAPPLE = pTestObject_;
+        epoxy_glFinishObjectAPPLE = pFinishObject_;
+        TexturePoolClientStorage::TearDown();
+    }
+
+    static inline std::set<GLuint> aBusy_;
+    static inline std::vector<GLuint> aFinished_;
+    static inline PFNGLGETSTRINGIPROC pGetStringi_ = nullptr;
+    static inline PFNGLTESTOBJECTAPPLEPROC pTestObject_ = nullptr;
+    static inline PFNGLFINISHOBJECTAPPLEPROC pFinishObject_ = nullptr;
+};
+
+TEST_F(TexturePoolFencedStorage, PassesOverWhatTheDriverStillReads) {
+    OGL::TextureRECT* const pFirst = take(64, 64);
+    OGL::TextureRECT* const pSecond = take(64, 64);
+    giveBack(pFirst);
+    giveBack(pSecond);
+    aBusy_ = {pFirst->objectID()};
+    EXPECT_EQ(pSecond, take(64, 64));
+    OGL::TextureRECT* const pThird = take(64, 64);
+    EXPECT_NE(pFirst, pThird);
+    aBusy_.clear();
+    EXPECT_EQ(pFirst, take(64, 64));
+    EXPECT_EQ(std::vector<GLuint>(), aFinished_);
+    for (OGL::TextureRECT* p : {pFirst, pSecond, pThird})
+        giveBack(p);
+}
+
+TEST_F(TexturePoolFencedStorage, WaitsBeforeItDeletes) {
+    OGL::TextureRECT* const pFirst = take(64, 64);
+    OGL::TextureRECT* const pSecond = take(64, 64);
+    std::vector<GLuint> const aNames{pFirst->objectID(), pSecond->objectID()};
+    giveBack(pFirst);
+    giveBack(pSecond);
+    // 32 KiB: the first goes, which leaves half.
+    pool().setMaximumPoolSize(32768);
+    EXPECT_EQ(std::vector<GLuint>(1, aNames[0]), aFinished_);
+    EXPECT_EQ(16384u, freeBytes());
+    pool().clearRECTPool();
+    EXPECT_EQ(aNames, aFinished_);
 }
 
 } // namespace
