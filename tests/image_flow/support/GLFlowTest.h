@@ -47,13 +47,21 @@ protected:
         upRuntime_.reset();
         host().makeCurrent();
         upContext_.reset();
+        if (bEndWithHost_) {
+            loseHost();
+            GLHooks::forgetObjects();
+        }
         GLTest::TearDown();
     }
+
+    /// For tests that destroy a context: the driver ends with it what is counted on.
+    void endWithHost() { bEndWithHost_ = true; }
 
     /// The host's context.
     OGL::Context const& context() const { return *upContext_; }
 
 private:
+    bool bEndWithHost_ = false;
     std::unique_ptr<OGL::Context> upContext_;
     std::unique_ptr<ImageRuntime::AutoInitializer> upRuntime_;
     std::unique_ptr<DataFlow::AutoInitializer> upDataFlow_;

@@ -4,6 +4,7 @@
 #include <memory>
 #include <set>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "orvo/core/memory/TrackedNew.h"
@@ -123,6 +124,29 @@ TEST_F(TextureUploadContexts, HasNamesInEachContext) {
     TextureUpload next;
     put(next, aPixels_);
     EXPECT_EQ(nQueries + 16, countOf("query"));
+}
+
+TEST_F(TextureUploadContexts, UploadsOnAnotherThread) {
+    auto const pSharing = host().another(true);
+    auto pUpload = std::make_unique<TextureUpload>();
+    put(*pUpload, aPixels_);
+    std::thread thread([&] {
+        pSharing->makeCurrent();
+        put(*pUpload, aOthers_);
+        EXPECT_EQ(aOthers_, get());
+        EXPECT_EQ(0U, drainErrors());
+        pSharing->release();
+    });
+    thread.join();
+    EXPECT_EQ(aOthers_, get());
+    put(*pUpload, aPixels_);
+    EXPECT_EQ(aPixels_, get());
+    // Each context's names go while it is current.
+    pSharing->makeCurrent();
+    pUpload.reset();
+    host().makeCurrent();
+    TextureUpload next;
+    put(next, aPixels_);
 }
 
 TEST_F(TextureUploadContexts, KeepsNamesOfADeadUploadUntilTheirContextIsCurrent) {
