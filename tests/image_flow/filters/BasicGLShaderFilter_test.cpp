@@ -377,6 +377,21 @@ TEST_F(BasicGLShaderFilterTest, DrawsAlsoWithAProgramThatDoesNotValidate) {
     expectPicture(Picture(*pOutput), Picture(*upInput), Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
 }
 
+TEST_F(BasicGLShaderFilterTest, SaysWhenItIsRunWhyItDidNotCompile) {
+    ImageGPUPtr const upInput = textureImage(pixels(0, 0, 4, 4), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ShaderNode node("void main() { gl_FragColor = nonsense; }");
+    EXPECT_FALSE(node.willRunInHardware());
+    ShaderRoad road(frameContext(), node);
+    road.setInput(0, *upInput);
+    try {
+        road.run(world(0, 0, 4, 4));
+        ADD_FAILURE();
+    } catch (OGL::ExceptionOGL const& exception) {
+        EXPECT_EQ(0U, std::string(exception.message()).find("Fragment shader did not compile: "));
+    }
+    EXPECT_EQ(-1, upInput->boundTexUnit());
+}
+
 TEST_F(BasicGLShaderFilterTest, RefusesAnInputWithoutData) {
     ShaderNode node(copyShader());
     ShaderRoad road(frameContext(), node);
