@@ -20,13 +20,13 @@ namespace ORVO::FilterGraph {
 /// name space and vendor "ORVO", "Norvane", on OpenGL alone:
 /// - "premultiply", "unpremultiply": colour times alpha, and back,
 /// - "scaleUp1channel" to "scaleUp4channel": 16-bit integers of the scale 0..32768 to OpenGL's 0..65535,
-/// - "scaleDown1channel" to "scaleDown4channel": back. A processor puts these two kinds itself where images of
-///   `CHANNEL_TYPE_UINT15_1` meet a graph on OpenGL. On textures of two channels the result has four.
+/// - "scaleDown1channel" to "scaleDown4channel": back. A processor puts these two kinds itself where images
+///   of `CHANNEL_TYPE_UINT15_1` meet a graph on OpenGL. On textures of two channels the result has four.
 ///
-/// All have version 1. The bilateral and Lab filters run on the CPU; they read and write 8-bit and float images alone, and every
-/// filter works in the depth of the image that its graph ends in. A host with 16-bit images puts
-/// "ConvertToSIMDOptimized" in front of them, ends the graph in a float image, and brings that back to 16
-/// bits with a graph that has no filter between input and output.
+/// All have version 1. The bilateral and Lab filters run on the CPU alone; they read and write 8-bit and
+/// float images, and every filter works in the depth of the image that its graph ends in. A host with 16-bit
+/// images puts "ConvertToSIMDOptimized" in front of them, ends the graph in a float image, and brings that
+/// back to 16 bits with a graph that has no filter between input and output.
 ///
 /// Library::initialize does not call this.
 /// @throws Exception if one of them is registered already, InternalException "isInitialized()" while the
