@@ -1,8 +1,10 @@
 #pragma once
 
 #include "orvo/image_flow/ImageFlowLibrary.h"
+#include "orvo/image_flow/ScopedTexturePoolAccessors.h"
 #include "orvo/image_flow/controllers/Bedding.h"
 #include "orvo/image_flow/controllers/ImageFlowController.h"
+#include "orvo/image_flow/filters/BasicGLShaderFilter.h"
 #include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/ConvertFromSIMDOptimized.h"
 #include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
@@ -10,9 +12,11 @@
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
 #include "orvo/image_flow/filters/FormatEnumConversionUtil.h"
 #include "orvo/image_flow/filters/GPU2CPU.h"
+#include "orvo/image_flow/filters/ImageQuad.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
+#include "orvo/image_flow/filters/SimpleFilterGPU.h"
 #include "orvo/image_flow/graph/DFSPostStackVisitor.h"
 #include "orvo/image_flow/graph/PropagateDODVisitor.h"
 #include "orvo/image_flow/graph/PropagatePixelExtentVisitor.h"
