@@ -54,10 +54,22 @@ for filter in SimpleBilateralCPU RGBToLABCPU LABToRGBCPU FastBilateralFilter; do
     accepted --filter $filter "$data/chelsea.png" "$scratch/$filter.png"
 done
 
+# On OpenGL an opaque photograph that is premultiplied stays as it is, in every depth.
+for variation in "" "--async --repeat 2" "--precision 16" "--precision 32f"; do
+    # shellcheck disable=SC2086
+    accepted --target gl --filter premultiply $variation "$photograph" "$scratch/gl.png"
+    # shellcheck disable=SC2086
+    accepted --target gl --filter unpremultiply $variation "$scratch/gl.png" "$scratch/gl_again.png"
+    cmp -s "$scratch/gl.png" "$scratch/gl_again.png" || fail "another picture on gl with $variation"
+done
+accepted --target gl --filter scaleDown4channel "$photograph" "$scratch/gl_dark.png"
+cmp -s "$scratch/gl.png" "$scratch/gl_dark.png" && fail "scaleDown4channel changes nothing"
+
 accepted --list
 for line in 'FastBilateralBlur  (Motion Loft, Norvane Works, version 1)' \
     'spatialSigma  float2  default 10,10  from 0.1,0.1 to 100,100' 'rangeSigma  float  default 0.15' \
-    'colorize  bool  default false' 'input src' 'RGBToLABCPU' 'SimpleBilateralCPU'; do
+    'colorize  bool  default false' 'input src' 'RGBToLABCPU' 'SimpleBilateralCPU' \
+    'premultiply  (ORVO, Norvane, version 1)' 'runs on cpu' 'runs on gl'; do
     grep -qF "$line" "$scratch/stdout" || fail "no \"$line\" in the list"
 done
 accepted --help
@@ -65,6 +77,11 @@ grep -q '^Usage: apply_filter' "$scratch/stdout" || fail "no usage in --help"
 
 refused 2 'There is no filter "Nonsense"' --filter Nonsense "$photograph" "$scratch/out.png"
 refused 2 'has no parameter "sigma"' "${bilateral[@]}" --set sigma=1 "$photograph" "$scratch/out.png"
+refused 2 'The filter "FastBilateralBlur" does not run on gl (--list shows the targets)' "${bilateral[@]}" \
+    --target gl "$photograph" "$scratch/out.png"
+refused 2 'The filter "premultiply" does not run on cpu (--list shows the targets)' --filter premultiply \
+    "$photograph" "$scratch/out.png"
+refused 2 '--target is cpu or gl, not "gpu"' --target gpu --filter premultiply "$photograph" "$scratch/out.png"
 refused 2 'is of type float2, which "10" is not' "${bilateral[@]}" --set spatialSigma=10 "$photograph" "$scratch/out.png"
 refused 2 'is of type float, which "wide" is not' "${bilateral[@]}" --set rangeSigma=wide "$photograph" "$scratch/out.png"
 refused 2 'is of type bool, which "yes" is not' "${bilateral[@]}" --set colorize=yes "$photograph" "$scratch/out.png"
