@@ -84,20 +84,22 @@ std::vector<Model> models() {
     };
 }
 
+// Alpha is 1 to 255: between textures that are no power of two wide, linear filtering may add a trace of the
+// neighbour to a texel, and a trace divided by an alpha that is a trace may be anything.
 Picture randomBytes(std::size_t channels) {
     std::mt19937 random(7);
     Picture picture(37, 23, channels, Depth::uint8);
-    for (unsigned char& value : picture.pixels)
-        value = static_cast<unsigned char>(random());
+    for (std::size_t i = 0; i < picture.pixels.size(); ++i)
+        picture.pixels[i] = static_cast<unsigned char>(i % 4 == 3 ? 1 + random() % 255 : random() % 256);
     return picture;
 }
 
-// Values from -1 to 3 that 16-bit floats hold exactly; alpha from 0 to 1.
+// Values from -1 to 3 that 16-bit floats hold exactly; alpha from 1/8 to 1.
 std::vector<float> randomFloats(std::size_t count) {
     std::mt19937 random(11);
     std::vector<float> values(count);
     for (std::size_t i = 0; i < count; ++i)
-        values[i] = i % 4 == 3 ? static_cast<float>(random() % 65) / 64.0F
+        values[i] = i % 4 == 3 ? static_cast<float>(8 + random() % 57) / 64.0F
                                : static_cast<float>(random() % 257) / 64.0F - 1.0F;
     return values;
 }
@@ -133,7 +135,7 @@ TEST_F(FrameRunner, FloatsOnOpenGLAreSixteenBitFloatsAlsoOutsideZeroToOne) {
         for (std::size_t i = 0; i < values.size(); i += 4) {
             Pixel const expected = model.apply({values[i], values[i + 1], values[i + 2], values[i + 3]});
             for (std::size_t c = 0; c < 4; ++c)
-                ASSERT_NEAR(computed[i + c], expected[c], std::abs(expected[c]) / 1024.0)
+                ASSERT_NEAR(computed[i + c], expected[c], std::abs(expected[c]) / 1024.0 + 1e-4)
                     << model.filter << ", pixel " << i / 4 << ", channel " << c;
         }
     }
