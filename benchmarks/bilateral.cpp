@@ -10,6 +10,7 @@
 // timed, each variant is compared with the plain one.
 #include "orvo/image_flow/filters/FastBilateralCPUFilter.h"
 
+#include "benchmarks/support/Timing.h"
 #include "orvo/core/utility/SharedPtr.h"
 #include "orvo/image_flow/filters/bilateral/BandRunner.h"
 #include "orvo/image_flow/filters/bilateral/PlainBilateralFilter.h"
@@ -26,7 +27,6 @@
 #include <algorithm>
 #include <atomic>
 #include <barrier>
-#include <chrono>
 #include <cmath>
 #include <cstring>
 #include <memory>
@@ -38,6 +38,8 @@
 namespace {
 
 using namespace ORVO;
+using Benchmarks::medianOf;
+using Benchmarks::secondsOf;
 using ImageFlow::bilateral::BandRunner;
 using ImageRuntime::InstructionSet;
 
@@ -124,18 +126,6 @@ private:
     std::atomic<std::size_t> iNext_{0};
     std::vector<std::thread> aThreads_;
 };
-
-double secondsOf(auto const& job) {
-    auto const start = std::chrono::steady_clock::now();
-    job();
-    return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
-}
-
-double medianOf(std::vector<double> aValues) {
-    auto const iMiddle = aValues.begin() + static_cast<std::ptrdiff_t>(aValues.size() / 2);
-    std::nth_element(aValues.begin(), iMiddle, aValues.end());
-    return *iMiddle;
-}
 
 double largestDifference(ImageCPU const& result, ImageCPU const& expected) {
     auto const* const pResult = reinterpret_cast<float const*>(result.pixels());

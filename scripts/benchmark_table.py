@@ -11,7 +11,8 @@ Medians, where a benchmark was repeated. Columns:
              named "memcpy/<bytes>", of which the one nearest in size is taken; or the counter "to_memcpy" of a
              program that measured the two by turns
   plain      how many times faster than the plain version: the benchmark whose name differs in one part alone, which
-             is "plain" or, where there is none, "threads_1"; per item, where items are counted
+             is "plain" or, where there is none, "threads_1"; per item, where items are counted; or the counter
+             "to_plain" of a program that measured the two by turns
   notes      label and counters of the program
 """
 
@@ -26,6 +27,7 @@ BASELINES = ("plain", "threads_1")
 OWN_NUMBERS = {
     "family_index", "per_family_instance_index", "repetitions", "repetition_index", "threads", "iterations",
     "real_time", "cpu_time", "bytes_per_second", "items_per_second", "to_memcpy",
+    "to_plain",
 }
 
 
@@ -38,6 +40,7 @@ class Row:
         self.bytes_per_second = entry.get("bytes_per_second")
         self.items_per_second = entry.get("items_per_second")
         self.to_memcpy = entry.get("to_memcpy")
+        self.to_plain = entry.get("to_plain")
         counters = [f"{key} {value:.4g}" for key, value in entry.items()
                     if isinstance(value, (int, float)) and not isinstance(value, bool) and key not in OWN_NUMBERS]
         self.notes = ", ".join(filter(None, [entry.get("label", ""), *counters]))
@@ -92,6 +95,8 @@ def find_baseline(row, rows):
 
 def plain_ratio(row, rows):
     """How many times faster than its plain version the row is, per item where items are counted."""
+    if row.to_plain:
+        return row.to_plain
     plain = find_baseline(row, rows)
     if plain is None or plain.failure or not row.seconds:
         return None

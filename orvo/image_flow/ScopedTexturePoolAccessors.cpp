@@ -26,12 +26,19 @@ TexturePool* poolIfAny() noexcept {
     }
 }
 
-/// Gives a texture to the pool, or deletes it where there is none any more.
+/// Without a pool that serves the current context, textures of two dimensions wait for theirs; the others
+/// are deleted.
+void giveUp(OGL::Texture2D* pTexture) noexcept { TexturePool::returnTexture2DLater(pTexture); }
+template <typename TextureT>
+void giveUp(TextureT* pTexture) noexcept {
+    trackedDelete(pTexture);
+}
+
 template <typename TextureT>
 void giveBack(TextureT* pTexture, void (TexturePool::*pReturn)(TextureT*)) noexcept {
     TexturePool* const pPool = poolIfAny();
     if (!pPool) {
-        trackedDelete(pTexture);
+        giveUp(pTexture);
         return;
     }
     try {

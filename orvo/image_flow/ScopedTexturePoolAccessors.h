@@ -4,8 +4,8 @@
 /// at the end.
 ///
 /// Constructors throw InternalException "Enforce TexturePool::Instance() != NULL" where there is no pool, and
-/// what TexturePool::Instance() and the pool throw. Destructors let nothing out; a texture whose pool cannot
-/// be reached then is deleted, or left to the end of its contexts.
+/// what TexturePool::Instance() and the pool throw. Destructors let nothing out; where the pool cannot be
+/// reached then, a 2D texture waits for it, and others are deleted, or left to the end of their contexts.
 ///
 /// Threads: as TexturePool.
 

@@ -2,6 +2,7 @@
 
 #include "orvo/core/Check.h"
 #include "orvo/core/utility/ScopedPtr.h"
+#include "orvo/image_runtime/SampleQueries.h"
 #include "orvo/ogl/Buffer.h"
 #include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/NativeContext.h"
@@ -17,28 +18,12 @@ namespace ORVO {
 namespace {
 
 /// Buffers are made in steps of this size, and one that is larger than asked for by more is not taken.
-constexpr std::int64_t nStep = 0x40000;
+constexpr std::int64_t nPBOStep = 0x40000;
 constexpr std::size_t nMaximumPBOBytes = 0x8000000;
 
 OGL::FunctionTable const& gl() noexcept { return *OGL::ExtensionManager::Instance()->table(); }
 
 bool isQuery(unsigned nQuery) noexcept { return gl().glIsQuery(nQuery) != GL_FALSE; }
-
-unsigned currentQuery(unsigned nTarget) noexcept {
-    GLint nQuery = 0;
-    glGetQueryiv(nTarget, GL_CURRENT_QUERY, &nQuery);
-    return static_cast<unsigned>(nQuery);
-}
-
-/// Whether a query of samples is active. The targets that later versions have share one place with
-/// GL_SAMPLES_PASSED.
-bool isAnyQueryActive() noexcept {
-    int const nVersion = epoxy_gl_version();
-    bool const bAny = nVersion >= 33 || epoxy_has_gl_extension("GL_ARB_occlusion_query2");
-    bool const bConservative = nVersion >= 43 || epoxy_has_gl_extension("GL_ARB_ES3_compatibility");
-    return currentQuery(GL_SAMPLES_PASSED) != 0 || (bAny && currentQuery(GL_ANY_SAMPLES_PASSED) != 0) ||
-           (bConservative && currentQuery(GL_ANY_SAMPLES_PASSED_CONSERVATIVE) != 0);
-}
 
 } // namespace
 
@@ -50,10 +35,10 @@ bool PBOQueue::isOfCurrentContext(Entry const& entry) noexcept {
 }
 
 PBOQueue::Entries::iterator PBOQueue::findFree(unsigned sizeInBytes) {
-    unsigned const nCurrent = currentQuery(GL_SAMPLES_PASSED);
+    unsigned const nCurrent = currentSampleQuery();
     auto const isFree = [nCurrent, sizeInBytes](Entry const& entry) {
         long long const nExcess = entry.pBuffer_->size() - static_cast<long long>(sizeInBytes);
-        if (entry.bOutstanding_ || nExcess < 0 || nExcess > nStep)
+        if (entry.bOutstanding_ || nExcess < 0 || nExcess > nPBOStep)
             return false;
         // A number of another context's query says nothing here, and one that is active must not be asked.
         if (!isOfCurrentContext(entry))
@@ -72,7 +57,7 @@ PBOQueue::Entries::iterator PBOQueue::findFree(unsigned sizeInBytes) {
 PBOQueue::Entries::iterator PBOQueue::append(unsigned sizeInBytes) {
     if (oEntries_.size() == oEntries_.max_size())
         throw std::length_error("list<T> too long");
-    long long const nBytes = (static_cast<long long>(sizeInBytes) + nStep - 1) / nStep * nStep;
+    long long const nBytes = (static_cast<long long>(sizeInBytes) + nPBOStep - 1) / nPBOStep * nPBOStep;
     ScopedPtr<OGL::Buffer> pBuffer(ORVO_NEW OGL::Buffer(nBytes, OGL::Buffer::TYPE_PIXEL_UNPACK,
                                                         OGL::Buffer::USAGE_STREAM_DRAW, nullptr));
     oEntries_.push_back(Entry{pBuffer.get(), 0, false, false, nullptr});
@@ -82,10 +67,10 @@ PBOQueue::Entries::iterator PBOQueue::append(unsigned sizeInBytes) {
 }
 
 void PBOQueue::beginQuery(Entry& entry) {
-    unsigned const nCurrent = currentQuery(GL_SAMPLES_PASSED);
+    unsigned const nCurrent = currentSampleQuery();
     if (nCurrent != 0 && isQueueQuery(nCurrent))
         gl().glEndQuery(GL_SAMPLES_PASSED);
-    entry.bBegun_ = !isAnyQueryActive();
+    entry.bBegun_ = !isAnySampleQueryActive();
     if (entry.bBegun_)
         gl().glBeginQuery(GL_SAMPLES_PASSED, entry.nQuery_);
     ORVO_OGL_THROW_ON_ERROR("The query of an upload could not be begun");
@@ -119,7 +104,7 @@ void PBOQueue::giveBack(OGL::Buffer* pBuffer) {
     ORVO_CHECK(isOfCurrentContext(*back) && (!back->bBegun_ || isQuery(back->nQuery_)),
                "Context has changed since buffer was taken from Pool");
 
-    bool const bActive = back->bBegun_ && back->nQuery_ == currentQuery(GL_SAMPLES_PASSED);
+    bool const bActive = back->bBegun_ && back->nQuery_ == currentSampleQuery();
     back->bOutstanding_ = false;
     // Buffers that are still in use are the ones taken last, so that they can be given back in turn.
     auto const isInUse = [](Entry const& entry) { return entry.bOutstanding_; };
@@ -132,7 +117,7 @@ void PBOQueue::giveBack(OGL::Buffer* pBuffer) {
 }
 
 void PBOQueue::enforceBudget() {
-    unsigned const nCurrent = currentQuery(GL_SAMPLES_PASSED);
+    unsigned const nCurrent = currentSampleQuery();
     for (auto entry = oEntries_.begin(); entry != oEntries_.end() && nPBOBytes_ > nMaximumPBOBytes;) {
         auto const oldest = entry++;
         if (oldest->bOutstanding_)
@@ -159,7 +144,7 @@ void PBOQueue::deleteQueries() noexcept {
     for (Entry& entry : oEntries_) {
         if (!entry.bBegun_ || !isOfCurrentContext(entry) || !isQuery(entry.nQuery_))
             continue;
-        if (entry.nQuery_ == currentQuery(GL_SAMPLES_PASSED))
+        if (entry.nQuery_ == currentSampleQuery())
             gl().glEndQuery(GL_SAMPLES_PASSED);
         gl().glDeleteQueries(1, &entry.nQuery_);
         entry.bBegun_ = false;

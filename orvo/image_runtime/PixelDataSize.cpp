@@ -9,6 +9,12 @@ namespace ORVO {
 
 namespace {
 
+/// The name of the type's token; its number if it is none of the types.
+char const* nameOf(OGL::Texture::Type type) {
+    bool const bType = type >= OGL::Texture::TYPE_UNSIGNED_BYTE && type <= OGL::Texture::TYPE_HALF_FLOAT;
+    return OGL::TokenName(bType ? OGL::Texture::Type2GL(type) : static_cast<unsigned>(type));
+}
+
 std::size_t channelSize(OGL::Texture::Type type) {
     using OGL::Texture;
     switch (static_cast<int>(type)) {
@@ -24,7 +30,7 @@ std::size_t channelSize(OGL::Texture::Type type) {
     case Texture::TYPE_FLOAT:
         return 4;
     default:
-        ORVO_FAIL(std::string("pixelDataSize: Unknown type ") + OGL::TokenName(static_cast<unsigned>(type)));
+        ORVO_FAIL(std::string("pixelDataSize: Unknown type ") + nameOf(type));
     }
 }
 

@@ -66,18 +66,21 @@ void TexturePool::inHiddenContext(Code const& code) {
 }
 
 TexturePool::~TexturePool() {
-    try {
-        clearAll();
-        inHiddenContext([this] { glDeleteFramebuffers(1, &nFramebufferID_); });
-    } catch (...) {
-        // The hidden context cannot be made current any more, or the listener threw.
-    }
-    // What is left by that; names without a context go with their share group.
+    auto const attempt = [](auto const& code) {
+        try {
+            code();
+        } catch (...) {
+            // The hidden context cannot be made current any more, or the listener threw.
+        }
+    };
+    attempt([this] { clearAll(); });
+    // What is left by a failure; names without a context go with their share group.
     deleteAll(oFreeList1D_);
     deleteAll(oFreeList2D_);
     deleteAll(oFreeList3D_);
     deleteAll(oFreeListRECT_);
     deleteAllClientStorage();
+    attempt([this] { inHiddenContext([this] { glDeleteFramebuffers(1, &nFramebufferID_); }); });
 }
 
 void TexturePool::prepareOpenGLContext() {

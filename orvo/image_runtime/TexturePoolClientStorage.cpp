@@ -22,8 +22,8 @@ using OGL::Texture;
 
 /// Sizes are made in steps of so many pixels, and a texture that is larger by more is not taken. Rows of such
 /// a width are multiples of 32 bytes, whatever a pixel takes.
-constexpr std::size_t nStep = 64;
-static_assert(nStep % 32 == 0);
+constexpr std::size_t nPixelStep = 64;
+static_assert(nPixelStep % 32 == 0);
 
 struct AlignedDeleter {
     void operator()(void* pMemory) const { ORVO_private::deleteAlignedMemory(MEMORY_TYPE_IMAGE, pMemory); }
@@ -51,10 +51,12 @@ Texture::InternalFormat internalFormatFor(Texture::Format format, Texture::Type 
     ORVO_FAIL_PARAMETER("No internal format fits the format and type");
 }
 
-std::size_t roundUp(std::size_t nPixels) noexcept { return (nPixels + nStep - 1) / nStep * nStep; }
+std::size_t roundUp(std::size_t nPixels) noexcept {
+    return (nPixels + nPixelStep - 1) / nPixelStep * nPixelStep;
+}
 
 bool isLargeEnough(std::size_t nHave, std::size_t nWanted) noexcept {
-    return nHave >= nWanted && nHave - nWanted <= nStep;
+    return nHave >= nWanted && nHave - nWanted <= nPixelStep;
 }
 
 } // namespace

@@ -29,8 +29,10 @@ Buffer::Buffer(long long size, Type type, Usage usage, void const* pData)
     joinShareGroup();
     GLuint nName = 0;
     epoxy_glGenBuffers(1, &nName);
-    if (nName == 0)
+    if (nName == 0) {
+        Internal::clearErrors();
         ORVO_OGL_FAIL("The buffer could not be created", GL_OUT_OF_MEMORY);
+    }
     try {
         Internal::ScopedBufferBinding const binding(target(), nName);
         epoxy_glBufferData(target(), static_cast<GLsizeiptr>(size), pData, nUsage);

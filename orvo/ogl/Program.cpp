@@ -67,8 +67,10 @@ struct Program::Details {
 Program::Program() : pDetails_(std::make_unique<Details>()) {
     joinShareGroup();
     unsigned const nName = glCreateProgram();
-    if (nName == 0)
+    if (nName == 0) {
+        Internal::clearErrors();
         ORVO_OGL_FAIL("The program could not be created", GL_OUT_OF_MEMORY);
+    }
     setObjectID(nName);
 }
 
@@ -95,8 +97,10 @@ void Program::loadShader(unsigned nStage, unsigned count, char const* const* ppS
     pDetails_->aShaders_.reserve(pDetails_->aShaders_.size() + 1);
     Details::Shader shader{nStage, 0, Internal::ShaderSource(count, ppSources, pLengths)};
     shader.nName_ = glCreateShader(nStage);
-    if (shader.nName_ == 0)
+    if (shader.nName_ == 0) {
+        Internal::clearErrors();
         ORVO_OGL_FAIL("The shader could not be created", GL_OUT_OF_MEMORY);
+    }
     try {
         glShaderSource(shader.nName_, static_cast<GLsizei>(count), ppSources, pLengths);
         glCompileShader(shader.nName_);

@@ -38,8 +38,10 @@ Texture::Texture(unsigned nTarget, InternalFormat format, Extent const& extent, 
     joinShareGroup();
     GLuint nName = 0;
     glGenTextures(1, &nName);
-    if (nName == 0)
+    if (nName == 0) {
+        Internal::clearErrors();
         ORVO_OGL_FAIL("The texture could not be created", GL_OUT_OF_MEMORY);
+    }
     setObjectID(nName);
 }
 

@@ -95,15 +95,6 @@ TEST(ImageRuntimeLibrary, RefusesANullContextBesideOthers) {
     }
 }
 
-TEST(ImageRuntimeLibrary, RefusesOpenGLContexts) {
-    LowerLayers const layers;
-    HostContext const context;
-    char const* const sText = "OpenGL contexts are not supported by this version.";
-    ORVO_EXPECT_RESOURCE(Library::initialize(&context, oConfiguration), sText);
-    ORVO_EXPECT_RESOURCE(Library::initialize(Contexts(2, &context), oConfiguration), sText);
-    EXPECT_FALSE(Library::isInitialized());
-}
-
 TEST(ImageRuntimeLibrary, StopsWithoutHavingBeenStarted) {
     LowerLayers const layers;
     EXPECT_NO_THROW(Library::terminate());

@@ -115,16 +115,19 @@ void sweepErrors() {
     }
 }
 
-/// What the preparation of a frame changes in the current context, put back at the end of a scope.
+/// What the preparation of a frame changes in its context, which is current, put back at the end of a scope.
 class FrameState {
 public:
-    FrameState() : nUnit_(OGL::TextureState::activeTextureUnit()) {
+    explicit FrameState(OGL::Context const& context)
+        : context_(context), nUnit_(OGL::TextureState::activeTextureUnit()) {
         OGL::TextureState::setActiveTextureUnit(0);
         bEnabled2D_ = glIsEnabled(GL_TEXTURE_2D) == GL_TRUE;
         OGL::TextureState::setActiveTextureUnit(nUnit_);
     }
     ~FrameState() {
         try {
+            // A failed frame may have left another one current.
+            context_.makeCurrent();
             OGL::TextureUnit const& unit = OGL::TextureUnit::Unit(0);
             if (bEnabled2D_) {
                 unit.enable2D();
@@ -139,6 +142,7 @@ public:
     FrameState& operator=(FrameState const&) = delete;
 
 private:
+    OGL::Context const& context_;
     unsigned nUnit_;
     bool bEnabled2D_;
 };
@@ -195,7 +199,7 @@ void ImageFlowController::process() {
         return;
     }
     pContextGPU_->makeCurrent();
-    FrameState const state;
+    FrameState const state(*pContextGPU_);
     prepareOGLForProcess();
     sweepErrors();
     try {
@@ -223,7 +227,7 @@ void ImageFlowController::processFrameFunction() {
             pullFrame();
         } else {
             pContextGPU_->makeCurrent();
-            FrameState const state;
+            FrameState const state(*pContextGPU_);
             prepareOGLForProcess();
             if (!pullFrame()) {
                 // The exception tells more than the error, which wait() would report in its place.

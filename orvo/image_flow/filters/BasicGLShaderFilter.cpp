@@ -130,10 +130,7 @@ void BasicGLShaderFilter::allocateOutputImageGPU() {
 }
 
 void BasicGLShaderFilter::preProcess() {
-    if (pOutputImage_ != nullptr || !vspUniformArrays_.empty()) {
-        // A pass of a subclass that ended before its drawing.
-        abandonPass();
-    }
+    dropUnfinishedPass();
     try {
         Node::preProcess();
         allocateOutputImageGPU();
@@ -296,11 +293,8 @@ void BasicGLShaderFilter::abandonPass() noexcept {
     SimpleFilterGPU::abandonPass();
 }
 
-void BasicGLShaderFilter::flush() {
-    if (pOutputImage_ != nullptr || !vspUniformArrays_.empty()) {
-        abandonPass();
-    }
-    SimpleFilterGPU::flush();
+bool BasicGLShaderFilter::hasUnfinishedPass() const noexcept {
+    return SimpleFilterGPU::hasUnfinishedPass() || !vspUniformArrays_.empty();
 }
 
 } // namespace ORVO

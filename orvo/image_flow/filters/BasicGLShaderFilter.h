@@ -56,8 +56,6 @@ public:
     /// this class's preProcess() and its internalProcess(), which drops the array.
     void addUniformArray(char const* name, float* data, unsigned count);
 
-    void flush() override;
-
 protected:
     /// Fetches the inputs, makes the output image, binds each input's image to a unit and sets its uniforms.
     /// Throws InternalException as allocateOutputImageGPU(), and "Enforce pImage != NULL" for an input
@@ -76,6 +74,7 @@ protected:
     /// Adds the source to the program and links it. Throws OGL::ExceptionOGL, and what
     /// ShaderManagerOGL::Instance() throws.
     void compilePrograms();
+    bool hasUnfinishedPass() const noexcept override;
     void abandonPass() noexcept override;
 
     static constexpr int firstTexUnit = 1;

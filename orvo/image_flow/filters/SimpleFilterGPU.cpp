@@ -66,9 +66,7 @@ SimpleFilterGPU::SimpleFilterGPU(char const* name, bool /*bAddsOwnInputs*/)
 SimpleFilterGPU::~SimpleFilterGPU() = default;
 
 void SimpleFilterGPU::flush() {
-    if (pOutputImage_ != nullptr) {
-        abandonPass();
-    }
+    dropUnfinishedPass();
     ImageFilter::flush();
 }
 
@@ -139,10 +137,7 @@ ImageGPU::tePixelFormat SimpleFilterGPU::outputFormat() {
 }
 
 void SimpleFilterGPU::preRender() {
-    if (pOutputImage_ != nullptr) {
-        // A pass of a subclass that ended between the two.
-        abandonPass();
-    }
+    dropUnfinishedPass();
     bPreparedForRender_ = false;
     try {
         if (!takeBoundImage()) {
@@ -270,6 +265,17 @@ void SimpleFilterGPU::unbindInputs() {
     if (oInput_.hasData()) {
         oInput_->bindDefault();
     }
+}
+
+bool SimpleFilterGPU::hasUnfinishedPass() const noexcept { return pOutputImage_ != nullptr; }
+
+void SimpleFilterGPU::dropUnfinishedPass() noexcept {
+    if (!hasUnfinishedPass()) {
+        return;
+    }
+    // It may have died with its controller; if not, the next pass takes it over.
+    pFramebuffer_ = nullptr;
+    abandonPass();
 }
 
 void SimpleFilterGPU::abandonPass() noexcept {

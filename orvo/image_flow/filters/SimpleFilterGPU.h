@@ -89,6 +89,10 @@ protected:
     void detachOutput();
     /// Gives a new image to the output; a bound output has it already.
     void handOnOutput();
+    /// Whether a pass began and neither ended nor was abandoned: a subclass threw in its midst.
+    virtual bool hasUnfinishedPass() const noexcept;
+    /// Abandons such a pass.
+    void dropUnfinishedPass() noexcept;
     /// What a pass that throws does instead of its end. Nothing leaves it.
     virtual void abandonPass() noexcept;
 

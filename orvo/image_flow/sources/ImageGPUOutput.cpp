@@ -26,6 +26,7 @@ ImageGPU const* ImageGPUOutput::getImageGPU() const { return imageDataPtr_.get()
 void ImageGPUOutput::internalProcess() {
     bPreparedForRender_ = false;
     imageDataPtr_.setDataWithReleasableOwnership(oInputImage_.releaseData());
+    oInputImage_.setDataPtr(nullptr);
 }
 
 } // namespace ORVO

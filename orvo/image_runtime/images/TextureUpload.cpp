@@ -3,6 +3,7 @@
 #include "orvo/core/Check.h"
 #include "orvo/image_runtime/GLStateUtils.h"
 #include "orvo/image_runtime/PixelDataSize.h"
+#include "orvo/image_runtime/SampleQueries.h"
 #include "orvo/image_runtime/TexturePool.h"
 #include "orvo/ogl/Buffer.h"
 #include "orvo/ogl/ExtensionManager.h"
@@ -45,9 +46,7 @@ bool hasPixelBuffers() {
 /// Begins and ends each query, so that all have a result. Left out while a query is active, since only one
 /// may be.
 void giveResults(ContextName const& queries) {
-    GLint nCurrent = 0;
-    glGetQueryiv(GL_SAMPLES_PASSED, GL_CURRENT_QUERY, &nCurrent);
-    if (nCurrent != 0)
+    if (isAnySampleQueryActive())
         return;
     OGL::FunctionTable const& table = *OGL::ExtensionManager::Instance()->table();
     for (unsigned const nQuery : queries.aNames_) {
@@ -146,8 +145,9 @@ public:
     }
 
     void unmap() {
-        bMapped_ = false;
+        // What fails here is tried once more at the end: a buffer that stays mapped could not be used again.
         pBuffer_->unmap();
+        bMapped_ = false;
     }
 
     void giveBack() {
@@ -260,7 +260,6 @@ void TextureUpload::asyncUpload(OGL::Texture2* pTexture, int level, PositionExte
         rect = {{rect.position().x(), rect.position().y() + nRows},
                 {rect.extent().width(), rect.extent().height() - nRows}};
     }
-    ORVO_OGL_THROW_ON_ERROR("The pixels could not be uploaded");
 }
 
 void TextureUpload::uploadBand(OGL::Texture2& texture, int level, PositionExtentInPixelSpace const& band,
@@ -277,6 +276,7 @@ void TextureUpload::uploadBand(OGL::Texture2& texture, int level, PositionExtent
     copyRows(buffer.map(), static_cast<unsigned char const*>(pPixels), nSourceStride, nRowBytes, nRows);
     buffer.unmap();
     bufferUpload(&texture, buffer.get(), level, band, format, type, 0);
+    ORVO_OGL_THROW_ON_ERROR("The pixels could not be uploaded");
     buffer.giveBack();
 }
 

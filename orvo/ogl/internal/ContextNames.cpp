@@ -102,6 +102,7 @@ ContextName ContextNames::create(Kind eKind, std::size_t nNames) {
     name.pSync_ = Sentinel::create();
     generate(name);
     if (name.name() == 0) {
+        clearErrors();
         Sentinel::destroy(name.pSync_);
         ORVO_OGL_FAIL(failureOf(eKind), GL_OUT_OF_MEMORY);
     }

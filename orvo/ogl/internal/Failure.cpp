@@ -47,11 +47,15 @@ void requireContext(char const* file, int line) {
         throwOGL(file, line, "No OpenGL context is current", 0);
 }
 
+void clearErrors() noexcept {
+    for (int i = 0; i < nMaximumErrors && glGetError() != GL_NO_ERROR; ++i) {
+    }
+}
+
 void throwOnError(char const* file, int line, char const* message) {
     GLenum const first = glGetError();
     if (first != GL_NO_ERROR)
-        for (int i = 0; i < nMaximumErrors && glGetError() != GL_NO_ERROR; ++i) {
-        }
+        clearErrors();
     if (char const* const pMissing = pMissingEntryPoint.exchange(nullptr, std::memory_order_acq_rel))
         throwOGL(file, line, std::string(message) + " (no entry point " + pMissing + ")",
                  GL_INVALID_OPERATION);

@@ -27,6 +27,9 @@ void requireContext(char const* file, int line);
 /// missing.
 void throwOnError(char const* file, int line, char const* message);
 
+/// Reads the error state until it is clear: for failures that are seen by a result.
+void clearErrors() noexcept;
+
 /// Makes the loader hand out an entry point that does nothing where one is absent, instead of ending the
 /// process; the next throwOnError reports it.
 void installResolverFailureHandler() noexcept;

@@ -9,8 +9,10 @@ void* create() {
     if (epoxy_gl_version() < 32 && !epoxy_has_gl_extension("GL_ARB_sync"))
         return nullptr;
     GLsync sync = glFenceSync(GL_SYNC_GPU_COMMANDS_COMPLETE, 0);
-    if (sync == nullptr)
+    if (sync == nullptr) {
+        clearErrors();
         ORVO_OGL_FAIL("The context's sync object could not be created", GL_OUT_OF_MEMORY);
+    }
     return sync;
 }
 

@@ -133,7 +133,12 @@ std::string describeFailure(char const* message, std::string const& sLog, Shader
         return sText;
     std::string const sLine = pSource->line(place.nString_, place.nLine_);
     if (!sLine.empty())
-        sText += "\n" + std::to_string(place.nString_) + ":" + std::to_string(place.nLine_) + ": " + sLine;
+        sText.append("\n")
+            .append(std::to_string(place.nString_))
+            .append(":")
+            .append(std::to_string(place.nLine_))
+            .append(": ")
+            .append(sLine);
     return sText;
 }
 

@@ -187,22 +187,27 @@ TEST_F(NodeTest, RunsItsThreePhasesInOrder) {
 /// An input that notes what its node does with it.
 class LoggedInput : public ConstInput<Payload> {
 public:
-    LoggedInput(std::string const& sName, TestNode& oNode)
-        : ConstInput<Payload>(sName, &oNode), aCalls_(oNode.aCalls_) {}
-    void fetchInput() override { aCalls_.push_back("fetch " + name()); }
-    void removeData() override { aCalls_.push_back("remove " + name()); }
-    void flushInput() override { aCalls_.push_back("flush " + name()); }
+    explicit LoggedInput(std::string const& sName) : ConstInput<Payload>(sName, nullptr) {}
+    void fetchInput() override { pCalls_->push_back("fetch " + name()); }
+    void removeData() override { pCalls_->push_back("remove " + name()); }
+    void flushInput() override { pCalls_->push_back("flush " + name()); }
+
+    void addTo(TestNode& oNode) {
+        pCalls_ = &oNode.aCalls_;
+        oNode.addInput(this);
+    }
 
 private:
-    std::vector<std::string>& aCalls_;
+    std::vector<std::string>* pCalls_ = nullptr;
 };
 
 TEST_F(NodeTest, FetchesAndDropsInInputOrder) {
+    // They live longer than the node, which disconnects them when it dies.
+    LoggedInput oFirst("first");
+    LoggedInput oSecond("second");
     TestNode oNode("n");
-    LoggedInput oFirst("first", oNode);
-    LoggedInput oSecond("second", oNode);
-    oNode.addInput(&oFirst);
-    oNode.addInput(&oSecond);
+    oFirst.addTo(oNode);
+    oSecond.addTo(oNode);
     oNode.process();
     oNode.flushInputs();
     EXPECT_EQ((std::vector<std::string>{"preProcess", "fetch first", "fetch second", "internalProcess",

@@ -53,7 +53,7 @@ protected:
 
 TEST_F(GLGraphsTest, HostMemoryAtBothEndsGoesUpAndComesDown) {
     ByteImage input(0, 0, kWidth, kHeight);
-    input.bytes() = pattern(kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
     ByteImage output(0, 0, kWidth, kHeight);
     SourcePtr const spSource = makeGLSource(input.handle());
     FilterPtr const spAdd = makeAddShader();
@@ -66,7 +66,7 @@ TEST_F(GLGraphsTest, HostMemoryAtBothEndsGoesUpAndComesDown) {
               (Wires{"AddShader -> GPU2CPU", "CPU2GPU -> AddShader", "ImageCPUInput -> CPU2GPU"}));
     EXPECT_EQ(pExecutable->controller()->imageSink()->name(), "GPU2CPU");
     for (int frame = 0; frame < 3; ++frame) {
-        std::fill(output.bytes().begin(), output.bytes().end(), std::uint8_t(1));
+        output.fill(std::uint8_t(1));
         runFrame(*pExecutable);
         EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 10)) << frame;
     }
@@ -94,7 +94,7 @@ TEST_F(GLGraphsTest, TexturesAtBothEndsNeedNoConverter) {
 
 TEST_F(GLGraphsTest, ImagesOfBothKindsMeet) {
     ByteImage bytes(0, 0, kWidth, kHeight);
-    bytes.bytes() = pattern(kWidth, kHeight);
+    bytes.write(pattern(kWidth, kHeight));
     TextureImage texture(0, 0, kWidth, kHeight);
     FilterPtr const spAdd = makeAddShader();
     setParameter(*spAdd, "value", kTen);
@@ -140,7 +140,7 @@ TEST_F(GLGraphsTest, AGraphOnTheCPUTakesAndGivesTextures) {
 
 TEST_F(GLGraphsTest, TheConsumersOnOpenGLShareOneUpload) {
     ByteImage input(0, 0, kWidth, kHeight);
-    input.bytes() = pattern(kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
     ByteImage output(0, 0, kWidth, kHeight);
     SourcePtr const spSource = makeGLSource(input.handle());
     FilterPtr const spA = makeAddShader("a");
@@ -179,12 +179,12 @@ TEST_F(GLGraphsTest, OneTextureFeedsTwoInputsOfAFilter) {
 
 TEST_F(GLGraphsTest, AGraphWithoutFiltersCopiesBetweenTheKinds) {
     ByteImage bytes(0, 0, kWidth, kHeight);
-    bytes.bytes() = pattern(kWidth, kHeight);
+    bytes.write(pattern(kWidth, kHeight));
     TextureImage texture(0, 0, kWidth, kHeight);
     ByteImage back(0, 0, kWidth, kHeight);
     for (OptimizationOptions const& options : {glOptions(), cpuOptions()}) {
         texture.write(std::vector<std::uint8_t>(4 * kWidth * kHeight, 1));
-        std::fill(back.bytes().begin(), back.bytes().end(), std::uint8_t(1));
+        back.fill(std::uint8_t(1));
         {
             SourcePtr const spSource = makeGLSource(bytes.handle());
             SinkPtr const spSink = makeGLSink(texture.handle());
@@ -254,7 +254,7 @@ TEST_F(GLGraphsTest, PixelsOutsideTheRegionOfInterestStay) {
                     aExpected.begin() + static_cast<std::ptrdiff_t>(4 * ((kWidth + 2) * (y + 1) + 1)));
     }
     {
-        bytes.bytes() = aOnes;
+        bytes.write(aOnes);
         SinkPtr const spSink = makeGLSink(bytes.handle());
         Connect(spAdd, spSink);
         runFrame(*build(spSink));

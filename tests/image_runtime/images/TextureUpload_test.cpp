@@ -14,7 +14,6 @@
 #include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/Texture2D.h"
 #include "orvo/ogl/TextureRECT.h"
-#include "orvo/ogl/TokenName.h"
 #include "tests/image_runtime/support/GLRuntimeTest.h"
 #include "tests/support/gl/ExpectOGL.h"
 
@@ -284,14 +283,21 @@ TEST_F(TextureUploadTest, KnowsTheSizesOfTypes) {
     Bytes const aPixels(64, 0);
     TextureUpload upload;
     PositionExtentInPixelSpace const all({0, 0}, {2, 1});
-    for (int const nType : {2, 5, 6, 8, 9, 10, 11, 12, 13, 14, 15, 18, 19, 21, -1})
+    struct Row {
+        int nType;
+        char const* pName;
+    };
+    for (Row const& row :
+         {Row{2, "GL_BITMAP"}, Row{5, "GL_INT"}, Row{6, "GL_UNSIGNED_INT"}, Row{8, "GL_UNSIGNED_BYTE_3_3_2"},
+          Row{10, "GL_UNSIGNED_SHORT_5_6_5"}, Row{15, "GL_UNSIGNED_SHORT_1_5_5_5_REV"},
+          Row{18, "GL_UNSIGNED_INT_10_10_10_2"}, Row{19, "GL_UNSIGNED_INT_2_10_10_10_REV"},
+          Row{21, "0x00000015"}, Row{-1, "0xFFFFFFFF"}})
         for (bool const bBuffers : {true, false}) {
             if (!bBuffers)
                 withoutBuffers();
             ORVO_EXPECT_INTERNAL(upload.asyncUpload(pTexture.get(), 0, all, eGrey,
-                                                    static_cast<Texture::Type>(nType), aPixels.data(), 0),
-                                 std::string("pixelDataSize: Unknown type ") +
-                                     OGL::TokenName(static_cast<unsigned>(nType)));
+                                                    static_cast<Texture::Type>(row.nType), aPixels.data(), 0),
+                                 std::string("pixelDataSize: Unknown type ") + row.pName);
             OGL::ExtensionManager::Instance()->clearOverrides();
         }
     for (auto const eType : {Texture::TYPE_UNSIGNED_BYTE, Texture::TYPE_BYTE, Texture::TYPE_UNSIGNED_SHORT,

@@ -24,10 +24,20 @@ protected:
     }
 
     void TearDown() override {
-        host().makeCurrent();
+        if (pContext_ != nullptr) {
+            host().makeCurrent();
+            oLibrary_.reset();
+            pContext_.reset();
+        }
+        GLTest::TearDown();
+    }
+
+    /// For tests that end the host's context: ends the library, and nothing of the context is looked at any
+    /// more.
+    void loseHost() {
         oLibrary_.reset();
         pContext_.reset();
-        GLTest::TearDown();
+        GLTest::loseHost();
     }
 
     OGL::Context const* context() const { return pContext_.get(); }

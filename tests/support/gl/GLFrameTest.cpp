@@ -118,6 +118,14 @@ ByteImage::ByteImage(int x, int y, int width, int height, std::uint8_t fill)
                                                PixelExtentInWorldSpace()),
                rectangle(x, y, width, height), aBytes_.data(), 0) {}
 
+// The handle points at the bytes: they are never moved.
+void ByteImage::write(std::vector<std::uint8_t> const& aBytes) {
+    ASSERT_EQ(aBytes.size(), aBytes_.size());
+    std::copy(aBytes.begin(), aBytes.end(), aBytes_.begin());
+}
+
+void ByteImage::fill(std::uint8_t value) { std::fill(aBytes_.begin(), aBytes_.end(), value); }
+
 TextureImage::TextureImage(int x, int y, int width, int height, OGL::Texture::InternalFormat format,
                            ImageDescriptor::eChannelType type)
     : pTexture_(std::make_unique<OGL::Texture2D>(format, static_cast<std::size_t>(width),

@@ -60,7 +60,11 @@ class ByteImage {
 public:
     ByteImage(int x, int y, int width, int height, std::uint8_t fill = 0);
 
-    std::vector<std::uint8_t>& bytes() { return aBytes_; }
+    std::vector<std::uint8_t> const& bytes() const { return aBytes_; }
+    /// As many bytes as the image has.
+    void write(std::vector<std::uint8_t> const& aBytes);
+    void fill(std::uint8_t value);
+
     FilterGraph::ImageCPU* handle() { return &oHandle_; }
 
 private:
