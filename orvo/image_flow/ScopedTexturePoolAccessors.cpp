@@ -57,7 +57,7 @@ ScopedTexture1D::ScopedTexture1D(unsigned width, OGL::Texture::InternalFormat in
 ScopedTexture1D::~ScopedTexture1D() { giveBack(internalTexture_, &TexturePool::returnTexture1DToPool); }
 
 OGL::Texture1D* ScopedTexture1D::get() const {
-    ORVO_CHECK(internalTexture_ != NULL);
+    ORVO_CHECK(internalTexture_ != nullptr, "internalTexture_ != NULL");
     return internalTexture_;
 }
 
@@ -67,27 +67,27 @@ ScopedTexture2D::ScopedTexture2D(unsigned width, unsigned height, OGL::Texture::
 ScopedTexture2D::~ScopedTexture2D() { giveBack(internalTexture_, &TexturePool::returnTexture2DToPool); }
 
 void ScopedTexture2D::bind(unsigned unit) const {
-    ORVO_CHECK(internalTexture_ != NULL);
+    ORVO_CHECK(internalTexture_ != nullptr, "internalTexture_ != NULL");
     OGL::TextureUnit::Unit(unit).bind(internalTexture_);
 }
 
 void ScopedTexture2D::unbind(unsigned unit) const {
-    ORVO_CHECK(internalTexture_ != NULL);
+    ORVO_CHECK(internalTexture_ != nullptr, "internalTexture_ != NULL");
     OGL::TextureUnit::Unit(unit).bind2DDefault();
 }
 
 void ScopedTexture2D::setFilter(OGL::Texture::Filter min, OGL::Texture::Filter mag) const {
-    ORVO_CHECK(internalTexture_ != NULL);
+    ORVO_CHECK(internalTexture_ != nullptr, "internalTexture_ != NULL");
     internalTexture_->setFilter(min, mag);
 }
 
 void ScopedTexture2D::setWrap(OGL::Texture::WrapMode s, OGL::Texture::WrapMode t) const {
-    ORVO_CHECK(internalTexture_ != NULL);
+    ORVO_CHECK(internalTexture_ != nullptr, "internalTexture_ != NULL");
     internalTexture_->setWrap(s, t);
 }
 
 OGL::Texture2D* ScopedTexture2D::get() const {
-    ORVO_CHECK(internalTexture_ != NULL);
+    ORVO_CHECK(internalTexture_ != nullptr, "internalTexture_ != NULL");
     return internalTexture_;
 }
 
@@ -95,7 +95,7 @@ ScopedTexture3D::ScopedTexture3D(OGL::Texture3D* pTexture) noexcept : internalTe
 ScopedTexture3D::~ScopedTexture3D() = default;
 
 OGL::Texture3D* ScopedTexture3D::get() const {
-    ORVO_CHECK(internalTexture_ != NULL);
+    ORVO_CHECK(internalTexture_ != nullptr, "internalTexture_ != NULL");
     return internalTexture_;
 }
 

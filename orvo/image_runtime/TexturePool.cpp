@@ -3,7 +3,6 @@
 #include "orvo/core/Check.h"
 #include "orvo/core/utility/Integers.h"
 #include "orvo/core/utility/ScopedPtr.h"
-#include "orvo/image_runtime/GLStateUtils.h"
 #include "orvo/image_runtime/ImageRuntimeLibrary.h"
 #include "orvo/image_runtime/LateReturns.h"
 #include "orvo/ogl/ContextOffscreen.h"
@@ -35,6 +34,18 @@ Key<TextureT> keyOf(TextureT const& texture) noexcept {
 /// What a texture counts with: also beyond 2 GiB, where its own answer ends.
 std::size_t countedBytes(Texture const& texture) {
     return Texture::SizeInBytes(texture.format(), texture.width(0), texture.height(0), texture.depth(0));
+}
+
+/// Sets the wrap mode of a texture that is handed out again, and binds again what was bound. Nothing in
+/// between can fail, and the context is asked for once: that costs more than all the rest.
+void resetWrap(OGL::Texture2D& texture) {
+    ORVO_OGL_REQUIRE_CONTEXT();
+    GLint nBound = 0;
+    glGetIntegerv(GL_TEXTURE_BINDING_2D, &nBound);
+    glBindTexture(GL_TEXTURE_2D, texture.objectID());
+    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_CLAMP_TO_BORDER);
+    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_CLAMP_TO_BORDER);
+    glBindTexture(GL_TEXTURE_2D, static_cast<GLuint>(nBound));
 }
 
 } // namespace
@@ -132,10 +143,6 @@ OGL::Texture1D* TexturePool::getTexture1DFromPool(unsigned width, Texture::Inter
 OGL::Texture2D* TexturePool::getTexture2DFromPool(unsigned width, unsigned height,
                                                   Texture::InternalFormat format, bool exact) {
     Key<OGL::Texture2D> const key{sizeToUse(width, exact), sizeToUse(height, exact), 1, format};
-    auto const resetWrap = [](OGL::Texture2D& texture) {
-        ScopedTextureBindRestore<OGL::Texture2D> const bound(&texture);
-        texture.setWrap(Texture::WRAP_MODE_CLAMP_TO_BORDER, Texture::WRAP_MODE_CLAMP_TO_BORDER);
-    };
     return get(oFreeList2D_, key, resetWrap, [&] {
         std::size_t const sizeInBytes = Texture::SizeInBytes(format, key.nWidth_, key.nHeight_, 1);
         pListener_->impendingMemoryAllcation(sizeInBytes);
@@ -212,12 +219,12 @@ OGL::Buffer* TexturePool::getPBOFromQueue(unsigned sizeInBytes, unsigned queryID
 void TexturePool::returnPBOToQueue(OGL::Buffer* pBuffer) { oPBOQueue_.giveBack(pBuffer); }
 
 bool TexturePool::isOverBudget() const noexcept {
-    return nFreeListBytes_ >= nMaximumPoolSize_ && nFreeListBytes_ > evictionTarget();
+    return nFreeListBytes_ >= nMaximumPoolSize_ && nFreeListBytes_ > evictionTarget(nMaximumPoolSize_);
 }
 
-std::size_t TexturePool::evictionTarget() const noexcept {
+std::size_t TexturePool::evictionTarget(std::size_t nMaximum) noexcept {
     // Three quarters, without passing through a product that budgets near the largest number would overflow.
-    return nMaximumPoolSize_ / 4 * 3 + nMaximumPoolSize_ % 4 * 3 / 4;
+    return nMaximum / 4 * 3 + nMaximum % 4 * 3 / 4;
 }
 
 void TexturePool::enforceMaximumPoolSize() {
@@ -234,7 +241,7 @@ void TexturePool::evict() {
         deleteFront(oFreeListRECT_);
         deleteFrontOfClientStorage();
         pListener_->memoryFreed(nFreed2D);
-        if (nFreeListBytes_ <= evictionTarget())
+        if (nFreeListBytes_ <= evictionTarget(nMaximumPoolSize_))
             return;
     }
     ORVO_FAIL("oFreeList1D_.size() != 0 || oFreeList2D_.size() != 0 || oFreeList3D_.size() != 0 || "

@@ -189,7 +189,8 @@ private:
 
     void enforceMaximumPoolSize();
     bool isOverBudget() const noexcept;
-    std::size_t evictionTarget() const noexcept;
+    /// The bytes that eviction leaves, for a budget.
+    static std::size_t evictionTarget(std::size_t nMaximum) noexcept;
     /// The loop of eviction; the hidden context is current.
     void evict();
     /// Deletes the oldest texture of a list, if there is one; its bytes.

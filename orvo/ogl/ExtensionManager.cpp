@@ -16,6 +16,7 @@ struct ExtensionManager::Overrides {
     std::optional<std::pair<unsigned, unsigned>> oVersion_;
     std::optional<teVendor> oVendor_;
     std::optional<unsigned> oUnits_;
+    std::optional<bool> oSoftware_;
 };
 
 ExtensionManager::ExtensionManager() : pOverrides_(std::make_unique<Overrides>()) {}
@@ -68,6 +69,10 @@ ExtensionManager::teVendor ExtensionManager::vendor() const {
     return pOverrides_->oVendor_ ? *pOverrides_->oVendor_ : DriverFacts::current().eVendor_;
 }
 
+bool ExtensionManager::isSoftwareDriver() const {
+    return pOverrides_->oSoftware_ ? *pOverrides_->oSoftware_ : DriverFacts::current().bSoftware_;
+}
+
 void ExtensionManager::overrideSupport(teExtension extension, bool bSupported) {
     pOverrides_->aSupport_[extension] = bSupported;
 }
@@ -77,6 +82,7 @@ void ExtensionManager::overrideVersion(unsigned major, unsigned minor) {
 }
 
 void ExtensionManager::overrideVendor(teVendor vendor) { pOverrides_->oVendor_ = vendor; }
+void ExtensionManager::overrideSoftwareDriver(bool bSoftware) { pOverrides_->oSoftware_ = bSoftware; }
 void ExtensionManager::overrideNumberOfTextureUnits(unsigned n) { pOverrides_->oUnits_ = n; }
 
 void ExtensionManager::clearOverrides() noexcept {
@@ -84,6 +90,7 @@ void ExtensionManager::clearOverrides() noexcept {
     pOverrides_->oVersion_.reset();
     pOverrides_->oVendor_.reset();
     pOverrides_->oUnits_.reset();
+    pOverrides_->oSoftware_.reset();
 }
 
 } // namespace ORVO::OGL

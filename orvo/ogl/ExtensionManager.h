@@ -52,6 +52,9 @@ public:
     unsigned majorVersion() const;
     unsigned minorVersion() const;
     teVendor vendor() const;
+    /// Whether the processor does the driver's work. Such a driver has copied what it is given to copy when
+    /// the call returns.
+    bool isSoftwareDriver() const;
 
     // Overriding answers, for tests. An overridden answer needs no context.
 
@@ -60,6 +63,7 @@ public:
     /// From now on the version is the stated one; extensions that the driver names stay supported.
     void overrideVersion(unsigned major, unsigned minor);
     void overrideVendor(teVendor vendor);
+    void overrideSoftwareDriver(bool bSoftware);
     void overrideNumberOfTextureUnits(unsigned n);
     /// Takes all overridden answers back.
     void clearOverrides() noexcept;

@@ -26,7 +26,10 @@ NativeContext NativeContext::current() noexcept {
     return egl.pContext_ != nullptr ? egl : Internal::GLXPlatform::current();
 }
 
-void* NativeContext::currentHandle() noexcept { return current().pContext_; }
+void* NativeContext::currentHandle() noexcept {
+    void* const pContext = Internal::EGLPlatform::currentHandle();
+    return pContext != nullptr ? pContext : Internal::GLXPlatform::currentHandle();
+}
 
 void NativeContext::makeCurrent() const {
     NativeContext const before = current();

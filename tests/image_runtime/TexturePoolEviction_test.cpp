@@ -4,6 +4,9 @@
 
 #include <gtest/gtest.h>
 
+#include <cstdint>
+#include <vector>
+
 namespace ORVO {
 namespace {
 
@@ -155,27 +158,33 @@ TEST_F(TexturePoolEviction, ReportsACountThatHasGoneWrong) {
     TexturePoolProbe::setFreeListBytes(pool(), 0);
 }
 
-TEST_F(TexturePoolEviction, HasATargetOf64Bits) {
-    // A budget of 2 GiB: the target is 1.5 GiB, where 32 bits would leave 0.5 GiB of it. The driver takes no
-    // memory for pixels that are never written.
-    oConfiguration_.setMaximumFreelistSize(std::size_t{1} << 31);
-    remake();
-    std::size_t const nHalfGiB = std::size_t{1} << 29;
-    OGL::Texture2D* aTextures[2];
-    for (OGL::Texture2D*& p : aTextures)
-        p = pool().getTexture2DFromPool(8192, 4096, Texture::INTERNAL_FORMAT_RGBA32F, true);
-    TexturePoolProbe::setFreeListBytes(pool(), 2 * nHalfGiB);
-    pool().returnTexture2DToPool(aTextures[0]);
-    EXPECT_EQ(3 * nHalfGiB, freeBytes());
-    pool().returnTexture2DToPool(aTextures[1]);
-    EXPECT_EQ(3 * nHalfGiB, freeBytes());
-    EXPECT_EQ(aTextures[1], pool().getTexture2DFromPool(8192, 4096, Texture::INTERNAL_FORMAT_RGBA32F, true));
-    TexturePoolProbe::setFreeListBytes(pool(), 0);
-    pool().returnTexture2DToPool(aTextures[1]);
+TEST(TexturePoolTarget, IsThreeQuartersOfTheBudgetIn64Bits) {
+    struct Row {
+        std::size_t nBudget_;
+        std::size_t nTarget_;
+    };
+    Row const rows[] = {{0, 0},
+                        {1, 0},
+                        {2, 1},
+                        {3, 2},
+                        {4, 3},
+                        {100, 75},
+                        {0x8000000, 0x6000000},
+                        {0x60000000, 0x48000000},
+                        {0x80000000, 0x60000000},
+                        {0x180000000, 0x120000000},
+                        {SIZE_MAX, 0xbfffffffffffffff}};
+    for (Row const& row : rows)
+        EXPECT_EQ(row.nTarget_, TexturePoolProbe::evictionTarget(row.nBudget_)) << row.nBudget_;
+}
 
-    // No budget is too large to be counted with.
-    pool().setMaximumPoolSize(SIZE_MAX);
-    EXPECT_EQ(nHalfGiB, freeBytes());
+TEST_F(TexturePoolEviction, TakesAnyBudget) {
+    oConfiguration_.setMaximumFreelistSize(SIZE_MAX);
+    remake();
+    fill({10, 20});
+    EXPECT_EQ(30u, freeBytes());
+    pool().setMaximumPoolSize(std::size_t{1} << 32);
+    EXPECT_EQ(30u, freeBytes());
 }
 
 class TexturePoolClear : public TexturePoolEviction {

@@ -93,6 +93,10 @@ TEST_P(ExtensionManagerTest, GivesOverriddenAnswers) {
     EXPECT_EQ(2, manager().vendor());
     manager().overrideNumberOfTextureUnits(3);
     EXPECT_EQ(3U, manager().numberOfTextureUnits());
+    for (bool const bSoftware : {true, false}) {
+        manager().overrideSoftwareDriver(bSoftware);
+        EXPECT_EQ(bSoftware, manager().isSoftwareDriver());
+    }
     manager().clearOverrides();
     for (OGL::teExtension const extension : aExtensions)
         EXPECT_TRUE(manager().isSupported(extension)) << extension;
@@ -227,14 +231,16 @@ TEST_F(Vendor, IsToldByTheDriversTexts) {
     struct Row {
         GivenTexts oTexts;
         ExtensionManager::teVendor eVendor;
+        bool bSoftware = false;
     };
     constexpr Row aRows[] = {
         {{"NVIDIA Corporation", "GeForce/PCIe/SSE2"}, ExtensionManager::VENDOR_NVIDIA},
         {{"ATI Technologies Inc.", "Radeon"}, ExtensionManager::VENDOR_ATI},
         {{"AMD", "AMD Radeon (radeonsi)"}, ExtensionManager::VENDOR_ATI},
         {{"Intel", "Mesa Intel(R) Graphics"}, ExtensionManager::VENDOR_INTEL},
-        {{"Mesa/X.org", "llvmpipe (LLVM 15.0.6, 256 bits)"}, ExtensionManager::VENDOR_MESA},
-        {{"Mesa", "softpipe on Intel"}, ExtensionManager::VENDOR_MESA},
+        {{"Mesa/X.org", "llvmpipe (LLVM 15.0.6, 256 bits)"}, ExtensionManager::VENDOR_MESA, true},
+        {{"Mesa", "softpipe on Intel"}, ExtensionManager::VENDOR_MESA, true},
+        {{"Mesa Project", "Software Rasterizer"}, ExtensionManager::VENDOR_MESA, true},
         {{"X.Org", "some"}, ExtensionManager::VENDOR_MESA},
         {{"Somebody Corporation", "Something"}, ExtensionManager::VENDOR_UNKNOWN},
         {{"", ""}, ExtensionManager::VENDOR_UNKNOWN},
@@ -244,6 +250,7 @@ TEST_F(Vendor, IsToldByTheDriversTexts) {
         oGiven = row.oTexts;
         epoxy_glGetString = &getString;
         EXPECT_EQ(row.eVendor, ExtensionManager::Instance()->vendor()) << row.oTexts.pVendor;
+        EXPECT_EQ(row.bSoftware, ExtensionManager::Instance()->isSoftwareDriver()) << row.oTexts.pRenderer;
         // Each driver keeps its own answers.
         EXPECT_EQ(row.eVendor, ExtensionManager::Instance()->vendor()) << row.oTexts.pVendor;
         epoxy_glGetString = pDriverGetString;

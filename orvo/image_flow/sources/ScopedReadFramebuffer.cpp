@@ -21,6 +21,7 @@ void bind(unsigned nTarget, unsigned nName) {
 
 /// Whether drawing and reading have bindings of their own; with the first extension they had one in common.
 bool hasSeparateBindings() {
+    ORVO_OGL_REQUIRE_CONTEXT();
     return OGL::ExtensionManager::Instance()->isSupported(OGL::EXTENSION_ARB_FRAMEBUFFER_OBJECT);
 }
 

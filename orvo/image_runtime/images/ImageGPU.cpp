@@ -121,6 +121,7 @@ ImageGPU::ImageGPU(ImageGPU const& other) : ImageBase(other) {
     ORVO_FAIL("Not implemented: no copying of ImageGPU allowed");
 }
 
+// NOLINTNEXTLINE(bugprone-unhandled-self-assignment): nothing is ever assigned.
 ImageGPU& ImageGPU::operator=(ImageGPU const&) {
     ORVO_FAIL("Not implemented: no copying of ImageGPU allowed");
 }

@@ -16,6 +16,7 @@
 #include "orvo/ogl/internal/TextureRange.h"
 
 #include <algorithm>
+#include <array>
 #include <climits>
 #include <cstring>
 
@@ -27,6 +28,14 @@ namespace ORVO {
 
 using OGL::Internal::ContextName;
 
+struct TextureUpload::Source {
+    OGL::Texture::Format eFormat_;
+    OGL::Texture::Type eType_;
+    unsigned char const* pPixels_;
+    std::size_t nRowBytes_;
+    std::size_t nStride_;
+};
+
 struct TextureUpload::Names {
     ContextName oQueries_;
     ContextName oClientTextures_;
@@ -36,6 +45,8 @@ namespace {
 
 constexpr std::size_t nBandBytes = 0x400000;
 constexpr float fByteToFloat = 0.003921568859f;
+
+OGL::FunctionTable const& gl() noexcept { return *OGL::ExtensionManager::Instance()->table(); }
 
 bool hasPixelBuffers() {
     OGL::ExtensionManager const& manager = *OGL::ExtensionManager::Instance();
@@ -48,10 +59,9 @@ bool hasPixelBuffers() {
 void giveResults(ContextName const& queries) {
     if (isAnySampleQueryActive())
         return;
-    OGL::FunctionTable const& table = *OGL::ExtensionManager::Instance()->table();
     for (unsigned const nQuery : queries.aNames_) {
-        table.glBeginQuery(GL_SAMPLES_PASSED, nQuery);
-        table.glEndQuery(GL_SAMPLES_PASSED);
+        gl().glBeginQuery(GL_SAMPLES_PASSED, nQuery);
+        gl().glEndQuery(GL_SAMPLES_PASSED);
     }
     glFinish();
     ORVO_OGL_THROW_ON_ERROR("The queries could not be prepared");
@@ -60,13 +70,46 @@ void giveResults(ContextName const& queries) {
 /// A name that is a query, or one that is fit to become one: the pool deletes the queries of the buffers that
 /// it clears.
 unsigned usableQuery(unsigned& nQuery) {
-    OGL::FunctionTable const& table = *OGL::ExtensionManager::Instance()->table();
-    if (!table.glIsQuery(nQuery)) {
-        table.glDeleteQueries(1, &nQuery);
-        table.glGenQueries(1, &nQuery);
+    if (!gl().glIsQuery(nQuery)) {
+        gl().glDeleteQueries(1, &nQuery);
+        gl().glGenQueries(1, &nQuery);
     }
     return nQuery;
 }
+
+/// On a software driver, one query over all bands of an upload: beside it the queue begins none, so that each
+/// band finds the buffer free that the one before has left, still warm in the cache. Such a driver has done
+/// with a buffer when the upload from it returns, but tells so by its queries much later, and every band
+/// would take another buffer. Elsewhere nothing.
+class SpanningQuery {
+public:
+    explicit SpanningQuery(unsigned& nQuery) {
+        if (!OGL::ExtensionManager::Instance()->isSoftwareDriver() || isAnySampleQueryActive())
+            return;
+        gl().glBeginQuery(GL_SAMPLES_PASSED, usableQuery(nQuery));
+        ORVO_OGL_THROW_ON_ERROR("The query of an upload could not be begun");
+        bActive_ = true;
+    }
+    ~SpanningQuery() {
+        if (bActive_ && currentSampleQuery() != 0)
+            gl().glEndQuery(GL_SAMPLES_PASSED);
+    }
+    SpanningQuery(SpanningQuery const&) = delete;
+    SpanningQuery& operator=(SpanningQuery const&) = delete;
+
+    bool isActive() const noexcept { return bActive_; }
+
+    void end() {
+        if (!bActive_)
+            return;
+        gl().glEndQuery(GL_SAMPLES_PASSED);
+        ORVO_OGL_THROW_ON_ERROR("The query of an upload could not be ended");
+        bActive_ = false;
+    }
+
+private:
+    bool bActive_ = false;
+};
 
 /// Copies rows into memory without gaps.
 class ArrayMemCopy {
@@ -249,35 +292,37 @@ void TextureUpload::asyncUpload(OGL::Texture2* pTexture, int level, PositionExte
     std::size_t const nSourceStride = (rowLength != 0 ? rowLength : nWidth) * nPixelBytes;
     ORVO_CHECK(nSourceStride >= nRowBytes, "srcWidth >= imageWidth");
 
-    OGL::Internal::ScopedBufferBinding const restoreBuffer(GL_PIXEL_UNPACK_BUFFER, 0);
-    int const nBandRows = static_cast<int>(std::min<std::size_t>(rowsPerBand(nRowBytes), INT_MAX));
-    auto const* pBand = static_cast<unsigned char const*>(pPixels);
-    while (rect.extent().height() != 0) {
-        int const nRows = std::min(rect.extent().height(), nBandRows);
-        uploadBand(*pTexture, level, {rect.position(), {rect.extent().width(), nRows}}, format, type, pBand,
-                   nSourceStride);
-        pBand += nSourceStride * static_cast<std::size_t>(nRows);
-        rect = {{rect.position().x(), rect.position().y() + nRows},
-                {rect.extent().width(), rect.extent().height() - nRows}};
-    }
+    uploadInBands(*pTexture, level, rect,
+                  {format, type, static_cast<unsigned char const*>(pPixels), nRowBytes, nSourceStride});
 }
 
-void TextureUpload::uploadBand(OGL::Texture2& texture, int level, PositionExtentInPixelSpace const& band,
-                               OGL::Texture::Format format, OGL::Texture::Type type, void const* pPixels,
-                               std::size_t nSourceStride) {
+void TextureUpload::uploadInBands(OGL::Texture2& texture, int level, PositionExtentInPixelSpace rect,
+                                  Source const& source) {
     TexturePool* const pPool = TexturePool::Instance();
     ORVO_ENFORCE(pPool, "TexturePool::Instance()");
-    unsigned& nQuery = namesHere().oQueries_.aNames_[nQueryIndex_ & (nQueryObject_ - 1)];
-    std::size_t const nRowBytes =
-        static_cast<std::size_t>(band.extent().width()) * pixelDataSize(format, type);
-    auto const nRows = static_cast<std::size_t>(band.extent().height());
-    QueuedBuffer buffer(*pPool, nRowBytes * nRows, usableQuery(nQuery));
-    ++nQueryIndex_;
-    copyRows(buffer.map(), static_cast<unsigned char const*>(pPixels), nSourceStride, nRowBytes, nRows);
-    buffer.unmap();
-    bufferUpload(&texture, buffer.get(), level, band, format, type, 0);
-    ORVO_OGL_THROW_ON_ERROR("The pixels could not be uploaded");
-    buffer.giveBack();
+    std::array<unsigned, nQueryObject_>& aQueries = namesHere().oQueries_.aNames_;
+    OGL::Internal::ScopedBufferBinding const restoreBuffer(GL_PIXEL_UNPACK_BUFFER, 0);
+    SpanningQuery span(aQueries[0]);
+    int const nBandRows = static_cast<int>(std::min<std::size_t>(rowsPerBand(source.nRowBytes_), INT_MAX));
+    unsigned char const* pBand = source.pPixels_;
+    while (rect.extent().height() != 0) {
+        PositionExtentInPixelSpace const band(
+            rect.position(), {rect.extent().width(), std::min(rect.extent().height(), nBandRows)});
+        auto const nRows = static_cast<std::size_t>(band.extent().height());
+        // The spanning query must not be that of a band: nothing is in flight beside it, so one will do.
+        std::size_t const iQuery = span.isActive() ? 1 : nQueryIndex_ & (nQueryObject_ - 1);
+        QueuedBuffer buffer(*pPool, source.nRowBytes_ * nRows, usableQuery(aQueries[iQuery]));
+        ++nQueryIndex_;
+        copyRows(buffer.map(), pBand, source.nStride_, source.nRowBytes_, nRows);
+        buffer.unmap();
+        bufferUpload(&texture, buffer.get(), level, band, source.eFormat_, source.eType_, 0);
+        ORVO_OGL_THROW_ON_ERROR("The pixels could not be uploaded");
+        buffer.giveBack();
+        pBand += source.nStride_ * nRows;
+        rect = {{rect.position().x(), rect.position().y() + band.extent().height()},
+                {rect.extent().width(), rect.extent().height() - band.extent().height()}};
+    }
+    span.end();
 }
 
 void TextureUpload::bufferUpload(OGL::Texture2* pTexture, OGL::Buffer* pBuffer, int level,

@@ -16,7 +16,8 @@ class Texture2;
 
 /// Moves pixels from host memory into textures. Where the driver has pixel buffer objects, the image goes up
 /// in bands of at most 4 MiB: worker threads copy a band into a mapped buffer of the texture pool, from which
-/// the GPU pulls it while the next one is being filled. Otherwise it goes up directly.
+/// the GPU pulls it while the next one is being filled. Otherwise it goes up directly. On a software driver,
+/// which has no GPU to wait for, all bands share one buffer.
 ///
 /// An object belongs to each node that uploads. It may be made without a context; its OpenGL names are made
 /// when it is first used in a context, one set for each context, and go when that context is current: at
@@ -74,11 +75,12 @@ public:
 private:
     /// The names in one context.
     struct Names;
+    /// Pixels in memory: a row's bytes, and bytes from row to row.
+    struct Source;
 
     Names& namesHere();
-    void uploadBand(OGL::Texture2& texture, int level, PositionExtentInPixelSpace const& band,
-                    OGL::Texture::Format format, OGL::Texture::Type type, void const* pPixels,
-                    std::size_t nSourceStride);
+    void uploadInBands(OGL::Texture2& texture, int level, PositionExtentInPixelSpace rect,
+                       Source const& source);
 
     std::vector<Names> aNames_;
     std::size_t nQueryIndex_ = 0;

@@ -49,6 +49,13 @@ unsigned unsignedOf(GLenum name) {
     return value > 0 ? static_cast<unsigned>(value) : 0;
 }
 
+bool isSoftware(std::string const& sRenderer) {
+    static constexpr std::array<char const*, 3> aMarks{"llvmpipe", "softpipe", "Software Rasterizer"};
+    return std::any_of(aMarks.begin(), aMarks.end(), [&sRenderer](char const* pMark) {
+        return sRenderer.find(pMark) != std::string::npos;
+    });
+}
+
 DriverFacts readFacts() {
     DriverFacts facts;
     facts.sVendor_ = textOf(GL_VENDOR);
@@ -69,6 +76,7 @@ DriverFacts readFacts() {
         facts.nSelectableUnits_ = std::max({facts.nUnits_, unsignedOf(GL_MAX_COMBINED_TEXTURE_IMAGE_UNITS),
                                             unsignedOf(GL_MAX_TEXTURE_COORDS)});
     facts.eVendor_ = vendorOf(facts.sVendor_, facts.sRenderer_);
+    facts.bSoftware_ = isSoftware(facts.sRenderer_);
     return facts;
 }
 

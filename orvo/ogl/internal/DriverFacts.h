@@ -21,6 +21,8 @@ struct DriverFacts {
     /// Units that can be made active.
     unsigned nSelectableUnits_ = 0;
     ExtensionManager::teVendor eVendor_ = ExtensionManager::VENDOR_UNKNOWN;
+    /// Whether the processor does the driver's work.
+    bool bSoftware_ = false;
     /// Those of teExtension that the driver names; core versions are not looked at here.
     std::set<teExtension> aNamed_;
 

@@ -165,6 +165,8 @@ NativeContext create(EGLDisplay display, EGLConfig config, EGLContext share) {
 
 } // namespace
 
+void* currentHandle() noexcept { return isLoaded() ? eglGetCurrentContext() : nullptr; }
+
 NativeContext current() noexcept {
     NativeContext record;
     if (!isLoaded())

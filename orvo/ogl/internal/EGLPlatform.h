@@ -9,6 +9,8 @@ namespace ORVO::OGL::Internal::EGLPlatform {
 
 /// What is current on the calling thread; an empty record if nothing is.
 NativeContext current() noexcept;
+/// The context alone: every question to the interface may cost a system call, and this asks one.
+void* currentHandle() noexcept;
 
 /// Makes the record current; false with the reason if EGL refuses.
 bool makeCurrent(NativeContext const& record, PlatformFailure& failure) noexcept;

@@ -131,6 +131,8 @@ void destroyParts(Display* pDisplay, GLXContext context, GLXPbuffer surface) noe
 
 } // namespace
 
+void* currentHandle() noexcept { return isLoaded() ? glXGetCurrentContext() : nullptr; }
+
 NativeContext current() noexcept {
     NativeContext record;
     if (!isLoaded())

@@ -9,6 +9,8 @@ namespace ORVO::OGL::Internal::GLXPlatform {
 
 /// What is current on the calling thread; an empty record if nothing is.
 NativeContext current() noexcept;
+/// The context alone: every question to the interface may cost a system call, and this asks one.
+void* currentHandle() noexcept;
 
 /// Makes the record current; false with the reason if GLX refuses. An X error that comes with a refusal is
 /// caught, so that it does not end the process.

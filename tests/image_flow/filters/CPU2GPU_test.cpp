@@ -2,6 +2,7 @@
 
 #include "orvo/image_runtime/TexturePool.h"
 #include "tests/image_flow/support/GPURoads.h"
+#include "tests/support/ImageFlowLayers.h"
 
 namespace ORVO {
 
@@ -250,6 +251,28 @@ TEST_F(CPU2GPUTest, anOutputBoundToNothingFails) {
 }
 
 // Failures of OpenGL
+
+TEST(CPU2GPUWithoutAContextTest, thereIsNoTextureToUploadInto) {
+    ORVO::Test::ImageFlowLayers layers;
+    HostImage host(ImageCPU::PIXEL_FORMAT_LUMINANCE8, pixels(0, 0, 4, 4));
+    ImageCPUInput source;
+    CPU2GPU up;
+    source.setImageCPUWithNoOwnership(&host.image());
+    ORVO::Test::feed(up, 0, source);
+    ImageFlowController controller;
+    controller.addNode(&source);
+    controller.addNode(&up);
+    controller.setImageSink(up);
+    controller.computeRegions(worldOf(pixels(0, 0, 4, 4)));
+    ORVO::Test::emitAll(controller);
+    ORVO_EXPECT_INTERNAL(controller.process(), "Enforce TexturePool::Instance() != NULL");
+    up.disconnect();
+    ImageGPUInput textures;
+    unsigned char const aPixel[4] = {};
+    ORVO_EXPECT_INTERNAL(textures.load8BitUnsignedImageData(aPixel, pixels(0, 0, 1, 1),
+                                                            PixelExtentInWorldSpace(), PIXEL_LAYOUT_RGBA, 0),
+                         "Enforce TexturePool::Instance() != NULL");
+}
 
 TEST_F(CPU2GPUTest, everyCallMayFail) {
     HostImage host(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(0, 0, 3, 2), 1, 77);

@@ -402,6 +402,29 @@ TEST_F(GPU2CPUTest, everyCallMayFail) {
         EXPECT_EQ(1u, aFailed.count(pName)) << pName;
 }
 
+TEST_F(GPU2CPUTest, needsACurrentContext) {
+    ImageGPUPtr const upImage = textureImage(pixels(0, 0, 3, 2), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUInput source;
+    GPU2CPU read;
+    source.setImageGPUWithNoOwnership(upImage.get());
+    ORVO::Test::feed(read, 0, source);
+    ImageFlowController controller;
+    controller.addNode(&source);
+    controller.addNode(&read);
+    controller.setImageSink(read);
+    controller.computeRegions(worldOf(pixels(0, 0, 3, 2)));
+    ORVO::Test::emitAll(controller);
+    host().release();
+    ORVO_EXPECT_OGL(controller.process(), "No OpenGL context is current");
+    host().makeCurrent();
+    EXPECT_FALSE(read.imageOutput()->hasData());
+    controller.flushGraph();
+    ORVO::Test::emitAll(controller);
+    controller.process(); // the host's own context does as well
+    EXPECT_TRUE(read.imageOutput()->hasData());
+    read.disconnect();
+}
+
 TEST_F(GPU2CPUTest, aTextureThatCannotBeReadIsReportedByItsStatus) {
     ImageGPUPtr const upImage = textureImage(pixels(0, 0, 3, 2), ImageGPU::PIXEL_FORMAT_RGBA8);
     Road road(context(), *upImage);

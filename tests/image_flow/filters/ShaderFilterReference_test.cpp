@@ -143,6 +143,33 @@ TEST_P(ShaderFilterReferenceTest, InterpolatesAnInputOfLargerPixels) {
     expectPicture(run(node, place, {upA.get(), upB.get()}), expected, precision);
 }
 
+TEST_P(ShaderFilterReferenceTest, IntoImagesOfItsOwn) {
+    // Each precision that a hint asks for, with three and with four channels, from each format.
+    using Hint = ImageFilter::teOutputPrecisionHint;
+    Place const place{"", pixels(-5, 3, 15, 9), {0.5f, 0.25f}, pixels(-3, 4, 11, 7)};
+    ImageGPUPtr const upInput = textureOf(randomPicture(place.oInput_, 8, place.oPixelExtent_), format());
+    Picture const input(*upInput);
+    for (Hint const eHint : {Hint::OUTPUT_PRECISION_8_BIT_INT, Hint::OUTPUT_PRECISION_16_BIT_INT,
+                             Hint::OUTPUT_PRECISION_16_BIT_FLOAT}) {
+        for (int const nChannels : {3, 4}) {
+            ShaderNode node(shaderOf({"src"}, "0.875*" + readInput("src") + "+vec4(0.0625)"), {"src"},
+                            nChannels);
+            node.outputPrecisionHintParameter().setValue(eHint);
+            ShaderRoad road(frameContext(), node);
+            road.setInput(0, *upInput);
+            ImageGPU const* const pOutput = road.run(pixelToWorldSpace(place.oOutput_, place.oPixelExtent_));
+            Picture const expected = Picture(place.oOutput_, place.oPixelExtent_).fill([&](int x, int y) {
+                Pixel pixel = input.at(x, y);
+                for (double& value : pixel)
+                    value = 0.875 * value + 0.0625;
+                return pixel;
+            });
+            SCOPED_TRACE(nameOf(pOutput->pixelFormat()));
+            expectPicture(Picture(*pOutput), expected, Precision::of(pOutput->pixelFormat()));
+        }
+    }
+}
+
 INSTANTIATE_TEST_SUITE_P(, ShaderFilterReferenceTest, testing::Range(0, 4),
                          [](testing::TestParamInfo<int> const& row) {
                              return nameOf(aFormats[row.param]).substr(13);

@@ -36,10 +36,12 @@ GLuint activeQuery() {
     return static_cast<GLuint>(nQuery);
 }
 
-class TextureUploadContexts : public ORVO::Test::GLRuntimeTest {
+/// As on a software driver, which the parameter says, and as on a GPU.
+class TextureUploadContexts : public ORVO::Test::GLRuntimeTest, public testing::WithParamInterface<bool> {
 protected:
     void SetUp() override {
         GLRuntimeTest::SetUp();
+        OGL::ExtensionManager::Instance()->overrideSoftwareDriver(GetParam());
         pTexture_ =
             std::make_unique<OGL::Texture2D>(OGL::Texture::INTERNAL_FORMAT_LUMINANCE8, 3, 2, false, nullptr);
     }
@@ -69,7 +71,7 @@ protected:
     std::unique_ptr<OGL::Texture2D> pTexture_;
 };
 
-TEST_F(TextureUploadContexts, MakesItsNamesOnFirstUse) {
+TEST_P(TextureUploadContexts, MakesItsNamesOnFirstUse) {
     auto const nQueries = countOf("query");
     auto const nTextures = countOf("texture");
     host().release();
@@ -87,7 +89,7 @@ TEST_F(TextureUploadContexts, MakesItsNamesOnFirstUse) {
     EXPECT_EQ(aOthers_, get());
 }
 
-TEST_F(TextureUploadContexts, GivesEachQueryAResultAtFirst) {
+TEST_P(TextureUploadContexts, GivesEachQueryAResultAtFirst) {
     std::uint64_t const nBegun = GLHooks::calls("glBeginQuery");
     std::uint64_t const nFinished = GLHooks::calls("glFinish");
     TextureUpload upload;
@@ -99,7 +101,7 @@ TEST_F(TextureUploadContexts, GivesEachQueryAResultAtFirst) {
     EXPECT_EQ(1U, GLHooks::calls("glFinish") - nFinished);
 }
 
-TEST_F(TextureUploadContexts, HasNamesInEachContext) {
+TEST_P(TextureUploadContexts, HasNamesInEachContext) {
     auto const nQueries = countOf("query");
     auto const pSharing = host().another(true);
     {
@@ -126,7 +128,7 @@ TEST_F(TextureUploadContexts, HasNamesInEachContext) {
     EXPECT_EQ(nQueries + 16, countOf("query"));
 }
 
-TEST_F(TextureUploadContexts, UploadsOnAnotherThread) {
+TEST_P(TextureUploadContexts, UploadsOnAnotherThread) {
     auto const pSharing = host().another(true);
     auto pUpload = std::make_unique<TextureUpload>();
     put(*pUpload, aPixels_);
@@ -149,7 +151,7 @@ TEST_F(TextureUploadContexts, UploadsOnAnotherThread) {
     put(next, aPixels_);
 }
 
-TEST_F(TextureUploadContexts, KeepsNamesOfADeadUploadUntilTheirContextIsCurrent) {
+TEST_P(TextureUploadContexts, KeepsNamesOfADeadUploadUntilTheirContextIsCurrent) {
     auto const nQueries = countOf("query");
     OGL::ContextOffscreen const offscreen(context());
     {
@@ -165,7 +167,7 @@ TEST_F(TextureUploadContexts, KeepsNamesOfADeadUploadUntilTheirContextIsCurrent)
     host().makeCurrent();
 }
 
-TEST_F(TextureUploadContexts, MakesNewNamesAfterAContextHasDied) {
+TEST_P(TextureUploadContexts, MakesNewNamesAfterAContextHasDied) {
     {
         TextureUpload upload;
         auto pSharing = host().another(true);
@@ -186,7 +188,7 @@ TEST_F(TextureUploadContexts, MakesNewNamesAfterAContextHasDied) {
     GLHooks::forgetObjects();
 }
 
-TEST_F(TextureUploadContexts, LeavesAQueryOfTheHostsAlone) {
+TEST_P(TextureUploadContexts, LeavesAQueryOfTheHostsAlone) {
     GLuint nQuery = 0;
     glGenQueries(1, &nQuery);
     for (GLenum const nTarget : {GL_SAMPLES_PASSED, GL_ANY_SAMPLES_PASSED}) {
@@ -209,7 +211,7 @@ TEST_F(TextureUploadContexts, LeavesAQueryOfTheHostsAlone) {
     glDeleteQueries(1, &nQuery);
 }
 
-TEST_F(TextureUploadContexts, WorksWhenItsFirstUseWasBesideAQueryOfTheHosts) {
+TEST_P(TextureUploadContexts, WorksWhenItsFirstUseWasBesideAQueryOfTheHosts) {
     TextureUpload upload;
     GLuint nQuery = 0;
     glGenQueries(1, &nQuery);
@@ -226,7 +228,7 @@ TEST_F(TextureUploadContexts, WorksWhenItsFirstUseWasBesideAQueryOfTheHosts) {
     EXPECT_EQ(aOthers_, get());
 }
 
-TEST_F(TextureUploadContexts, GoesOnWhenThePoolHasDeletedItsQueries) {
+TEST_P(TextureUploadContexts, GoesOnWhenThePoolHasDeletedItsQueries) {
     auto const nQueries = countOf("query");
     {
         TextureUpload upload;
@@ -240,7 +242,7 @@ TEST_F(TextureUploadContexts, GoesOnWhenThePoolHasDeletedItsQueries) {
     EXPECT_EQ(nQueries, countOf("query"));
 }
 
-TEST_F(TextureUploadContexts, LeavesTheHostsBufferBound) {
+TEST_P(TextureUploadContexts, LeavesTheHostsBufferBound) {
     OGL::Buffer buffer(6, OGL::Buffer::TYPE_PIXEL_UNPACK, OGL::Buffer::USAGE_STREAM_DRAW, aOthers_.data());
     buffer.bind();
     for (bool const bBuffers : {true, false}) {
@@ -258,7 +260,7 @@ TEST_F(TextureUploadContexts, LeavesTheHostsBufferBound) {
     OGL::Buffer::bindDefaultUnpackBuffer();
 }
 
-TEST_F(TextureUploadContexts, ReusesTheBufferOfTheLastBand) {
+TEST_P(TextureUploadContexts, ReusesTheBufferOfTheLastUpload) {
     TextureUpload upload;
     put(upload, aPixels_);
     auto const nBuffers = countOf("buffer");
@@ -267,6 +269,27 @@ TEST_F(TextureUploadContexts, ReusesTheBufferOfTheLastBand) {
         put(upload, aPixels_);
     }
     EXPECT_EQ(nBuffers, countOf("buffer"));
+}
+
+TEST_P(TextureUploadContexts, BeginsAQueryForEachBandOrForAll) {
+    // Rows of 128 KiB, 32 of them a band.
+    constexpr int nWidth = 1 << 13, nHeight = 65;
+    OGL::Texture2D texture(OGL::Texture::INTERNAL_FORMAT_RGBA32F, nWidth, nHeight, false, nullptr);
+    std::vector<float> const aRows(std::size_t{nWidth} * nHeight * 4, 0.5F);
+    TextureUpload upload;
+    put(upload, aPixels_);
+    std::uint64_t const nBegun = GLHooks::calls("glBeginQuery");
+    std::uint64_t const nEnded = GLHooks::calls("glEndQuery");
+    auto const nBuffers = countOf("buffer");
+    upload.asyncUpload(&texture, 0, {{0, 0}, {nWidth, nHeight}}, OGL::Texture::FORMAT_RGBA,
+                       OGL::Texture::TYPE_FLOAT, aRows.data(), 0);
+    EXPECT_EQ(GetParam() ? 1U : 3U, GLHooks::calls("glBeginQuery") - nBegun);
+    EXPECT_EQ(GLHooks::calls("glBeginQuery") - nBegun, GLHooks::calls("glEndQuery") - nEnded);
+    if (GetParam()) {
+        // One for the bands; the last row takes the one of the first upload.
+        EXPECT_EQ(nBuffers + 1, countOf("buffer"));
+    }
+    EXPECT_EQ(0U, activeQuery());
 }
 
 /// Empties the queue of buffers at the end of a scope, also after an exception.
@@ -281,7 +304,7 @@ struct EmptyQueue {
     }
 };
 
-TEST_F(TextureUploadContexts, LeavesNothingWhereTheDriverFails) {
+TEST_P(TextureUploadContexts, LeavesNothingWhereTheDriverFails) {
     auto const state = ORVO::Test::GLState::capture();
     auto const aFailed = ORVO::Test::failEveryCall(
         [this] {
@@ -306,7 +329,7 @@ TEST_F(TextureUploadContexts, LeavesNothingWhereTheDriverFails) {
         EXPECT_EQ(1U, aFailed.count(pCall)) << pCall;
 }
 
-TEST_F(TextureUploadContexts, GoesOnAfterAFailure) {
+TEST_P(TextureUploadContexts, GoesOnAfterAFailure) {
     TextureUpload upload;
     put(upload, aPixels_);
     for (char const* const pCall : {"glMapBuffer", "glUnmapBuffer", "glTexSubImage2D", "glBeginQuery"}) {
@@ -322,7 +345,7 @@ TEST_F(TextureUploadContexts, GoesOnAfterAFailure) {
     }
 }
 
-TEST_F(TextureUploadContexts, SaysWhatTheDriverRefused) {
+TEST_P(TextureUploadContexts, SaysWhatTheDriverRefused) {
     TextureUpload upload;
     put(upload, aPixels_);
     struct Row {
@@ -356,12 +379,18 @@ TEST_F(TextureUploadContexts, SaysWhatTheDriverRefused) {
     ORVO_EXPECT_OGL(put(upload, aPixels_), "The pixels could not be uploaded (GL_OUT_OF_MEMORY)");
 }
 
-TEST_F(TextureUploadContexts, NeedsAPoolThatServesTheContext) {
+TEST_P(TextureUploadContexts, NeedsAPoolThatServesTheContext) {
     TextureUpload upload;
     stopLibrary();
     ORVO_EXPECT_INTERNAL(put(upload, aPixels_), "Enforce pvDeviceObject_ != NULL");
     ImageRuntime::AutoInitializer const cpuOnly(nullptr, VideoMemory::Configuration());
     ORVO_EXPECT_INTERNAL(put(upload, aPixels_), "Enforce TexturePool::Instance() != NULL");
 }
+
+std::string driverName(testing::TestParamInfo<bool> const& bSoftware) {
+    return bSoftware.param ? "Software" : "GPU";
+}
+
+INSTANTIATE_TEST_SUITE_P(, TextureUploadContexts, testing::Bool(), driverName);
 
 } // namespace

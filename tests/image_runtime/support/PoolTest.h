@@ -27,6 +27,7 @@ public:
     }
     static std::size_t freeListBytes(TexturePool const& pool) { return pool.nFreeListBytes_; }
     static void setFreeListBytes(TexturePool& pool, std::size_t nBytes) { pool.nFreeListBytes_ = nBytes; }
+    static std::size_t evictionTarget(std::size_t nMaximum) { return TexturePool::evictionTarget(nMaximum); }
     static PBOQueue& queue(TexturePool& pool) { return pool.oPBOQueue_; }
     static unsigned framebuffer(TexturePool const& pool) { return pool.nFramebufferID_; }
     static std::shared_ptr<OGL::ContextOffscreen>& context(TexturePool& pool) { return pool.spContext_; }
