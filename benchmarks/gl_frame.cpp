@@ -3,10 +3,9 @@
 // is one, else on the software driver. The label names it.
 //
 // The name says where the images live: "memory_to_memory" uploads and reads back, "texture_to_texture" only
-// draws. Every frame runs in full and ends when the driver has done with it. The counters of memory_to_memory
-// are the shares of its time, of the shortest frame of each road, the four run by turns so that all see the
-// same machine: "passes" is texture_to_texture, "upload" and "read_back" what memory at that one end adds to
-// it, "rest" what remains (below 0 where work of the two ends overlaps).
+// draws. Every frame runs in full and ends when the driver has done with it. The counters are shares of the
+// frame's time: "upload" and "read_back" are frames without filters from memory to a texture and back, run by
+// turns with the others so that all see the same machine, and "passes" is what remains.
 #include "benchmarks/support/Timing.h"
 
 #include "orvo/filter_graph/internal/ImageFlowFilter.h"
@@ -15,11 +14,9 @@
 #include <benchmark/benchmark.h>
 #include <epoxy/gl.h>
 
-#include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstddef>
-#include <limits>
 #include <memory>
 #include <stdexcept>
 #include <string>
@@ -151,14 +148,19 @@ std::shared_ptr<FilterGraph::IFilter> makeFilter() {
     return prototype.clone();
 }
 
-/// source -> gain -> mean -> summand -> result.
+/// source -> gain -> mean -> summand -> result, or source -> result.
 class Road {
 public:
-    Road(FilterGraph::ImageBase* pSource, FilterGraph::ImageBase* pResult, OGL::Context const* pContext) {
-        FilterGraph::Connect(spInput_, aFilters_[0]);
-        FilterGraph::Connect(aFilters_[0], aFilters_[1]);
-        FilterGraph::Connect(aFilters_[1], aFilters_[2]);
-        FilterGraph::Connect(aFilters_[2], spOutput_);
+    Road(FilterGraph::ImageBase* pSource, FilterGraph::ImageBase* pResult, OGL::Context const* pContext,
+         bool bFilters) {
+        if (bFilters) {
+            FilterGraph::Connect(spInput_, aFilters_[0]);
+            FilterGraph::Connect(aFilters_[0], aFilters_[1]);
+            FilterGraph::Connect(aFilters_[1], aFilters_[2]);
+            FilterGraph::Connect(aFilters_[2], spOutput_);
+        } else {
+            FilterGraph::Connect(spInput_, spOutput_);
+        }
         spInput_->setImage(pSource);
         spOutput_->setImage(pResult);
         spProcessor_ = FilterGraph::createProcessor(spOutput_, pContext);
@@ -203,44 +205,38 @@ void requireRight(Bytes const& source, Bytes const& result) {
     }
 }
 
-enum : std::size_t { MEMORY_TO_MEMORY, TEXTURE_TO_MEMORY, MEMORY_TO_TEXTURE, TEXTURE_TO_TEXTURE, ROADS };
+enum : std::size_t { MEMORY_TO_MEMORY, TEXTURE_TO_MEMORY, MEMORY_TO_TEXTURE, TEXTURE_TO_TEXTURE };
 
-void measure(benchmark::State& state, std::size_t iTimed) {
+void measure(benchmark::State& state, std::size_t iRoad) {
+    bool const bFromTexture = (iRoad & 1) != 0;
+    bool const bToTexture = (iRoad & 2) != 0;
     Layers const layers;
     Client source(makePicture());
     Client result(Bytes(source.pixels().size()));
-    std::array<std::unique_ptr<Road>, ROADS> aRoads;
-    for (std::size_t i = 0; i < ROADS; ++i) {
-        bool const bFromTexture = (i & 1) != 0;
-        bool const bToTexture = (i & 2) != 0;
-        aRoads[i] =
-            std::make_unique<Road>(source.image(bFromTexture), result.image(bToTexture), layers.context());
-        aRoads[i]->run();
-        requireRight(source.pixels(), bToTexture ? result.texels() : result.pixels());
-    }
-    std::array<double, ROADS> aShortest;
-    aShortest.fill(std::numeric_limits<double>::infinity());
-    auto const run = [&](std::size_t i) {
-        aShortest[i] = std::min(aShortest[i], ORVO::Benchmarks::secondsOf([&] { aRoads[i]->run(); }));
-    };
+    Road road(source.image(bFromTexture), result.image(bToTexture), layers.context(), true);
+    Road upload(source.image(false), result.image(true), layers.context(), false);
+    Road readBack(source.image(true), result.image(false), layers.context(), false);
+    upload.run();
+    readBack.run();
+    if (result.texels() != source.pixels() || result.pixels() != source.pixels())
+        throw std::runtime_error("pixels change on their way up or down");
+    road.run();
+    requireRight(source.pixels(), bToTexture ? result.texels() : result.pixels());
+
+    std::vector<double> aRoad, aUpload, aReadBack;
     for (auto _ : state) {
-        run(iTimed);
+        aRoad.push_back(Benchmarks::secondsOf([&] { road.run(); }));
         state.PauseTiming();
-        for (std::size_t i = 0; i < ROADS && iTimed == MEMORY_TO_MEMORY; ++i)
-            if (i != iTimed)
-                run(i);
+        aUpload.push_back(Benchmarks::secondsOf([&] { upload.run(); }));
+        aReadBack.push_back(Benchmarks::secondsOf([&] { readBack.run(); }));
         state.ResumeTiming();
     }
-    if (iTimed == MEMORY_TO_MEMORY) {
-        double const all = aShortest[MEMORY_TO_MEMORY];
-        double const passes = aShortest[TEXTURE_TO_TEXTURE];
-        double const upload = aShortest[MEMORY_TO_TEXTURE] - passes;
-        double const readBack = aShortest[TEXTURE_TO_MEMORY] - passes;
-        state.counters["passes"] = passes / all;
-        state.counters["upload"] = upload / all;
-        state.counters["read_back"] = readBack / all;
-        state.counters["rest"] = (all - passes - upload - readBack) / all;
-    }
+    double const all = Benchmarks::medianOf(aRoad);
+    double const up = bFromTexture ? 0.0 : Benchmarks::medianOf(aUpload) / all;
+    double const down = bToTexture ? 0.0 : Benchmarks::medianOf(aReadBack) / all;
+    state.counters["upload"] = up;
+    state.counters["passes"] = 1.0 - up - down;
+    state.counters["read_back"] = down;
     state.SetItemsProcessed(state.iterations() * WIDTH * HEIGHT);
     state.SetLabel(reinterpret_cast<char const*>(glGetString(GL_RENDERER)));
 }
