@@ -1,6 +1,7 @@
 #include "apply_filter/FilterList.h"
 
 #include "apply_filter/FilterValues.h"
+#include "apply_filter/FrameRunner.h"
 #include "orvo/filter_graph/FilterGraph.h"
 
 #include <ostream>
@@ -25,10 +26,20 @@ void listParameter(std::ostream& stream, FG::ParameterBase const& parameter) {
     stream << '\n';
 }
 
-void listFilter(std::ostream& stream, FG::IFilter const& filter) {
+std::string targetsOf(std::shared_ptr<FG::IFilter> const& filter, ORVO::OGL::Context const* context) {
+    bool const cpu = runsOn(nullptr, filter);
+    bool const gl = context && runsOn(context, filter);
+    if (cpu || gl)
+        return cpu && gl ? "runs on cpu, gl" : cpu ? "runs on cpu" : "runs on gl";
+    return context ? "runs on no target" : "does not run on cpu, and there is no OpenGL here";
+}
+
+void listFilter(std::ostream& stream, std::shared_ptr<FG::IFilter> const& prototype,
+                ORVO::OGL::Context const* context) {
+    FG::IFilter const& filter = *prototype;
     auto const& identifier = filter.identifier();
     stream << identifier.name() << "  (" << identifier.nameSpace() << ", " << identifier.vendor()
-           << ", version " << identifier.version() << ")\n";
+           << ", version " << identifier.version() << ")\n    " << targetsOf(prototype, context) << '\n';
     for (auto input = filter.inputs(); input.isValid(); ++input) {
         stream << "    input " << input->name();
         if (input->nChannel() > 0)
@@ -49,10 +60,10 @@ std::shared_ptr<FG::IFilter> createFilterNamed(std::string const& name) {
     return {};
 }
 
-void listFilters(std::ostream& stream) {
+void listFilters(std::ostream& stream, ORVO::OGL::Context const* context) {
     FG::FilterFactory& factory = *FG::FilterFactory::Instance();
     for (auto prototype = factory.prototypes(); prototype.isValid(); ++prototype)
-        listFilter(stream, *factory.create(prototype->identifier()));
+        listFilter(stream, factory.create(prototype->identifier()), context);
 }
 
 } // namespace example

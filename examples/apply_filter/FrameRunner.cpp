@@ -6,6 +6,7 @@
 
 #include <chrono>
 #include <cstdio>
+#include <utility>
 #include <vector>
 
 #include <unistd.h>
@@ -64,9 +65,12 @@ struct Graph {
     Graph& operator=(Graph const&) = delete;
 };
 
-OptimizationOptions onCPU() {
+OptimizationOptions optionsFor(ORVO::OGL::Context const* context, Depth depth) {
     OptimizationOptions options;
-    options.setProcessingMode(OptimizationOptions::CPU_PROCESSING);
+    if (!context)
+        options.setProcessingMode(OptimizationOptions::CPU_PROCESSING);
+    else if (depth == Depth::float32) // shader filters have 8 bits for 32-bit floats
+        options.setIntermediateBufferPrecision(OptimizationOptions::INTERMEDIATE_PRECISION_16_BIT_FLOAT);
     return options;
 }
 
@@ -90,39 +94,72 @@ bool pollToEnd(FG::IProcessor& processor, int frame, Clock::time_point start) {
     return !cancelled;
 }
 
-bool runGraph(Graph const& graph, int repeat, bool async) {
-    auto const processor = FG::createProcessor(graph.output, nullptr);
+bool runGraph(Graph const& graph, Depth depth, FrameSettings const& settings) {
+    auto const options = optionsFor(settings.context, depth);
+    auto const processor = FG::createProcessor(graph.output, settings.context);
     Interrupt const interrupt;
-    for (int frame = 1; frame <= repeat; ++frame) {
+    for (int frame = 1; frame <= settings.repeat; ++frame) {
         auto const start = Clock::now();
-        if (async)
-            processor->asyncProcessFrame(onCPU());
+        if (settings.async)
+            processor->asyncProcessFrame(options);
         else
-            processor->processFrame(onCPU());
-        if ((async && !pollToEnd(*processor, frame, start)) || Interrupt::requested())
+            processor->processFrame(options);
+        if ((settings.async && !pollToEnd(*processor, frame, start)) || Interrupt::requested())
             return false;
-        if (repeat > 1)
+        if (settings.repeat > 1)
             std::printf("frame %d: %.2f ms\n", frame, millisecondsSince(start));
     }
     return true;
 }
 
+bool runOnGL(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, Picture& result,
+             FrameSettings const& settings) {
+    Picture const opaque = withAlpha(source);
+    Picture filtered(opaque.width, opaque.height, opaque.channels, result.depth);
+    if (!runGraph(Graph(opaque, {filter}, filtered), filtered.depth, settings))
+        return false;
+    result = result.hasAlpha() ? filtered : withoutAlpha(filtered);
+    return true;
+}
+
+// Filters on the CPU compute in 8-bit or float, in the precision of the image that the graph ends in: 16-bit
+// images go into a float graph through the engine's converter, and an empty graph brings the result back to
+// 16 bits.
+bool runSixteenBitsOnCPU(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, Picture& result,
+                         FrameSettings const& settings) {
+    Picture floats(result.width, result.height, result.channels, Depth::float32);
+    if (!runGraph(Graph(source, {createFilterNamed("ConvertToSIMDOptimized"), filter}, floats), floats.depth,
+                  settings))
+        return false;
+    return runGraph(Graph(floats, {}, result), result.depth, FrameSettings());
+}
+
 } // namespace
 
-bool runFrames(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, Picture& result, int repeat,
-               bool async) {
-    if (source.depth != Depth::uint15_1)
-        return runGraph(Graph(source, {filter}, result), repeat, async);
+bool runFrames(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, Picture& result,
+               FrameSettings const& settings) {
+    if (settings.context)
+        return runOnGL(filter, source, result, settings);
+    if (source.depth == Depth::uint15_1)
+        return runSixteenBitsOnCPU(filter, source, result, settings);
+    return runGraph(Graph(source, {filter}, result), source.depth, settings);
+}
 
-    // Filters compute in 8-bit or float, in the precision of the image that the graph ends in: 16-bit images
-    // go into a float graph through the engine's converter, and an empty graph brings the result back to 16
-    // bits.
-    Picture floats(result.width, result.height, result.channels, Depth::float32);
-    if (!runGraph(Graph(source, {createFilterNamed("ConvertToSIMDOptimized"), filter}, floats), repeat,
-                  async))
-        return false;
-    FG::createProcessor(Graph(floats, {}, result).output, nullptr)->processFrame(onCPU());
-    return true;
+bool runsOn(ORVO::OGL::Context const* context, std::shared_ptr<FG::IFilter> const& filter) {
+    FrameSettings settings;
+    settings.context = context;
+    for (auto const& [from, to] : {std::pair(Depth::uint8, Depth::uint8),
+                                   {Depth::uint8, Depth::float32},
+                                   {Depth::float32, Depth::uint8}}) {
+        Picture const source(4, 4, 4, from);
+        Picture result(4, 4, 4, to);
+        try {
+            return runFrames(filter, source, result, settings);
+        } catch (std::exception const&) {
+            // The converters among the filters take one of the other pairs.
+        }
+    }
+    return false;
 }
 
 } // namespace example

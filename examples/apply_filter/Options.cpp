@@ -7,12 +7,14 @@ namespace example {
 char const usageText[] = R"(Usage: apply_filter --filter NAME [options] INPUT OUTPUT
        apply_filter --list
 
-Runs one filter over a picture (PNG, JPEG, TIFF or EXR, 1 to 4 channels) on the CPU.
+Runs one filter over a picture (PNG, JPEG, TIFF or EXR, 1 to 4 channels).
 
-  --list               every filter with its inputs, parameters, defaults and bounds
+  --list               every filter with the targets it runs on, its inputs, parameters, defaults and bounds
   --filter NAME        the filter to run
+  --target TARGET      cpu (the default), or gl: OpenGL in a context without a window
   --set NAME=VALUE     a parameter; vectors as numbers with commas: --set spatialSigma=10,10
-  --precision DEPTH    8, 16 or 32f: what the graph works with; that of the file by default
+  --precision DEPTH    8, 16 or 32f: what the graph works with; that of the file by default. On gl 16 and 32f
+                       both work in 16-bit floats
   --threads N          number of threads; all by default
   --repeat N           run N frames and print the milliseconds of each
   --async              run frames as tasks, poll them and show a progress line; Ctrl-C cancels
@@ -40,6 +42,14 @@ Depth depthNamed(std::string const& text) {
     throw UsageError("--precision is 8, 16 or 32f, not \"" + text + "\"");
 }
 
+Target targetNamed(std::string const& text) {
+    if (text == "cpu")
+        return Target::cpu;
+    if (text == "gl")
+        return Target::gl;
+    throw UsageError("--target is cpu or gl, not \"" + text + "\"");
+}
+
 std::pair<std::string, std::string> assignment(std::string const& text) {
     auto const equals = text.find('=');
     if (equals == std::string::npos || equals == 0)
@@ -52,6 +62,8 @@ void applyOption(Options& options, std::string const& option, std::string const&
         options.filter = value;
     else if (option == "--set")
         options.values.push_back(assignment(value));
+    else if (option == "--target")
+        options.target = targetNamed(value);
     else if (option == "--precision")
         options.precision = depthNamed(value);
     else if (option == "--threads")

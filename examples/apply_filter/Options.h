@@ -10,9 +10,16 @@
 
 namespace example {
 
+/// Where frames are computed.
+enum class Target {
+    cpu,
+    gl, ///< OpenGL, in a context without a window
+};
+
 /// What the command line asks for.
 struct Options {
     std::string filter;
+    Target target = Target::cpu;
     std::vector<std::pair<std::string, std::string>> values; ///< of --set, in order
     std::optional<Depth> precision;                          ///< that of the file where not given
     std::size_t threads = 0;                                 ///< 0: as many as the machine has

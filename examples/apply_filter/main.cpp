@@ -8,6 +8,8 @@
 
 #include <cstdio>
 #include <iostream>
+#include <memory>
+#include <utility>
 
 namespace {
 
@@ -15,19 +17,59 @@ constexpr int exitFailure = 1;
 constexpr int exitUsage = 2;
 constexpr int exitInterrupted = 130;
 
-// The layers of the engine, up for the life of one of these, without any OpenGL context.
+using ContextPtr = std::unique_ptr<ORVO::OGL::ContextOffscreen>;
+
+// What is needed of OpenGL. The list of filters does without where there is none.
+ContextPtr contextFor(example::Options const& options) {
+    if (options.target == example::Target::cpu && !options.list)
+        return {};
+    try {
+        auto context = ORVO::OGL::ContextOffscreen::createHeadless();
+        context->makeCurrent();
+        return context;
+    } catch (ORVO::OGL::ExceptionOGL const&) {
+        if (options.list)
+            return {};
+        throw;
+    }
+}
+
+// The layers of the engine, up for the life of one of these, with a context where there is one.
 struct Engine {
     ORVO::Core::AutoInitializer core;
     ORVO::OGL::AutoInitializer ogl;
-    ORVO::ImageRuntime::AutoInitializer runtime{nullptr, ORVO::VideoMemory::Configuration()};
+    ContextPtr const context;
+    ORVO::ImageRuntime::AutoInitializer runtime{context.get(), ORVO::VideoMemory::Configuration()};
     ORVO::DataFlow::AutoInitializer dataFlow;
-    ORVO::ImageFlow::AutoInitializer imageFlow{false};
+    ORVO::ImageFlow::AutoInitializer imageFlow{context != nullptr};
     ORVO::FilterGraph::AutoInitializer filterGraph{ORVO::FilterGraph::Library::InitializationOptions()};
 
-    Engine() { ORVO::FilterGraph::insertStandardFilters(); }
+    explicit Engine(example::Options const& options) : context(contextFor(options)) {
+        ORVO::FilterGraph::insertStandardFilters();
+    }
 };
 
-int applyFilter(example::Options const& options) {
+// A filter that has no code for the target fails like any other; the user is told so in words.
+bool runFramesOfFilter(std::shared_ptr<ORVO::FilterGraph::IFilter> const& filter,
+                       example::Picture const& source, example::Picture& result,
+                       example::FrameSettings const& settings) {
+    try {
+        return example::runFrames(filter, source, result, settings);
+    } catch (std::exception const&) {
+        if (example::runsOn(settings.context, filter))
+            throw;
+        throw example::UsageError("The filter \"" + filter->identifier().name() + "\" does not run on " +
+                                  (settings.context ? "gl" : "cpu") + " (--list shows the targets)");
+    }
+}
+
+example::Depth depthFor(example::Options const& options) {
+    auto const depth = options.precision ? *options.precision : example::depthOfFile(options.input);
+    bool const inFloat = options.target == example::Target::gl && depth == example::Depth::uint15_1;
+    return inFloat ? example::Depth::float32 : depth;
+}
+
+int applyFilter(example::Options const& options, ORVO::OGL::Context const* context) {
     auto const filter = example::createFilterNamed(options.filter);
     if (!filter)
         throw example::UsageError("There is no filter \"" + options.filter + "\" (--list shows the filters)");
@@ -37,11 +79,10 @@ int applyFilter(example::Options const& options) {
             std::fprintf(stderr, "apply_filter: warning: %s\n", warning.c_str());
     }
     example::checkWritable(options.output);
-    auto const depth = options.precision ? *options.precision : example::depthOfFile(options.input);
-    example::Picture const file = example::readPicture(options.input, depth);
+    example::Picture const file = example::readPicture(options.input, depthFor(options));
     example::Picture const source = example::widenedToColour(file);
     example::Picture result(source.width, source.height, source.channels, source.depth);
-    if (!example::runFrames(filter, source, result, options.repeat, options.async)) {
+    if (!runFramesOfFilter(filter, source, result, {context, options.repeat, options.async})) {
         std::fputs("apply_filter: cancelled, nothing was written\n", stderr);
         return exitInterrupted;
     }
@@ -54,14 +95,14 @@ int run(example::Options const& options) {
         std::fputs(example::usageText, stdout);
         return 0;
     }
-    Engine const engine;
+    Engine const engine(options);
     if (options.list) {
-        example::listFilters(std::cout);
+        example::listFilters(std::cout, engine.context.get());
         return 0;
     }
     if (options.threads > 0)
         ORVO::FilterGraph::setNumberOfThreads(options.threads);
-    return applyFilter(options);
+    return applyFilter(options, engine.context.get());
 }
 
 // What a failure of the engine says to a person.

@@ -1,6 +1,6 @@
 #include "common/Picture.h"
 
-#include <cmath>
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 
@@ -36,6 +36,13 @@ template <typename Integer>
 Integer meanOf(Integer const* rgb) {
     return static_cast<Integer>((rgb[0] + rgb[1] + rgb[2] + 1) / 3);
 }
+
+// The value of a full channel; the argument only names the type.
+std::uint8_t opaque(std::uint8_t const* /*channel*/) { return 255; }
+
+std::uint16_t opaque(std::uint16_t const* /*channel*/) { return 32768; }
+
+float opaque(float const* /*channel*/) { return 1.0F; }
 
 } // namespace
 
@@ -84,6 +91,37 @@ Picture reducedToGrey(Picture const& picture) {
         if (alpha)
             to[1] = from[3];
     });
+    return result;
+}
+
+Picture withAlpha(Picture const& picture) {
+    if (picture.hasAlpha())
+        return picture;
+    Picture result(picture.width, picture.height, picture.channels + 1, picture.depth);
+    std::size_t const colours = picture.channels;
+    forEachPixelOfDepth(picture, result, [colours](auto const* from, auto* to) {
+        std::copy_n(from, colours, to);
+        to[colours] = opaque(from);
+    });
+    return result;
+}
+
+Picture withoutAlpha(Picture const& picture) {
+    if (!picture.hasAlpha())
+        return picture;
+    Picture result(picture.width, picture.height, picture.channels - 1, picture.depth);
+    std::size_t const colours = result.channels;
+    forEachPixelOfDepth(picture, result,
+                        [colours](auto const* from, auto* to) { std::copy_n(from, colours, to); });
+    return result;
+}
+
+Picture upsideDown(Picture const& picture) {
+    Picture result = picture;
+    std::size_t const rowBytes = picture.rowBytes();
+    for (std::size_t row = 0; row < picture.height; ++row)
+        std::memcpy(result.pixels.data() + row * rowBytes,
+                    picture.pixels.data() + (picture.height - 1 - row) * rowBytes, rowBytes);
     return result;
 }
 

@@ -59,4 +59,13 @@ void checkWritable(std::string const& path);
 /// The opposite of widenedToColour: the three colour channels replaced by their mean.
 [[nodiscard]] Picture reducedToGrey(Picture const& picture);
 
+/// An opaque alpha added to a picture without one (1 to 2, 3 to 4 channels); other pictures as they are.
+[[nodiscard]] Picture withAlpha(Picture const& picture);
+
+/// The opposite: the picture without its alpha, which is not multiplied in.
+[[nodiscard]] Picture withoutAlpha(Picture const& picture);
+
+/// The rows in the opposite order.
+[[nodiscard]] Picture upsideDown(Picture const& picture);
+
 } // namespace example

@@ -4,7 +4,8 @@
 ///
 /// In short: start the layers (`Library`), create filters (`FilterFactory`), set their parameters
 /// (`Parameter`), make one adapter for each image that goes in and one for the image that comes out
-/// (`createInputAdapter`, `createOutputAdapter`), bind the images (`ImageCPU`), connect all of them
+/// (`createInputAdapter`, `createOutputAdapter`), bind the images (`ImageCPU`, `ImageGL`), connect all of
+/// them
 /// (`Connect`), create a processor on the output adapter (`createProcessor`), and ask it for frames.
 
 #include "orvo/filter_graph/filters/Bilateral.h"
@@ -33,6 +34,7 @@
 #include "orvo/filter_graph/impl/ImageDescriptor.h"
 #include "orvo/filter_graph/impl/ImageDescriptorCPU.h"
 #include "orvo/filter_graph/impl/ImageDescriptorGL.h"
+#include "orvo/filter_graph/impl/ImageGL.h"
 #include "orvo/filter_graph/impl/Input.h"
 #include "orvo/filter_graph/impl/MetadataItem.h"
 #include "orvo/filter_graph/impl/MetadataItemBase.h"

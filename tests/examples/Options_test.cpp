@@ -24,13 +24,15 @@ std::string refusal(std::initializer_list<char const*> arguments) {
 }
 
 TEST(Options, ReadsEveryOption) {
-    Options const options = parsed({"--filter", "F", "--set", "a=1,2", "--set", "b=x=y", "--precision", "16",
-                                    "--threads", "3", "--repeat", "4", "--async", "in.png", "out.png"});
+    Options const options =
+        parsed({"--filter", "F", "--set", "a=1,2", "--set", "b=x=y", "--precision", "16", "--target", "gl",
+                "--threads", "3", "--repeat", "4", "--async", "in.png", "out.png"});
     EXPECT_EQ(options.filter, "F");
     ASSERT_EQ(options.values.size(), 2u);
     EXPECT_EQ(options.values[0], std::make_pair(std::string("a"), std::string("1,2")));
     EXPECT_EQ(options.values[1], std::make_pair(std::string("b"), std::string("x=y")));
     EXPECT_EQ(options.precision, Depth::uint15_1);
+    EXPECT_EQ(options.target, Target::gl);
     EXPECT_EQ(options.threads, 3u);
     EXPECT_EQ(options.repeat, 4);
     EXPECT_TRUE(options.async);
@@ -42,6 +44,8 @@ TEST(Options, HasDefaults) {
     Options const options = parsed({"--filter", "F", "in", "out"});
     EXPECT_TRUE(options.values.empty());
     EXPECT_FALSE(options.precision.has_value());
+    EXPECT_EQ(options.target, Target::cpu);
+    EXPECT_EQ(parsed({"--filter", "F", "--target", "cpu", "in", "out"}).target, Target::cpu);
     EXPECT_EQ(options.threads, 0u);
     EXPECT_EQ(options.repeat, 1);
     EXPECT_FALSE(options.async);
@@ -62,6 +66,7 @@ TEST(Options, RefusesWithOneLine) {
     EXPECT_EQ(refusal({"--set", "a"}), "--set needs NAME=VALUE, not \"a\"");
     EXPECT_EQ(refusal({"--set", "=1"}), "--set needs NAME=VALUE, not \"=1\"");
     EXPECT_EQ(refusal({"--precision", "12"}), "--precision is 8, 16 or 32f, not \"12\"");
+    EXPECT_EQ(refusal({"--target", "gpu"}), "--target is cpu or gl, not \"gpu\"");
     EXPECT_EQ(refusal({"--threads", "0"}), "--threads needs a whole number of 1 or more, not \"0\"");
     EXPECT_EQ(refusal({"--threads", "two"}), "--threads needs a whole number of 1 or more, not \"two\"");
     EXPECT_EQ(refusal({"--repeat", "1x"}), "--repeat needs a whole number of 1 or more, not \"1x\"");

@@ -165,5 +165,34 @@ TEST(Picture, GreyIsWidenedAndReduced) {
     EXPECT_EQ(reducedToGrey(grey).pixels, grey.pixels);
 }
 
+TEST(Picture, AlphaIsAddedOpaqueAndTakenAway) {
+    Picture bytes(2, 1, 3, Depth::uint8);
+    bytes.pixels = {10, 20, 30, 40, 50, 60};
+    Picture const opaque = withAlpha(bytes);
+    EXPECT_EQ(opaque.channels, 4u);
+    EXPECT_EQ(opaque.pixels, (std::vector<unsigned char>{10, 20, 30, 255, 40, 50, 60, 255}));
+    EXPECT_EQ(withAlpha(opaque).pixels, opaque.pixels);
+    EXPECT_EQ(withoutAlpha(opaque).pixels, bytes.pixels);
+    EXPECT_EQ(withoutAlpha(bytes).pixels, bytes.pixels);
+
+    EXPECT_EQ(words(withAlpha(pictureOfWords(1, {1, 2, 3}))), (std::vector<std::uint16_t>{1, 2, 3, 32768}));
+
+    Picture grey(1, 1, 1, Depth::float32);
+    float const value = 0.25F;
+    std::memcpy(grey.pixels.data(), &value, sizeof value);
+    Picture const opaqueGrey = withAlpha(grey);
+    ASSERT_EQ(opaqueGrey.pixels.size(), 2 * sizeof(float));
+    float both[2];
+    std::memcpy(both, opaqueGrey.pixels.data(), sizeof both);
+    EXPECT_EQ(both[0], 0.25F);
+    EXPECT_EQ(both[1], 1.0F);
+}
+
+TEST(Picture, RowsAreTurnedUpsideDown) {
+    Picture picture(2, 3, 1, Depth::uint8);
+    picture.pixels = {1, 2, 3, 4, 5, 6};
+    EXPECT_EQ(upsideDown(picture).pixels, (std::vector<unsigned char>{5, 6, 3, 4, 1, 2}));
+}
+
 } // namespace
 } // namespace example

@@ -54,10 +54,25 @@ for filter in SimpleBilateralCPU RGBToLABCPU LABToRGBCPU FastBilateralFilter; do
     accepted --filter $filter "$data/chelsea.png" "$scratch/$filter.png"
 done
 
+# On OpenGL an opaque photograph that is premultiplied stays as it is.
+for variation in "" "--async --repeat 2"; do
+    # shellcheck disable=SC2086
+    accepted --target gl --filter premultiply $variation "$photograph" "$scratch/gl.png"
+    accepted --target gl --filter unpremultiply "$scratch/gl.png" "$scratch/gl_again.png"
+    cmp -s "$scratch/gl.png" "$scratch/gl_again.png" || fail "another picture on gl with $variation"
+done
+for precision in 16 32f; do
+    accepted --target gl --filter premultiply --precision $precision "$photograph" "$scratch/gl.exr"
+    [ -s "$scratch/gl.exr" ] || fail "no gl.exr with precision $precision"
+done
+accepted --target gl --filter scaleDown4channel "$photograph" "$scratch/gl_dark.png"
+cmp -s "$scratch/gl.png" "$scratch/gl_dark.png" && fail "scaleDown4channel changes nothing"
+
 accepted --list
 for line in 'FastBilateralBlur  (Motion Loft, Norvane Works, version 1)' \
     'spatialSigma  float2  default 10,10  from 0.1,0.1 to 100,100' 'rangeSigma  float  default 0.15' \
-    'colorize  bool  default false' 'input src' 'RGBToLABCPU' 'SimpleBilateralCPU'; do
+    'colorize  bool  default false' 'input src' 'RGBToLABCPU' 'SimpleBilateralCPU' \
+    'premultiply  (ORVO, Norvane, version 1)' 'runs on cpu' 'runs on gl'; do
     grep -qF "$line" "$scratch/stdout" || fail "no \"$line\" in the list"
 done
 accepted --help
@@ -65,6 +80,11 @@ grep -q '^Usage: apply_filter' "$scratch/stdout" || fail "no usage in --help"
 
 refused 2 'There is no filter "Nonsense"' --filter Nonsense "$photograph" "$scratch/out.png"
 refused 2 'has no parameter "sigma"' "${bilateral[@]}" --set sigma=1 "$photograph" "$scratch/out.png"
+refused 2 'The filter "FastBilateralBlur" does not run on gl (--list shows the targets)' "${bilateral[@]}" \
+    --target gl "$photograph" "$scratch/out.png"
+refused 2 'The filter "premultiply" does not run on cpu (--list shows the targets)' --filter premultiply \
+    "$photograph" "$scratch/out.png"
+refused 2 '--target is cpu or gl, not "gpu"' --target gpu --filter premultiply "$photograph" "$scratch/out.png"
 refused 2 'is of type float2, which "10" is not' "${bilateral[@]}" --set spatialSigma=10 "$photograph" "$scratch/out.png"
 refused 2 'is of type float, which "wide" is not' "${bilateral[@]}" --set rangeSigma=wide "$photograph" "$scratch/out.png"
 refused 2 'is of type bool, which "yes" is not' "${bilateral[@]}" --set colorize=yes "$photograph" "$scratch/out.png"
@@ -83,9 +103,14 @@ grep -qF 'warning: rangeSigma=2 is outside 0.01 to 1' "$scratch/stderr" || fail 
 # An interrupt cancels the frame: no output, status 130.
 rm -f "$scratch/out.png"
 "$program" "${bilateral[@]}" --async --repeat 100000 "$photograph" "$scratch/out.png" > /dev/null 2> "$scratch/stderr" &
-sleep 1
-kill -TERM $!
-wait $!
+program_id=$!
+for _ in $(seq 600); do # until it catches the signal: bit 14 of the mask
+    caught=$(sed -n 's/^SigCgt:\s*//p' "/proc/$program_id/status")
+    [ $((0x$caught & 0x4000)) -ne 0 ] && break
+    sleep 0.1
+done
+kill -TERM $program_id
+wait $program_id
 [ $? -eq 130 ] || fail "status of an interrupted run"
 grep -q 'cancelled, nothing was written' "$scratch/stderr" || fail "interrupt: $(cat "$scratch/stderr")"
 [ ! -e "$scratch/out.png" ] || fail "an output file after an interrupt"
