@@ -124,8 +124,9 @@ public:
     /// Throws "Enforce pSink != NULL" without a sink and "iff!=0" where a node is no image node. With true
     /// also "(pSink->imageOutput()->hasData()) == true" where the sink's output holds no image, "Not
     /// implemented: ImageCPU Pixel format not supported" for BGR8, BGRA8, half and undefined formats of that
-    /// image, "Not implemented: ImageGPU Pixel format not supported" for the undefined one, "Enforce pOutput != NULL" and "Enforce pSource != NULL" as the passes do, no node having
-    /// changed by then, and what `ImageFilter::computeImageDescriptorInfo` throws.
+    /// image, "Not implemented: ImageGPU Pixel format not supported" for the undefined one, "Enforce pOutput
+    /// != NULL" and "Enforce pSource != NULL" as the passes do, no node having changed by then, and what
+    /// `ImageFilter::computeImageDescriptorInfo` throws.
     void setNodeImageDescriptorInfo(bool fromSink);
 
 protected:
