@@ -464,14 +464,6 @@ struct BoundDiamond : Diamond {
     ImageCPU oImage_;
 };
 
-TEST_F(ImageFlowControllerTest, aSinkOnTheGPUSaysNothingAboutCPUFormats) {
-    BoundDiamond graph;
-    graph.d.outputTarget_ = ORVO_TARGET_GL;
-    ORVO_EXPECT_INTERNAL(graph.oController_.setNodeImageDescriptorInfo(true),
-                         "Not implemented: ImageGPU Pixel format not supported");
-    graph.d.outputTarget_ = ORVO_TARGET_CPU;
-}
-
 TEST_F(ImageFlowControllerTest, aFailureLeavesThePrecisionOfAllNodes) {
     BoundDiamond graph;
     auto const expectUntouched = [&] {
