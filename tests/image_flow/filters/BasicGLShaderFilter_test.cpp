@@ -98,9 +98,9 @@ TEST_F(BasicGLShaderFilterTest, HasTheInputsAndParametersThatAreAdded) {
 TEST_F(BasicGLShaderFilterTest, TellsTheProgramWhereItsImagesLie) {
     // Two inputs of other pixel extents, the first in a texture of 16 by 8 pixels.
     ImageGPUPtr const upA =
-        textureOf(randomPicture(pixels(-3, 5, 13, 7), 1, {0.5f, 2.0f}), ImageGPU::PIXEL_FORMAT_RGBA8, false);
+        textureOf(randomTexels(pixels(-3, 5, 13, 7), 1, {0.5f, 2.0f}), ImageGPU::PIXEL_FORMAT_RGBA8, false);
     ImageGPUPtr const upB =
-        textureOf(randomPicture(pixels(4, -6, 4, 8), 2, {4.0f, 1.0f}), ImageGPU::PIXEL_FORMAT_RGBA8);
+        textureOf(randomTexels(pixels(4, -6, 4, 8), 2, {4.0f, 1.0f}), ImageGPU::PIXEL_FORMAT_RGBA8);
     std::string const sAll = "vec4(a_pixelExtent, b_pixelExtent)+vec4(a_pixelAspectRatio)+"
                              "vec4(b_pixelAspectRatio)+" +
                              readInput("a") + "+" + readInput("b");
@@ -138,7 +138,7 @@ TEST_F(BasicGLShaderFilterTest, TellsTheProgramWhereItsImagesLie) {
 }
 
 TEST_F(BasicGLShaderFilterTest, BindsItsInputsBehindUnitZeroAndUnbindsThem) {
-    ImageGPUPtr const upInput = textureOf(randomPicture(pixels(0, 0, 4, 4), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 4, 4), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
     ShaderNode node(copyShader());
     bool bSeen = false;
     node.onPreProcessed_ = [&] {
@@ -174,24 +174,23 @@ TEST_F(BasicGLShaderFilterTest, BindsItsInputsBehindUnitZeroAndUnbindsThem) {
 }
 
 TEST_F(BasicGLShaderFilterTest, GivesAnImageOnTwoInputsOneUnit) {
-    ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(-2, 0, 9, 5), 3), ImageGPU::PIXEL_FORMAT_RGBA8);
-    Picture const input(*upInput);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(-2, 0, 9, 5), 3), ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const input(*upInput);
     ShaderNode node(shaderOf({"a", "b"}, "0.25*" + readInput("a") + "+0.5*" + readInput("b")), {"a", "b"});
     node.onPreProcessed_ = [&] { EXPECT_EQ(2, node.texUnitCount_); };
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
     road.setInput(1, *upInput);
-    Picture const actual(*road.run(world(-2, 0, 9, 5)));
+    Texels const actual(*road.run(world(-2, 0, 9, 5)));
     EXPECT_EQ(1, node.texUnitCount_);
     EXPECT_EQ(-1, upInput->boundTexUnit());
-    Picture const expected = Picture(pixels(-2, 0, 9, 5)).fill([&](int x, int y) {
+    Texels const expected = Texels(pixels(-2, 0, 9, 5)).fill([&](int x, int y) {
         Pixel pixel = input.at(x, y);
         for (double& value : pixel)
             value *= 0.75;
         return pixel;
     });
-    expectPicture(actual, expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+    expectTexels(actual, expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
 }
 
 TEST_F(BasicGLShaderFilterTest, RunsAProgramWithoutAnyOfTheUniforms) {
@@ -201,7 +200,7 @@ TEST_F(BasicGLShaderFilterTest, RunsAProgramWithoutAnyOfTheUniforms) {
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
     // The coordinate counts the output's own pixels, wherever it lies.
-    Picture const actual(*road.run(world(1, 1, 2, 2)));
+    Texels const actual(*road.run(world(1, 1, 2, 2)));
     EXPECT_EQ((Pixel{0.03125, 0.03125, 0.5, 1.0}), actual.at(1, 1));
     EXPECT_EQ((Pixel{0.09375, 0.03125, 0.5, 1.0}), actual.at(2, 1));
     EXPECT_EQ((Pixel{0.03125, 0.09375, 0.5, 1.0}), actual.at(1, 2));
@@ -251,7 +250,7 @@ TEST_F(BasicGLShaderFilterTest, ChoosesItsFormatByHintAndChannels) {
 
 TEST_F(BasicGLShaderFilterTest, RoundsItsTextureUpUnlessItIsToBeExact) {
     for (bool const bExact : {false, true}) {
-        ImageGPUPtr const upInput = textureOf(Picture(pixels(0, 0, 5, 3)).fill([](int, int) {
+        ImageGPUPtr const upInput = textureOf(Texels(pixels(0, 0, 5, 3)).fill([](int, int) {
             return Pixel{1, 1, 1, 1};
         }),
                                               ImageGPU::PIXEL_FORMAT_RGBA8);
@@ -266,7 +265,7 @@ TEST_F(BasicGLShaderFilterTest, RoundsItsTextureUpUnlessItIsToBeExact) {
             continue;
         ImageGPU whole(pixels(0, 0, 8, 4), const_cast<OGL::Texture2D*>(pOutput->texture()),
                        PixelExtentInWorldSpace());
-        Picture const texture(whole);
+        Texels const texture(whole);
         whole.forgetTexture();
         for (int y = 0; y < 4; ++y)
             for (int x = 0; x < 8; ++x)
@@ -301,23 +300,23 @@ TEST_F(BasicGLShaderFilterTest, PutsAnUndefinedRegionAtItsPosition) {
 
 TEST_F(BasicGLShaderFilterTest, DrawsIntoABoundImageAndTouchesNothingElse) {
     ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(-2, -2, 9, 9), 9), ImageGPU::PIXEL_FORMAT_RGBA8);
+        textureOf(randomTexels(pixels(-2, -2, 9, 9), 9), ImageGPU::PIXEL_FORMAT_RGBA8);
     ImageGPUPtr const upTarget =
-        textureOf(randomPicture(pixels(-4, -3, 11, 7), 10), ImageGPU::PIXEL_FORMAT_RGBA8, false);
-    Picture const input(*upInput);
-    Picture const before(*upTarget);
+        textureOf(randomTexels(pixels(-4, -3, 11, 7), 10), ImageGPU::PIXEL_FORMAT_RGBA8, false);
+    Texels const input(*upInput);
+    Texels const before(*upTarget);
     ShaderNode node(copyShader());
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
     road.runInto(*upTarget, world(-1, -2, 4, 5));
-    Picture const region(pixels(-1, -2, 4, 5));
-    Picture const expected = Picture(upTarget->positionExtent()).fill([&](int x, int y) {
+    Texels const region(pixels(-1, -2, 4, 5));
+    Texels const expected = Texels(upTarget->positionExtent()).fill([&](int x, int y) {
         return region.contains(x, y) ? input.at(x, y) : before.at(x, y);
     });
-    expectPicture(Picture(*upTarget), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+    expectTexels(Texels(*upTarget), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
     ORVO_EXPECT_INTERNAL(road.runInto(*upTarget, world(-2, -2, 9, 9)),
                          "Compute region lies outside the bound output image");
-    expectPicture(Picture(*upTarget), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+    expectTexels(Texels(*upTarget), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
 }
 
 TEST_F(BasicGLShaderFilterTest, ReadsUniformArraysForOnePass) {
@@ -340,7 +339,7 @@ TEST_F(BasicGLShaderFilterTest, ReadsUniformArraysForOnePass) {
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
     for (int iFrame = 0; iFrame < 2; ++iFrame) {
-        Picture const actual(*road.run(world(0, 0, 3, 1)));
+        Texels const actual(*road.run(world(0, 0, 3, 1)));
         for (int x = 0; x < 3; ++x) {
             EXPECT_EQ(double(aFirst[static_cast<std::size_t>(x)]), actual.at(x, 0)[0]);
             EXPECT_EQ(0.5, actual.at(x, 0)[1]);
@@ -364,7 +363,7 @@ void refuseValidation(GLuint program, GLenum what, GLint* pValue) {
 }
 
 TEST_F(BasicGLShaderFilterTest, DrawsAlsoWithAProgramThatDoesNotValidate) {
-    ImageGPUPtr const upInput = textureOf(randomPicture(pixels(0, 0, 7, 5), 4), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 7, 5), 4), ImageGPU::PIXEL_FORMAT_RGBA8);
     ShaderNode node(copyShader());
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
@@ -373,7 +372,7 @@ TEST_F(BasicGLShaderFilterTest, DrawsAlsoWithAProgramThatDoesNotValidate) {
     ImageGPU const* const pOutput = road.run(world(0, 0, 7, 5));
     epoxy_glGetProgramiv = pGetProgramiv;
     EXPECT_EQ(1, nValidations);
-    expectPicture(Picture(*pOutput), Picture(*upInput), Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+    expectTexels(Texels(*pOutput), Texels(*upInput), Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
 }
 
 TEST_F(BasicGLShaderFilterTest, SaysWhenItIsRunWhyItDidNotCompile) {
@@ -414,7 +413,7 @@ TEST_F(BasicGLShaderFilterTest, RefusesAnInfiniteRegion) {
 }
 
 TEST_F(BasicGLShaderFilterTest, SaysWhatIsWrongWithTheFramebuffer) {
-    ImageGPUPtr const upInput = textureOf(randomPicture(pixels(0, 0, 4, 4), 4), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 4, 4), 4), ImageGPU::PIXEL_FORMAT_RGBA8);
     ShaderNode node(copyShader(), {"src"}, 3);
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
@@ -437,8 +436,8 @@ TEST_F(BasicGLShaderFilterTest, SaysWhatIsWrongWithTheFramebuffer) {
 
 TEST_F(BasicGLShaderFilterTest, LooksUniformsUpOnceALink) {
     ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(-1, -1, 7, 5), 5), ImageGPU::PIXEL_FORMAT_RGBA8);
-    Picture const input(*upInput);
+        textureOf(randomTexels(pixels(-1, -1, 7, 5), 5), ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const input(*upInput);
     ShaderNode node(copyShader());
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
@@ -449,30 +448,28 @@ TEST_F(BasicGLShaderFilterTest, LooksUniformsUpOnceALink) {
     auto const nTextures = GLHooks::calls("glGenTextures");
     auto const nLookUps = GLHooks::calls("glGetUniformLocation");
     for (int i = 0; i < 3; ++i)
-        expectPicture(Picture(*road.run(world(-1, -1, 7, 5))), input,
-                      Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+        expectTexels(Texels(*road.run(world(-1, -1, 7, 5))), input,
+                     Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
     EXPECT_EQ(nLinks, GLHooks::calls("glLinkProgram"));
     EXPECT_EQ(nTextures, GLHooks::calls("glGenTextures"));
     EXPECT_EQ(nLookUps, GLHooks::calls("glGetUniformLocation"));
 
     // A program that was discarded, and one with its uniforms in other places.
     ShaderManagerOGL::Instance()->clearAll();
-    expectPicture(Picture(*road.run(world(-1, -1, 7, 5))), input,
-                  Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+    expectTexels(Texels(*road.run(world(-1, -1, 7, 5))), input, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
     EXPECT_EQ(nLinks + 1, GLHooks::calls("glLinkProgram"));
     node.oProgram_.removeAllShaders();
     node.sFragmentSource_ =
         shaderOf({"src"}, readInput("src") + "+vec4(before[0]+before[3])", "uniform float before[4];\n");
     node.compilePrograms();
-    expectPicture(Picture(*road.run(world(-1, -1, 7, 5))), input,
-                  Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+    expectTexels(Texels(*road.run(world(-1, -1, 7, 5))), input, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
 }
 
 TEST_F(BasicGLShaderFilterTest, ChainsItsImages) {
     // Each reads its right neighbour: over the edge of an image in a larger texture comes transparent black.
     ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(-3, 2, 11, 6), 6), ImageGPU::PIXEL_FORMAT_RGBA8);
-    Picture const input(*upInput);
+        textureOf(randomTexels(pixels(-3, 2, 11, 6), 6), ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const input(*upInput);
     std::string const sNext = shaderOf({"src"}, readInput("src", "vec2(src_pixelExtent.x, 0.0)"));
     ShaderNode first(sNext);
     ShaderNode second(sNext);
@@ -485,16 +482,15 @@ TEST_F(BasicGLShaderFilterTest, ChainsItsImages) {
     road.controller().setImageSink(sink);
     road.setInput(0, *upInput);
     road.launch(world(-3, 2, 11, 6));
-    Picture const expected =
-        Picture(pixels(-3, 2, 11, 6)).fill([&](int x, int y) { return input.at(x + 2, y); });
-    expectPicture(Picture(*sink.getImageGPU()), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+    Texels const expected =
+        Texels(pixels(-3, 2, 11, 6)).fill([&](int x, int y) { return input.at(x + 2, y); });
+    expectTexels(Texels(*sink.getImageGPU()), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
     sink.disconnect();
 }
 
 TEST_F(BasicGLShaderFilterTest, AFailedFrameDoesNotSpoilTheNext) {
-    ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(0, 0, 9, 5), 11), ImageGPU::PIXEL_FORMAT_RGBA8);
-    Picture const input(*upInput);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 9, 5), 11), ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const input(*upInput);
     std::array<float, 2> aOne{1.0f, 1.0f};
     ShaderNode node(shaderOf({"src"}, readInput("src") + "*texture1D(one_sampler, 0.5)",
                              "uniform sampler1D one_sampler;\n"));
@@ -518,8 +514,8 @@ TEST_F(BasicGLShaderFilterTest, AFailedFrameDoesNotSpoilTheNext) {
         }
         EXPECT_EQ(0U, drainErrors());
         EXPECT_EQ(0, integerOf(GL_TEXTURE_BINDING_2D));
-        expectPicture(Picture(*road.run(world(0, 0, 9, 5))), input,
-                      Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+        expectTexels(Texels(*road.run(world(0, 0, 9, 5))), input,
+                     Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
         EXPECT_EQ(-1, upInput->boundTexUnit());
         EXPECT_EQ(1, node.texUnitCount_);
         return bFailed;
@@ -540,8 +536,7 @@ TEST_F(BasicGLShaderFilterTest, AFailedFrameDoesNotSpoilTheNext) {
 }
 
 TEST_F(BasicGLShaderFilterTest, AFailureOfASubclassDoesNotSpoilTheNextFrame) {
-    ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(0, 0, 9, 5), 12), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 9, 5), 12), ImageGPU::PIXEL_FORMAT_RGBA8);
     std::array<float, 2> aOne{1.0f, 1.0f};
     ShaderNode node(copyShader());
     ShaderRoad road(frameContext(), node);
@@ -559,14 +554,13 @@ TEST_F(BasicGLShaderFilterTest, AFailureOfASubclassDoesNotSpoilTheNextFrame) {
             EXPECT_TRUE(node.vspUniformArrays_.empty());
         }
         node.onPreProcessed_ = nullptr;
-        expectPicture(Picture(*road.run(world(0, 0, 9, 5))), Picture(*upInput),
-                      Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+        expectTexels(Texels(*road.run(world(0, 0, 9, 5))), Texels(*upInput),
+                     Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
     }
 }
 
 TEST_F(BasicGLShaderFilterTest, DiesInTheMidstOfAPassWithoutLeavingAnything) {
-    ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(0, 0, 9, 5), 12), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 9, 5), 12), ImageGPU::PIXEL_FORMAT_RGBA8);
     long const nTextures = textures();
     {
         ShaderNode node(copyShader());

@@ -43,20 +43,20 @@ protected:
     ImageGPU::tePixelFormat format() const { return aFormats[GetParam()]; }
 
     /// A frame into a bound image of the format that covers the place's output rectangle.
-    Picture run(ImageFilter& filter, Place const& place, std::vector<ImageGPU*> const& vpInputs) {
+    Texels run(ImageFilter& filter, Place const& place, std::vector<ImageGPU*> const& vpInputs) {
         ImageGPUPtr const upTarget(ORVO_NEW ImageGPU(place.oOutput_, format(), place.oPixelExtent_, true));
         ShaderRoad road(frameContext(), filter);
         for (std::size_t i = 0; i < vpInputs.size(); ++i)
             road.setInput(i, *vpInputs[i]);
         road.runInto(*upTarget, pixelToWorldSpace(place.oOutput_, place.oPixelExtent_));
-        return Picture(*upTarget);
+        return Texels(*upTarget);
     }
 
     /// The result must be what the function gives for each pixel.
     template <typename Function>
-    void expect(Picture const& actual, Place const& place, Function const& function) {
-        expectPicture(actual, Picture(place.oOutput_, place.oPixelExtent_).fill(function),
-                      Precision::of(format()));
+    void expect(Texels const& actual, Place const& place, Function const& function) {
+        expectTexels(actual, Texels(place.oOutput_, place.oPixelExtent_).fill(function),
+                     Precision::of(format()));
     }
 };
 
@@ -66,8 +66,8 @@ TEST_P(ShaderFilterReferenceTest, GainAndOffset) {
         ShaderNode node(shaderOf({"src"}, readInput("src") + "*gain + vec4(0.0625, 0.0, -0.125, 0.25)",
                                  "uniform float gain;\n"));
         node.onUniforms_ = [](OGL::Program& program) { program.setUniform("gain", 0.75f); };
-        ImageGPUPtr const upInput = textureOf(randomPicture(place.oInput_, 1, place.oPixelExtent_), format());
-        Picture const input(*upInput);
+        ImageGPUPtr const upInput = textureOf(randomTexels(place.oInput_, 1, place.oPixelExtent_), format());
+        Texels const input(*upInput);
         expect(run(node, place, {upInput.get()}), place, [&](int x, int y) {
             Pixel const p = input.at(x, y);
             return Pixel{0.75 * p[0] + 0.0625, 0.75 * p[1], 0.75 * p[2] - 0.125, 0.75 * p[3] + 0.25};
@@ -82,8 +82,8 @@ TEST_P(ShaderFilterReferenceTest, NeighboursOverTheEdge) {
         ShaderNode node(shaderOf({"src"}, "0.25*" + readInput("src") + "+0.5*" +
                                               readInput("src", "vec2(-src_pixelExtent.x, 0.0)") + "+0.25*" +
                                               readInput("src", "vec2(0.0, src_pixelExtent.y)")));
-        ImageGPUPtr const upInput = textureOf(randomPicture(place.oInput_, 2, place.oPixelExtent_), format());
-        Picture const input(*upInput);
+        ImageGPUPtr const upInput = textureOf(randomTexels(place.oInput_, 2, place.oPixelExtent_), format());
+        Texels const input(*upInput);
         expect(run(node, place, {upInput.get()}), place, [&](int x, int y) {
             Pixel pixel{};
             for (std::size_t c = 0; c < 4; ++c)
@@ -104,10 +104,10 @@ TEST_P(ShaderFilterReferenceTest, TwoInputsAtDifferentPlaces) {
         PositionExtentInPixelSpace const moved =
             pixels(where.position().x() + 2, where.position().y() - 3, where.extent().width() + 4,
                    where.extent().height() + 1);
-        ImageGPUPtr const upA = textureOf(randomPicture(where, 3, place.oPixelExtent_), format());
-        ImageGPUPtr const upB = textureOf(randomPicture(moved, 4, place.oPixelExtent_), format());
-        Picture const a(*upA);
-        Picture const b(*upB);
+        ImageGPUPtr const upA = textureOf(randomTexels(where, 3, place.oPixelExtent_), format());
+        ImageGPUPtr const upB = textureOf(randomTexels(moved, 4, place.oPixelExtent_), format());
+        Texels const a(*upA);
+        Texels const b(*upB);
         expect(run(node, place, {upA.get(), upB.get()}), place, [&](int x, int y) {
             Pixel const p = a.at(x, y);
             Pixel const q = b.at(x, y);
@@ -124,11 +124,11 @@ TEST_P(ShaderFilterReferenceTest, InterpolatesAnInputOfLargerPixels) {
     PixelExtentInWorldSpace const large(2.0f, 1.5f);
     Place const place{"", pixels(-4, -3, 11, 9), small, pixels(-4, -3, 11, 9)};
     ShaderNode node(shaderOf({"a", "b"}, "0.25*" + readInput("a") + "+0.5*" + readInput("b")), {"a", "b"});
-    ImageGPUPtr const upA = textureOf(randomPicture(place.oInput_, 5, small), format());
-    ImageGPUPtr const upB = textureOf(randomPicture(pixels(-2, -1, 5, 4), 6, large), format());
-    Picture const a(*upA);
-    Picture const b(*upB);
-    Picture const expected = Picture(place.oOutput_, small).fill([&](int x, int y) {
+    ImageGPUPtr const upA = textureOf(randomTexels(place.oInput_, 5, small), format());
+    ImageGPUPtr const upB = textureOf(randomTexels(pixels(-2, -1, 5, 4), 6, large), format());
+    Texels const a(*upA);
+    Texels const b(*upB);
+    Texels const expected = Texels(place.oOutput_, small).fill([&](int x, int y) {
         auto const [worldX, worldY] = a.middle(x, y);
         Pixel const q = b.sample(worldX, worldY);
         Pixel pixel{};
@@ -140,15 +140,15 @@ TEST_P(ShaderFilterReferenceTest, InterpolatesAnInputOfLargerPixels) {
     // Drivers interpolate 8-bit texels with 8-bit weights: one more step.
     if (format() == ImageGPU::PIXEL_FORMAT_RGBA8)
         precision.dAbsolute_ *= 2;
-    expectPicture(run(node, place, {upA.get(), upB.get()}), expected, precision);
+    expectTexels(run(node, place, {upA.get(), upB.get()}), expected, precision);
 }
 
 TEST_P(ShaderFilterReferenceTest, IntoImagesOfItsOwn) {
     // Each precision that a hint asks for, with three and with four channels, from each format.
     using Hint = ImageFilter::teOutputPrecisionHint;
     Place const place{"", pixels(-5, 3, 15, 9), {0.5f, 0.25f}, pixels(-3, 4, 11, 7)};
-    ImageGPUPtr const upInput = textureOf(randomPicture(place.oInput_, 8, place.oPixelExtent_), format());
-    Picture const input(*upInput);
+    ImageGPUPtr const upInput = textureOf(randomTexels(place.oInput_, 8, place.oPixelExtent_), format());
+    Texels const input(*upInput);
     for (Hint const eHint : {Hint::OUTPUT_PRECISION_8_BIT_INT, Hint::OUTPUT_PRECISION_16_BIT_INT,
                              Hint::OUTPUT_PRECISION_16_BIT_FLOAT}) {
         for (int const nChannels : {3, 4}) {
@@ -158,14 +158,14 @@ TEST_P(ShaderFilterReferenceTest, IntoImagesOfItsOwn) {
             ShaderRoad road(frameContext(), node);
             road.setInput(0, *upInput);
             ImageGPU const* const pOutput = road.run(pixelToWorldSpace(place.oOutput_, place.oPixelExtent_));
-            Picture const expected = Picture(place.oOutput_, place.oPixelExtent_).fill([&](int x, int y) {
+            Texels const expected = Texels(place.oOutput_, place.oPixelExtent_).fill([&](int x, int y) {
                 Pixel pixel = input.at(x, y);
                 for (double& value : pixel)
                     value = 0.875 * value + 0.0625;
                 return pixel;
             });
             SCOPED_TRACE(nameOf(pOutput->pixelFormat()));
-            expectPicture(Picture(*pOutput), expected, Precision::of(pOutput->pixelFormat()));
+            expectTexels(Texels(*pOutput), expected, Precision::of(pOutput->pixelFormat()));
         }
     }
 }

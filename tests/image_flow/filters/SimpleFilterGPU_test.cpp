@@ -108,16 +108,16 @@ TEST_F(SimpleFilterGPUTest, DrawsThePartOfItsInputThatIsAskedFor) {
             CopyNode node;
             ShaderRoad road(frameContext(), node);
             ImageGPUPtr const upInput =
-                textureOf(randomPicture(row.oInput_, 7, row.oPixelExtent_), format, row.bExactInput_);
-            Picture const input(*upInput);
+                textureOf(randomTexels(row.oInput_, 7, row.oPixelExtent_), format, row.bExactInput_);
+            Texels const input(*upInput);
             road.setInput(0, *upInput);
             ImageGPU const* const pOutput = road.run(pixelToWorldSpace(row.oOutput_, row.oPixelExtent_));
             ASSERT_NE(nullptr, pOutput);
             EXPECT_EQ(format, pOutput->pixelFormat());
             EXPECT_EQ(row.oPixelExtent_, pOutput->pixelExtent());
-            Picture const expected =
-                Picture(row.oOutput_, row.oPixelExtent_).fill([&](int x, int y) { return input.at(x, y); });
-            expectPicture(Picture(*pOutput), expected, Precision::of(format));
+            Texels const expected =
+                Texels(row.oOutput_, row.oPixelExtent_).fill([&](int x, int y) { return input.at(x, y); });
+            expectTexels(Texels(*pOutput), expected, Precision::of(format));
             EXPECT_EQ(-1, upInput->boundTexUnit());
         }
     }
@@ -210,7 +210,7 @@ TEST_F(SimpleFilterGPUTest, NeedsAControllerWithAContext) {
 TEST_F(SimpleFilterGPUTest, SetsUpQuadMatricesAndViewportByTheCapacities) {
     // The input's texture is 16 by 8 pixels, the output's 8 by 4.
     ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(-3, 2, 13, 7), 8), ImageGPU::PIXEL_FORMAT_RGBA8, false);
+        textureOf(randomTexels(pixels(-3, 2, 13, 7), 8), ImageGPU::PIXEL_FORMAT_RGBA8, false);
     CopyNode node;
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
@@ -243,13 +243,13 @@ TEST_F(SimpleFilterGPUTest, SetsUpQuadMatricesAndViewportByTheCapacities) {
 }
 
 TEST_F(SimpleFilterGPUTest, BlackensItsTextureBeyondTheImage) {
-    ImageGPUPtr const upInput = textureOf(Picture(pixels(0, 0, 5, 3)).fill([](int, int) {
+    ImageGPUPtr const upInput = textureOf(Texels(pixels(0, 0, 5, 3)).fill([](int, int) {
         return Pixel{1, 1, 1, 1};
     }),
                                           ImageGPU::PIXEL_FORMAT_RGBA8);
     {
         // A texture of the size class with other content waits in the pool.
-        ImageGPUPtr const upOther = textureOf(Picture(pixels(0, 0, 8, 4)).fill([](int, int) {
+        ImageGPUPtr const upOther = textureOf(Texels(pixels(0, 0, 8, 4)).fill([](int, int) {
             return Pixel{1, 1, 1, 1};
         }),
                                               ImageGPU::PIXEL_FORMAT_RGBA8);
@@ -262,7 +262,7 @@ TEST_F(SimpleFilterGPUTest, BlackensItsTextureBeyondTheImage) {
     EXPECT_EQ(nTextures, GLHooks::calls("glGenTextures"));
     ImageGPU whole(pixels(0, 0, 8, 4), const_cast<OGL::Texture2D*>(pOutput->texture()),
                    PixelExtentInWorldSpace());
-    Picture const texture(whole);
+    Texels const texture(whole);
     whole.forgetTexture();
     for (int y = 0; y < 4; ++y)
         for (int x = 0; x < 8; ++x)
@@ -271,36 +271,36 @@ TEST_F(SimpleFilterGPUTest, BlackensItsTextureBeyondTheImage) {
 
 TEST_F(SimpleFilterGPUTest, DrawsIntoABoundImageAndTouchesNothingElse) {
     ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(-2, -2, 9, 9), 9), ImageGPU::PIXEL_FORMAT_RGBA8);
+        textureOf(randomTexels(pixels(-2, -2, 9, 9), 9), ImageGPU::PIXEL_FORMAT_RGBA8);
     ImageGPUPtr const upTarget =
-        textureOf(randomPicture(pixels(-4, -3, 11, 7), 10), ImageGPU::PIXEL_FORMAT_RGBA8, false);
-    Picture const input(*upInput);
-    Picture const before(*upTarget);
+        textureOf(randomTexels(pixels(-4, -3, 11, 7), 10), ImageGPU::PIXEL_FORMAT_RGBA8, false);
+    Texels const input(*upInput);
+    Texels const before(*upTarget);
     CopyNode node;
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
     road.runInto(*upTarget, world(-1, -2, 4, 5));
-    Picture const region(pixels(-1, -2, 4, 5));
-    Picture const expected = Picture(upTarget->positionExtent()).fill([&](int x, int y) {
+    Texels const region(pixels(-1, -2, 4, 5));
+    Texels const expected = Texels(upTarget->positionExtent()).fill([&](int x, int y) {
         return region.contains(x, y) ? input.at(x, y) : before.at(x, y);
     });
-    expectPicture(Picture(*upTarget), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+    expectTexels(Texels(*upTarget), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
     EXPECT_EQ(upTarget.get(), node.oOutput_.get());
 }
 
 TEST_F(SimpleFilterGPUTest, RefusesARegionOutsideTheBoundImage) {
-    ImageGPUPtr const upInput = textureOf(randomPicture(pixels(0, 0, 9, 9), 9), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 9, 9), 9), ImageGPU::PIXEL_FORMAT_RGBA8);
     ImageGPUPtr const upTarget =
-        textureOf(randomPicture(pixels(0, 0, 5, 5), 10), ImageGPU::PIXEL_FORMAT_RGBA8);
-    Picture const before(*upTarget);
+        textureOf(randomTexels(pixels(0, 0, 5, 5), 10), ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const before(*upTarget);
     CopyNode node;
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
     ORVO_EXPECT_INTERNAL(road.runInto(*upTarget, world(0, 0, 6, 5)),
                          "Compute region lies outside the bound output image");
-    EXPECT_EQ("", differences(Picture(*upTarget), before, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
+    EXPECT_EQ("", differences(Texels(*upTarget), before, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
     road.runInto(*upTarget, world(0, 0, 5, 5));
-    EXPECT_NE("", differences(Picture(*upTarget), before, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
+    EXPECT_NE("", differences(Texels(*upTarget), before, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
 }
 
 TEST_F(SimpleFilterGPUTest, SaysWhatIsWrongWithTheFramebuffer) {
@@ -334,9 +334,8 @@ TEST_F(SimpleFilterGPUTest, SaysWhatIsWrongWithTheFramebuffer) {
 }
 
 TEST_F(SimpleFilterGPUTest, AFailedFrameDoesNotSpoilTheNext) {
-    ImageGPUPtr const upInput =
-        textureOf(randomPicture(pixels(0, 0, 9, 5), 11), ImageGPU::PIXEL_FORMAT_RGBA8);
-    Picture const input(*upInput);
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 9, 5), 11), ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const input(*upInput);
     CopyNode node;
     ShaderRoad road(frameContext(), node);
     road.setInput(0, *upInput);
@@ -361,8 +360,8 @@ TEST_F(SimpleFilterGPUTest, AFailedFrameDoesNotSpoilTheNext) {
             break;
         ASSERT_LT(n, 99U);
         EXPECT_EQ(-1, upInput->boundTexUnit()) << sFailed;
-        expectPicture(Picture(*road.run(world(0, 0, 9, 5))), input,
-                      Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+        expectTexels(Texels(*road.run(world(0, 0, 9, 5))), input,
+                     Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
         EXPECT_EQ(nTextures, textures()) << sFailed;
     }
 }

@@ -44,16 +44,16 @@ private:
 using Pixel = std::array<double, 4>;
 
 /// Four channels in double, red first; transparent black outside.
-class Picture {
+class Texels {
 public:
-    explicit Picture(PositionExtentInPixelSpace const& region,
-                     PixelExtentInWorldSpace const& pixelExtent = PixelExtentInWorldSpace())
+    explicit Texels(PositionExtentInPixelSpace const& region,
+                    PixelExtentInWorldSpace const& pixelExtent = PixelExtentInWorldSpace())
         : oRegion_(region),
           oPixelExtent_(pixelExtent),
           aPixels_(static_cast<std::size_t>(width()) * static_cast<std::size_t>(height())) {}
 
     /// What the image's texture holds of its rectangle.
-    explicit Picture(ImageGPU const& image) : Picture(image.positionExtent(), image.pixelExtent()) {
+    explicit Texels(ImageGPU const& image) : Texels(image.positionExtent(), image.pixelExtent()) {
         std::vector<unsigned char> const aBytes = readTexels(image, ImageGPU::PIXEL_FORMAT_RGBA32F);
         std::vector<float> aValues(aBytes.size() / sizeof(float));
         std::memcpy(aValues.data(), aBytes.data(), aBytes.size());
@@ -64,7 +64,7 @@ public:
 
     /// Each pixel from its position in pixel space.
     template <typename Function>
-    Picture& fill(Function const& function) {
+    Texels& fill(Function const& function) {
         for (int y = top(); y < top() + height(); ++y)
             for (int x = left(); x < left() + width(); ++x)
                 at(x, y) = function(x, y);
@@ -85,7 +85,7 @@ public:
         return aPixels_[static_cast<std::size_t>(y - top()) * static_cast<std::size_t>(width()) +
                         static_cast<std::size_t>(x - left())];
     }
-    Pixel at(int x, int y) const { return contains(x, y) ? const_cast<Picture*>(this)->at(x, y) : Pixel{}; }
+    Pixel at(int x, int y) const { return contains(x, y) ? const_cast<Texels*>(this)->at(x, y) : Pixel{}; }
 
     /// The linear interpolation at a world position.
     Pixel sample(double worldX, double worldY) const {
@@ -114,15 +114,15 @@ private:
 };
 
 /// Values from -0.5 to 1.5, the same for the same seed.
-inline Picture randomPicture(PositionExtentInPixelSpace const& region, unsigned seed,
-                             PixelExtentInWorldSpace const& pixelExtent = PixelExtentInWorldSpace()) {
+inline Texels randomTexels(PositionExtentInPixelSpace const& region, unsigned seed,
+                           PixelExtentInWorldSpace const& pixelExtent = PixelExtentInWorldSpace()) {
     std::mt19937 engine(seed);
     auto const next = [&] { return static_cast<double>(engine()) / 2147483648.0 - 0.5; };
-    return Picture(region, pixelExtent).fill([&](int, int) { return Pixel{next(), next(), next(), next()}; });
+    return Texels(region, pixelExtent).fill([&](int, int) { return Pixel{next(), next(), next(), next()}; });
 }
 
 /// The picture in a texture, in which OpenGL rounds it to the format.
-inline ImageGPUPtr textureOf(Picture const& picture, ImageGPU::tePixelFormat format, bool exact = true) {
+inline ImageGPUPtr textureOf(Texels const& picture, ImageGPU::tePixelFormat format, bool exact = true) {
     ImageGPUPtr upImage(ORVO_NEW ImageGPU(picture.region(), format, picture.pixelExtent(), exact));
     std::vector<float> aValues;
     for (int y = picture.top(); y < picture.top() + picture.height(); ++y)
@@ -164,7 +164,7 @@ struct Precision {
 };
 
 /// Empty if all pixels are as expected, else the first that is not, and their number.
-inline std::string differences(Picture const& actual, Picture const& expected, Precision const& precision) {
+inline std::string differences(Texels const& actual, Texels const& expected, Precision const& precision) {
     if (actual.region() != expected.region())
         return "another rectangle";
     std::ostringstream text;
@@ -181,9 +181,9 @@ inline std::string differences(Picture const& actual, Picture const& expected, P
 }
 
 /// The mistakes that a comparison must find: each a name and the picture with that mistake.
-inline std::vector<std::pair<std::string, Picture>> mistakesIn(Picture const& expected) {
+inline std::vector<std::pair<std::string, Texels>> mistakesIn(Texels const& expected) {
     auto const changed = [&](auto const& function) {
-        return Picture(expected.region(), expected.pixelExtent()).fill(function);
+        return Texels(expected.region(), expected.pixelExtent()).fill(function);
     };
     int const lastRow = expected.top() + expected.height() - 1;
     return {
@@ -204,7 +204,7 @@ inline std::vector<std::pair<std::string, Picture>> mistakesIn(Picture const& ex
 }
 
 /// The result must be as expected, and the comparison must see each of the mistakes.
-inline void expectPicture(Picture const& actual, Picture const& expected, Precision const& precision) {
+inline void expectTexels(Texels const& actual, Texels const& expected, Precision const& precision) {
     EXPECT_EQ("", differences(actual, expected, precision));
     for (auto const& [sName, mistake] : mistakesIn(expected))
         EXPECT_NE("", differences(actual, mistake, precision)) << "does not see: " << sName;
