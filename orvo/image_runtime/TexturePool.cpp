@@ -234,7 +234,7 @@ void TexturePool::enforceMaximumPoolSize() {
 
 void TexturePool::evict() {
     while (oFreeList1D_.size() != 0 || oFreeList2D_.size() != 0 || oFreeList3D_.size() != 0 ||
-           oFreeListRECT_.size() != 0 || vpTransferClientStorage_.size() != 0) {
+           oFreeListRECT_.size() != 0 || !vpTransferClientStorage_.empty()) {
         deleteFront(oFreeList1D_);
         std::size_t const nFreed2D = deleteFront(oFreeList2D_);
         deleteFront(oFreeList3D_);
@@ -245,7 +245,7 @@ void TexturePool::evict() {
             return;
     }
     ORVO_FAIL("oFreeList1D_.size() != 0 || oFreeList2D_.size() != 0 || oFreeList3D_.size() != 0 || "
-              "oFreeListRECT_.size() != 0 || vpTransferClientStorage_.size() != 0");
+              "oFreeListRECT_.size() != 0 || !vpTransferClientStorage_.empty()");
 }
 
 template <typename TextureT>

@@ -42,7 +42,7 @@ std::shared_ptr<ShareGroup const> ShareGroup::current() {
     }
     known.aGroups_.reserve(known.aGroups_.size() + 1);
     auto pSync = std::unique_ptr<void, void (*)(void*)>(Sentinel::create(), &Sentinel::destroy);
-    auto const spGroup = std::make_shared<ShareGroup const>(pSync.get());
+    auto spGroup = std::make_shared<ShareGroup const>(pSync.get());
     pSync.release();
     known.aGroups_.push_back(spGroup);
     return spGroup;
