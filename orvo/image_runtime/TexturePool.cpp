@@ -233,8 +233,8 @@ void TexturePool::enforceMaximumPoolSize() {
 }
 
 void TexturePool::evict() {
-    while (oFreeList1D_.size() != 0 || oFreeList2D_.size() != 0 || oFreeList3D_.size() != 0 ||
-           oFreeListRECT_.size() != 0 || !vpTransferClientStorage_.empty()) {
+    while (!oFreeList1D_.empty() || !oFreeList2D_.empty() || !oFreeList3D_.empty() ||
+           !oFreeListRECT_.empty() || !vpTransferClientStorage_.empty()) {
         deleteFront(oFreeList1D_);
         std::size_t const nFreed2D = deleteFront(oFreeList2D_);
         deleteFront(oFreeList3D_);
