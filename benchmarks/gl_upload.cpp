@@ -109,7 +109,7 @@ void measureEither(benchmark::State& state, Setting const& setting, bool bPlain,
 /// Reads a texture with a single call.
 class PlainRead {
 public:
-    PlainRead(Setting const& setting, ImageGPU& image) : oSetting_(setting), oImage_(image) {
+    PlainRead(Setting const& setting, ImageGPU& image) : oSetting_(setting) {
         oFramebuffer_.bind();
         oFramebuffer_.attach(image.texture(), 0, 0);
         oFramebuffer_.unbind();
@@ -131,7 +131,6 @@ public:
 
 private:
     Setting const& oSetting_;
-    ImageGPU& oImage_;
     OGL::Framebuffer oFramebuffer_;
 };
 

@@ -28,13 +28,15 @@ IFilter::Identifier imageFlowIdentifier(char const* name) {
     return {name, ImageFlow::Library::imageFlowNamespace(), ImageFlow::Library::norvaneVendor(), 1};
 }
 
+// A result of fewer than three channels would be widened to R, G, B, which has no place for an alpha.
+constexpr int resultChannels(int nChannels) { return nChannels == 2 ? 4 : nChannels; }
+
 /// "scaleUp<n>channel".
 template <int nChannels>
 class ScaleUp : public Internal::Filters::Scale15_1_to_16 {
 public:
     static std::string nodeName() { return "scaleUp" + std::to_string(nChannels) + "channel"; }
-    // A result of fewer than three channels would be widened to R, G, B, which has no place for an alpha.
-    ScaleUp() : Scale15_1_to_16(nodeName().c_str(), nChannels == 2 ? 4 : nChannels) {}
+    ScaleUp() : Scale15_1_to_16(nodeName().c_str(), resultChannels(nChannels)) {}
 };
 
 /// "scaleDown<n>channel".
@@ -42,7 +44,7 @@ template <int nChannels>
 class ScaleDown : public Internal::Filters::Scale16_to_15_1 {
 public:
     static std::string nodeName() { return "scaleDown" + std::to_string(nChannels) + "channel"; }
-    ScaleDown() : Scale16_to_15_1(nodeName().c_str(), nChannels == 2 ? 4 : nChannels) {}
+    ScaleDown() : Scale16_to_15_1(nodeName().c_str(), resultChannels(nChannels)) {}
 };
 
 template <class Node>
