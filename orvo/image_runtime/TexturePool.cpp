@@ -245,7 +245,7 @@ void TexturePool::evict() {
             return;
     }
     ORVO_FAIL("oFreeList1D_.size() != 0 || oFreeList2D_.size() != 0 || oFreeList3D_.size() != 0 || "
-              "oFreeListRECT_.size() != 0 || !vpTransferClientStorage_.empty()");
+              "oFreeListRECT_.size() != 0 || vpTransferClientStorage_.size() != 0");
 }
 
 template <typename TextureT>
