@@ -16,7 +16,7 @@ namespace ORVO::FilterGraph {
 ///
 /// All operations but `frameStatus` throw an `InternalException` "Enforce spGraphExecutable_ != NULL" before
 /// the first frame was prepared. `frameStatus`, `waitForFrame` and `cancelFrame` rethrow, as a
-/// `SharedException`, what a worker thread of an asynchronous frame threw.
+/// `SharedException`, what a worker thread of an asynchronous frame threw: once, when the frame has ended.
 ///
 /// Threads: one at a time for each processor, but `frameStatus` and `cancelFrame` may be called from other
 /// threads while a frame runs or is waited for; completion callbacks come from the thread that ends the

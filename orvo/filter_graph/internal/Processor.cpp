@@ -54,8 +54,10 @@ IProcessorBase::eFrameStatus Processor::frameStatus() {
         ORVO_ENFORCE(spGraphExecutable_);
         if (spGraphExecutable_->isProcessingComplete()) {
             frameStatus_ = FRAME_COMPLETE;
+            // Not before: other slices of a frame that has failed may still write the host's images, and fail
+            // too. The host would be told twice, and the first time too early.
+            spGraphExecutable_->checkException();
         }
-        spGraphExecutable_->checkException();
     }
     return frameStatus_;
 }

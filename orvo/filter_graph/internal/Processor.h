@@ -53,8 +53,8 @@ public:
     Processor(Processor const&) = delete;
     Processor& operator=(Processor const&) = delete;
 
-    /// Moves the status on if the end of the frame can be seen, and rethrows what a worker thread saved (as
-    /// SharedException).
+    /// Moves the status on if the end of the frame can be seen, and rethrows, then and once, what a worker
+    /// thread saved (as SharedException).
     eFrameStatus frameStatus() override;
 
     /// Waits for the frame, at most about `timeout` seconds, looking at it every `interval` seconds; then

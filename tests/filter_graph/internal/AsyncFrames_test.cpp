@@ -424,6 +424,28 @@ TEST_P(FailingFramesTest, ASynchronousFrameThrowsAndTheNextFrameIsRight) {
     }
 }
 
+/// A slow node of which one slice has failed when the others are still held, and fail in their turn.
+class FailingTwiceNode : public SlowNode {
+public:
+    void processSlice(std::size_t begin, std::size_t end) override {
+        controller()->saveException(new InternalException(__FILE__, __LINE__, "the first failure"));
+        SlowNode::processSlice(begin, end);
+        throw InternalException(__FILE__, __LINE__, "a later failure");
+    }
+};
+
+TEST_F(AsyncFramesTest, AFailureIsReportedWhenNoSliceRunsAnyMore) {
+    FilterPtr const spFailing = makeFilter<FailingTwiceNode>("failing");
+    DisconnectAll(spSlow_.get());
+    Connect(spAdd_, spFailing);
+    Connect(spFailing, spThrowing_);
+    launchAndHold();
+    EXPECT_EQ(spProcessor_->frameStatus(), IProcessorBase::FRAME_RUNNING);
+    SlowNode::openGate();
+    EXPECT_THROW(wait(), SharedException);
+    EXPECT_EQ(wait(), IProcessorBase::FRAME_COMPLETE) << "a failure is reported once";
+}
+
 INSTANTIATE_TEST_SUITE_P(AllKinds, FailingFramesTest,
                          testing::Values(Failure{ThrowingNode::IN_PROCESS, "thrown in process"},
                                          Failure{ThrowingNode::IN_SLICE, "thrown in slice"},
