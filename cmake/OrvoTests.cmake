@@ -2,7 +2,9 @@
 find_package(GTest REQUIRED)
 
 # Compiled once and reused by every test program: the headers that each of them includes.
-add_library(orvo_test_support STATIC ${PROJECT_SOURCE_DIR}/tests/support/TestMain.cpp)
+add_library(orvo_test_support STATIC
+    ${PROJECT_SOURCE_DIR}/tests/support/TestMain.cpp
+    ${PROJECT_SOURCE_DIR}/tests/support/Watchdog.cpp)
 target_link_libraries(orvo_test_support PUBLIC orvo orvo_compiler GTest::gtest Threads::Threads)
 target_include_directories(orvo_test_support PUBLIC "${PROJECT_SOURCE_DIR}")
 # The library is what is tested at full speed. Tests instantiate templates for every type: optimised and instrumented,
@@ -33,7 +35,8 @@ function(orvo_add_tests name)
     target_link_libraries(${target} PRIVATE orvo_test_support)
     target_precompile_headers(${target} REUSE_FROM orvo_test_support)
     add_test(NAME ${name} COMMAND ${target})
-    set_tests_properties(${name} PROPERTIES TIMEOUT 900)
+    # Failures alone are printed: where only the beginning of a log is kept, they are there.
+    set_tests_properties(${name} PROPERTIES TIMEOUT 900 ENVIRONMENT "GTEST_BRIEF=1")
 endfunction()
 
 # orvo_add_gl_tests(<name> <source>...): the same for tests in a context.

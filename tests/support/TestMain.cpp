@@ -1,5 +1,5 @@
 // The main function of every test program. After each test, no tracked block may be left that was not there
-// before.
+// before. A test that hangs is ended.
 #include <gtest/gtest.h>
 
 #include <array>
@@ -9,6 +9,7 @@
 #include <string>
 
 #include "orvo/core/memory/MemoryStatistics.h"
+#include "tests/support/Watchdog.h"
 
 namespace {
 
@@ -48,6 +49,15 @@ class LeakListener : public testing::EmptyTestEventListener {
     Blocks aBefore_{};
 };
 
+class HangListener : public testing::EmptyTestEventListener {
+    void OnTestStart(testing::TestInfo const& test) override {
+        oWatchdog_.watch(test.test_suite_name(), test.name());
+    }
+    void OnTestEnd(testing::TestInfo const&) override { oWatchdog_.rest(); }
+
+    ORVO::Test::Watchdog oWatchdog_;
+};
+
 } // namespace
 
 int main(int argc, char** argv) {
@@ -57,6 +67,7 @@ int main(int argc, char** argv) {
     testing::TestEventListener* const pPrinter = listeners.Release(listeners.default_result_printer());
     listeners.Append(pPrinter);
     listeners.Append(new LeakListener);
+    listeners.Append(new HangListener);
 
     // What a whole suite shares is freed after its last test.
     Blocks const before = blocksInUse();
