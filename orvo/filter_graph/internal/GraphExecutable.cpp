@@ -15,6 +15,7 @@
 #include "orvo/filter_graph/internal/GraphTraverser.h"
 #include "orvo/filter_graph/internal/IFilterExecutable.h"
 #include "orvo/filter_graph/internal/ImageFlowFilterExecutable.h"
+#include "orvo/filter_graph/internal/InputAdapter.h"
 #include "orvo/filter_graph/internal/OutputAdapter.h"
 #include "orvo/filter_graph/internal/OutputAdapterExecutable.h"
 #include "orvo/filter_graph/internal/ScopedGraphContext.h"
@@ -300,6 +301,9 @@ InputConnector* GraphExecutable::prependImageFlowConverter(std::shared_ptr<Image
 void GraphExecutable::collectForFrames() {
     for (auto const& [pFilter, spExecutable] : aFilterExecutables_) {
         aExecutablesInOrder_.push_back(spExecutable.get());
+        if (auto const* const pInput = dynamic_cast<InputAdapter*>(pFilter)) {
+            bReadsTextures_ = bReadsTextures_ || pInput->getImageDescriptor().type() == ORVO_TARGET_GL;
+        }
         if (dynamic_cast<IAdapter*>(pFilter)) {
             aAdapterExecutables_.push_back(spExecutable.get());
         }

@@ -46,9 +46,11 @@ class OutputAdapter;
 /// differs: the layout that a node wants its pixels in, and the place where the client's images live.
 ///
 /// With a context the graph has a hidden context of its own that shares with it. Nodes are built, run and
-/// freed in that one, and whatever context the host has current is current again after each call. What a
-/// frame draws into a client's texture is drawn before anything that the host's context, current at
-/// `processFrame`, is given afterwards; at the end of an asynchronous frame it is complete.
+/// freed in that one, and whatever context the host has current is current again after each call. What the
+/// host's context, current at a launch, was given before is done before the frame touches a client's texture.
+/// What a frame draws into one is drawn before anything that the host's context, current at `processFrame`,
+/// is given afterwards; at the end of an asynchronous frame, or where the host has none current, it is
+/// complete.
 ///
 /// What a frame may keep of the one before: with `cachingMode` 0 nothing. With any other mode the results of
 /// the nodes that are not dirty, where dirty is a node one of whose parameters changed, a source whose image
@@ -168,6 +170,10 @@ private:
     void returnStuff();
     /// Whether frames draw into a client's texture.
     bool drawsIntoTexture() const;
+    /// Whether frames read or draw into a client's texture.
+    bool usesTextures() const;
+    /// Whether the current context shares with the graph's.
+    bool isHostSharing() const;
     static bool internalCompletionCallback(void* self);
     void callCompletionCallback();
 
@@ -187,6 +193,7 @@ private:
     std::vector<ImageFilter*> aNodesProducersFirst_;      // all that the sink reaches
     std::vector<ImageFilter*> aFanOutNodes_;              // those among them with more than one output
 
+    bool bReadsTextures_ = false;                    // whether a source is a client's texture
     bool bFrameOut_ = false;                         // an asynchronous frame was launched and not waited for
     std::atomic<bool> bLastFrameBroken_{false};      // the last frame threw, or failed on its thread
     std::atomic<bool> bCancelled_{false};            // a cancel was asked for since the last launch

@@ -31,6 +31,14 @@ constexpr double kNoTimeout = std::numeric_limits<double>::infinity();
 constexpr double kTailInterval =
     1e-4; // seconds between two looks at a frame whose end is a few instructions away
 
+/// Lets the current context, which shares with the one of the mark, run behind the mark; then frees it.
+void waitFor(std::optional<OGL::Fence>& oMark) noexcept {
+    if (oMark) {
+        oMark->wait();
+        oMark.reset();
+    }
+}
+
 /// Takes the image that one output of the node holds to all those that hold none. False if an output is for
 /// another kind of image.
 template <typename Image>
@@ -166,11 +174,23 @@ bool GraphExecutable::drawsIntoTexture() const {
     return spContext_ && pOutput_->getImageDescriptor().type() == ORVO_TARGET_GL;
 }
 
+bool GraphExecutable::usesTextures() const { return bReadsTextures_ || drawsIntoTexture(); }
+
+bool GraphExecutable::isHostSharing() const {
+    return spContext_ && spContext_->isSharingWithCurrentContext();
+}
+
 void GraphExecutable::processFrame() {
     waitForRunningFrame(); // whose thread has the graph's context
+    bool const bHostShares = isHostSharing();
+    std::optional<OGL::Fence> oGiven;
+    if (bHostShares && usesTextures()) {
+        oGiven.emplace();
+    }
     std::optional<OGL::Fence> oDrawn;
     {
-        ScopedGraphContext const current(spContext_);
+        ScopedGraphContext current(spContext_);
+        waitFor(oGiven);
         settleLastFrame();
         ORVO_CHECK(pOutput_, "pOutputAdapter");
         bProcessingComplete_.store(false, std::memory_order_release);
@@ -178,8 +198,11 @@ void GraphExecutable::processFrame() {
         prepareNodes();
         prepareCaches();
         spBedding_->process();
-        if (drawsIntoTexture()) {
+        if (drawsIntoTexture() && bHostShares) {
             oDrawn.emplace();
+            current.restore();
+        } else if (drawsIntoTexture()) {
+            OGL::finishCurrentContext();
         }
     }
     if (oDrawn) {
@@ -192,9 +215,14 @@ void GraphExecutable::processFrame() {
 
 void* GraphExecutable::asyncProcessFrame() {
     waitForRunningFrame(); // whose thread has the graph's context
+    std::optional<OGL::Fence> oGiven;
+    if (usesTextures() && isHostSharing()) {
+        oGiven.emplace();
+    }
     {
         // Let go of before the launch: the frame's thread makes the same context current.
         ScopedGraphContext const current(spContext_);
+        waitFor(oGiven);
         settleLastFrame();
         ORVO_CHECK(pOutput_, "pOutputAdapter");
         bProcessingComplete_.store(false, std::memory_order_release);

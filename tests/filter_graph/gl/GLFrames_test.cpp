@@ -146,6 +146,60 @@ TEST_F(GLFramesTest, RunWithNoContextCurrent) {
     EXPECT_EQ(OGL::NativeContext::currentHandle(), nullptr);
 }
 
+TEST_F(GLFramesTest, TexturesAreTouchedInTheOrderOfTheHostsCommands) {
+    ByteImage bytesIn(0, 0, kWidth, kHeight);
+    ByteImage bytesOut(0, 0, kWidth, kHeight);
+    TextureImage textureIn(0, 0, kWidth, kHeight);
+    TextureImage textureOut(0, 0, kWidth, kHeight);
+    struct Row {
+        ImageBase* pInput;
+        ImageBase* pOutput;
+        std::uint64_t nWaits;      // a frame's for the host, and the host's for the frame
+        std::uint64_t nAsyncWaits; // those of an asynchronous frame, which is complete when it ends
+    };
+    for (Row const& row :
+         {Row{bytesIn.handle(), bytesOut.handle(), 0, 0}, Row{textureIn.handle(), bytesOut.handle(), 1, 1},
+          Row{bytesIn.handle(), textureOut.handle(), 2, 1},
+          Row{textureIn.handle(), textureOut.handle(), 2, 1}}) {
+        Chain chain(row.pInput, row.pOutput, context());
+        chain.spProcessor_->processFrame(glOptions());
+        ObjectCounts const objects = GLHooks::objects();
+        std::uint64_t const nWaits = GLHooks::calls("glWaitSync");
+        chain.spProcessor_->processFrame(glOptions());
+        EXPECT_EQ(GLHooks::calls("glWaitSync") - nWaits, row.nWaits);
+        chain.spProcessor_->asyncProcessFrame(glOptions());
+        ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+        EXPECT_EQ(GLHooks::calls("glWaitSync") - nWaits, row.nWaits + row.nAsyncWaits);
+        EXPECT_EQ(GLHooks::objects(), objects);
+    }
+}
+
+TEST_F(GLFramesTest, ATextureIsCompleteWhereTheHostHasNoContextToWaitIn) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    TextureImage output(0, 0, kWidth, kHeight);
+    auto const pForeign = host().another(false);
+    {
+        Chain chain(input.handle(), output.handle(), context());
+        chain.spProcessor_->processFrame(glOptions());
+        ObjectCounts const objects = GLHooks::objects();
+        for (bool const bForeign : {false, true}) {
+            output.write(std::vector<std::uint8_t>(4 * kWidth * kHeight, 1));
+            if (bForeign) {
+                pForeign->makeCurrent();
+            } else {
+                host().release();
+            }
+            std::uint64_t const nFinishes = GLHooks::calls("glFinish");
+            chain.spProcessor_->processFrame(glOptions());
+            EXPECT_EQ(GLHooks::calls("glFinish") - nFinishes, 1u);
+            EXPECT_EQ(GLHooks::objects(), objects);
+            host().makeCurrent();
+            EXPECT_EQ(output.read(), plus(pattern(kWidth, kHeight), 10));
+        }
+    }
+}
+
 TEST_F(GLFramesTest, RunUnderAForeignContext) {
     ByteImage input(0, 0, kWidth, kHeight);
     input.write(pattern(kWidth, kHeight));
@@ -257,14 +311,21 @@ TEST_F(GLFramesTest, CancelledFramesLeaveTheNextOneRight) {
 TEST_F(GLFramesTest, EveryCallThatFailsLeavesTheNextFrameRight) {
     ByteImage input(0, 0, kWidth, kHeight);
     input.write(pattern(kWidth, kHeight));
+    TextureImage inputTexture(0, 0, kWidth, kHeight);
+    inputTexture.write(pattern(kWidth, kHeight));
     TextureImage texture(0, 0, kWidth, kHeight);
     ByteImage output(0, 0, kWidth, kHeight);
-    for (ImageBase* const pOutput :
-         {static_cast<ImageBase*>(output.handle()), static_cast<ImageBase*>(texture.handle())}) {
+    struct Ends {
+        ImageBase* pInput;
+        ImageBase* pOutput;
+    };
+    for (auto const& [pInput, pOutput] :
+         {Ends{input.handle(), output.handle()}, Ends{input.handle(), texture.handle()},
+          Ends{inputTexture.handle(), texture.handle()}}) {
         int nFailed = 0;
         for (std::uint64_t n = 1;; ++n) {
             // A new processor each time, so that building fails in turn, too.
-            Chain chain(input.handle(), pOutput, context());
+            Chain chain(pInput, pOutput, context());
             TexturePool::Instance()->clearAll();
             bool bFired = false;
             std::string sFailed;
@@ -280,7 +341,7 @@ TEST_F(GLFramesTest, EveryCallThatFailsLeavesTheNextFrameRight) {
                 bFired = failure.hasFired();
                 sFailed = failure.name();
             }
-            // A driver that refuses to make the host's context current again leaves the graph's.
+            // A driver that refuses to make the host's context current again leaves none.
             host().makeCurrent();
             drainErrors();
             output.fill(std::uint8_t(1));
@@ -289,6 +350,7 @@ TEST_F(GLFramesTest, EveryCallThatFailsLeavesTheNextFrameRight) {
             std::vector<std::uint8_t> const aResult =
                 pOutput == output.handle() ? output.bytes() : texture.read();
             ASSERT_EQ(aResult, plus(pattern(kWidth, kHeight), 10)) << "after failed " << sFailed;
+            ASSERT_EQ(inputTexture.read(), pattern(kWidth, kHeight)) << "after failed " << sFailed;
             if (!bFired) {
                 break;
             }
