@@ -301,8 +301,9 @@ InputConnector* GraphExecutable::prependImageFlowConverter(std::shared_ptr<Image
 void GraphExecutable::collectForFrames() {
     for (auto const& [pFilter, spExecutable] : aFilterExecutables_) {
         aExecutablesInOrder_.push_back(spExecutable.get());
-        if (auto const* const pInput = dynamic_cast<InputAdapter*>(pFilter)) {
-            bReadsTextures_ = bReadsTextures_ || pInput->getImageDescriptor().type() == ORVO_TARGET_GL;
+        auto* const pInput = dynamic_cast<InputAdapter*>(pFilter);
+        if (pInput && pInput->getImageDescriptor().type() == ORVO_TARGET_GL) {
+            aTextureInputs_.push_back(pInput);
         }
         if (dynamic_cast<IAdapter*>(pFilter)) {
             aAdapterExecutables_.push_back(spExecutable.get());

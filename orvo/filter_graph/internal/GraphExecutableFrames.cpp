@@ -12,6 +12,8 @@
 #include "orvo/filter_graph/impl/FilterGraphLibrary.h"
 #include "orvo/filter_graph/impl/ImageDescriptor.h"
 #include "orvo/filter_graph/internal/IFilterExecutable.h"
+#include "orvo/filter_graph/internal/ImageAccessor.h"
+#include "orvo/filter_graph/internal/InputAdapter.h"
 #include "orvo/filter_graph/internal/OutputAdapter.h"
 #include "orvo/filter_graph/internal/ScopedGraphContext.h"
 #include "orvo/image_flow/controllers/Bedding.h"
@@ -174,7 +176,17 @@ bool GraphExecutable::drawsIntoTexture() const {
     return spContext_ && pOutput_->getImageDescriptor().type() == ORVO_TARGET_GL;
 }
 
-bool GraphExecutable::usesTextures() const { return bReadsTextures_ || drawsIntoTexture(); }
+bool GraphExecutable::usesTextures() const { return !aTextureInputs_.empty() || drawsIntoTexture(); }
+
+void GraphExecutable::keepTextureParameters(ClientTextureParameters& parameters) const {
+    parameters.putBack(); // what a frame could not whose thread was refused the context
+    for (InputAdapter const* const pInput : aTextureInputs_) {
+        auto const* const pImage = ImageAccessor::getImpl<ORVO::ImageGPU>(pInput->getImage());
+        if (pImage && pImage->texture()) {
+            parameters.keep(*pImage->texture());
+        }
+    }
+}
 
 bool GraphExecutable::isHostSharing() const {
     return spContext_ && spContext_->isSharingWithCurrentContext();
@@ -197,7 +209,11 @@ void GraphExecutable::processFrame() {
         bLastFrameBroken_ = true;
         prepareNodes();
         prepareCaches();
-        spBedding_->process();
+        {
+            ClientTextureParameters parameters;
+            keepTextureParameters(parameters);
+            spBedding_->process();
+        }
         if (drawsIntoTexture() && bHostShares) {
             oDrawn.emplace();
             current.restore();
@@ -233,12 +249,15 @@ void* GraphExecutable::asyncProcessFrame() {
         if (Library::getInitializationOptions().getAllocationMode() == 1) {
             allocateOutputImages();
         }
+        keepTextureParameters(oTextureParameters_);
     }
     bFrameOut_ = true;
     try {
         spBedding_->processAsync();
     } catch (...) {
         bFrameOut_ = false;
+        ScopedGraphContext const current(spContext_);
+        oTextureParameters_.putBack();
         throw;
     }
     bLastFrameBroken_ = false;
@@ -265,8 +284,13 @@ void GraphExecutable::waitForRunningFrame() {
     ORVO_CHECK(oCallbackThread_.load() != std::this_thread::get_id(),
                "The completion callback must not change the frame that it ends");
     bProcessingComplete_.wait(false, std::memory_order_acquire);
-    // Completion is recorded a moment before the frame's last step.
-    spController_->wait(kNoTimeout, kTailInterval);
+    try {
+        // Completion is recorded a moment before the frame's last step.
+        spController_->wait(kNoTimeout, kTailInterval);
+    } catch (...) {
+        // An error of OpenGL's in a frame that nobody waited for. It must not come out of the next one.
+        bLastFrameBroken_ = true;
+    }
     bFrameOut_ = false;
 }
 
@@ -286,9 +310,12 @@ void GraphExecutable::setCompletionCallback(bool (*callback)(void*)) { pCompleti
 bool GraphExecutable::internalCompletionCallback(void* self) {
     auto* const pExecutable = static_cast<GraphExecutable*>(self);
     try {
-        if (pExecutable->drawsIntoTexture()) {
+        if (pExecutable->usesTextures()) {
             ScopedGraphContext const current(pExecutable->spContext_);
-            OGL::finishCurrentContext();
+            pExecutable->oTextureParameters_.putBack();
+            if (pExecutable->drawsIntoTexture()) {
+                OGL::finishCurrentContext();
+            }
         }
         pExecutable->returnStuff();
         pExecutable->callCompletionCallback();

@@ -1,13 +1,18 @@
 // Frames of processors on OpenGL: synchronous and asynchronous, one after the other, on several contexts,
 // with every call of OpenGL failing in turn.
+#include <epoxy/gl.h>
+
+#include <array>
 #include <atomic>
 #include <thread>
 
 #include "orvo/filter_graph/filters/StandardFilters.h"
 #include "orvo/filter_graph/impl/FilterFactory.h"
+#include "orvo/filter_graph/internal/ImageFlowFilter.h"
+#include "orvo/image_flow/filters/BasicGLShaderFilter.h"
 #include "orvo/image_runtime/TexturePool.h"
 #include "orvo/ogl/NativeContext.h"
-#include "tests/support/Expect.h"
+#include "tests/support/gl/ExpectOGL.h"
 #include "tests/support/gl/GLFrameTest.h"
 
 namespace ORVO::FilterGraph {
@@ -40,6 +45,39 @@ struct Chain {
 };
 
 class GLFramesTest : public GLFrameTest {};
+
+/// How a texture is sampled.
+struct Sampling {
+    explicit Sampling(OGL::Texture2D const& texture) {
+        glBindTexture(GL_TEXTURE_2D, texture.objectID());
+        constexpr GLenum aNames[] = {GL_TEXTURE_MIN_FILTER, GL_TEXTURE_MAG_FILTER, GL_TEXTURE_WRAP_S,
+                                     GL_TEXTURE_WRAP_T};
+        for (std::size_t i = 0; i < 4; ++i) {
+            glGetTexParameteriv(GL_TEXTURE_2D, aNames[i], &aModes_[i]);
+        }
+        glGetTexParameterfv(GL_TEXTURE_2D, GL_TEXTURE_BORDER_COLOR, aBorder_.data());
+        glBindTexture(GL_TEXTURE_2D, 0);
+    }
+
+    /// Sets a texture to what no filter wants.
+    static void makeOdd(OGL::Texture2D const& texture) {
+        constexpr float aBorder[] = {0.25f, 0.5f, 0.75f, 1.0f};
+        glBindTexture(GL_TEXTURE_2D, texture.objectID());
+        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_NEAREST);
+        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, GL_NEAREST);
+        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_REPEAT);
+        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_MIRRORED_REPEAT);
+        glTexParameterfv(GL_TEXTURE_2D, GL_TEXTURE_BORDER_COLOR, aBorder);
+        glBindTexture(GL_TEXTURE_2D, 0);
+    }
+
+    friend bool operator==(Sampling const& a, Sampling const& b) {
+        return a.aModes_ == b.aModes_ && a.aBorder_ == b.aBorder_;
+    }
+
+    std::array<GLint, 4> aModes_{};
+    std::array<GLfloat, 4> aBorder_{};
+};
 
 TEST_F(GLFramesTest, NewValuesReachTheShader) {
     ByteImage input(0, 0, kWidth, kHeight);
@@ -126,6 +164,27 @@ TEST_F(GLFramesTest, TheHostsStateAndContextAreAsTheyWere) {
     chain.spProcessor_->processFrame(glOptions());
     EXPECT_EQ(before.differencesTo(GLState::capture()), "");
     EXPECT_EQ(OGL::NativeContext::currentHandle(), pHandle);
+}
+
+TEST_F(GLFramesTest, TexturesAreSampledAsTheHostLeftThem) {
+    TextureImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    TextureImage output(0, 0, kWidth, kHeight);
+    Sampling::makeOdd(input.texture());
+    Sampling::makeOdd(output.texture());
+    Sampling const before(input.texture());
+    Chain chain(input.handle(), output.handle(), context());
+    chain.spProcessor_->processFrame(glOptions());
+    EXPECT_TRUE(Sampling(input.texture()) == before);
+    chain.spProcessor_->asyncProcessFrame(glOptions());
+    ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+    EXPECT_TRUE(Sampling(input.texture()) == before);
+    {
+        GLCallFailure const failure("glCheckFramebufferStatus", 1);
+        EXPECT_THROW(chain.spProcessor_->processFrame(glOptions()), OGL::ExceptionOGL);
+    }
+    EXPECT_TRUE(Sampling(input.texture()) == before) << "after a frame that failed";
+    EXPECT_TRUE(Sampling(output.texture()) == before);
 }
 
 TEST_F(GLFramesTest, RunWithNoContextCurrent) {
@@ -285,6 +344,34 @@ TEST_F(GLFramesTest, AsynchronousFramesDrawIntoTextures) {
     EXPECT_EQ(nCallbacks, 20);
 }
 
+/// The layers let frames allocate on the thread that launches them.
+class GLAllocationFramesTest : public GLFrameTest {
+protected:
+    GLAllocationFramesTest() : GLFrameTest(Library::InitializationOptions(Library::ALLOCATE_BEFORE_LAUNCH)) {}
+};
+
+TEST_F(GLAllocationFramesTest, AreAsRightAsTheOthers) {
+    ByteImage bytes(0, 0, kWidth, kHeight);
+    TextureImage texture(0, 0, kWidth, kHeight);
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    for (ImageBase* const pOutput :
+         {static_cast<ImageBase*>(bytes.handle()), static_cast<ImageBase*>(texture.handle())}) {
+        Chain chain(input.handle(), pOutput, context());
+        for (int const steps : {1, 2, 3}) {
+            chain.add(steps);
+            chain.spProcessor_->asyncProcessFrame(glOptions());
+            ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+            EXPECT_EQ(pOutput == bytes.handle() ? bytes.bytes() : texture.read(),
+                      plus(pattern(kWidth, kHeight), steps));
+        }
+        chain.add(9);
+        chain.spProcessor_->processFrame(glOptions());
+        EXPECT_EQ(pOutput == bytes.handle() ? bytes.bytes() : texture.read(),
+                  plus(pattern(kWidth, kHeight), 9));
+    }
+}
+
 TEST_F(GLFramesTest, CancelledFramesLeaveTheNextOneRight) {
     ByteImage input(0, 0, kWidth, kHeight);
     input.write(pattern(kWidth, kHeight));
@@ -304,6 +391,50 @@ TEST_F(GLFramesTest, CancelledFramesLeaveTheNextOneRight) {
         }
     }
     ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+}
+
+/// Leaves an error behind when it is told to.
+class ErrorShader : public BasicGLShaderFilter {
+public:
+    ErrorShader() : BasicGLShaderFilter("ErrorShader", "void main() { gl_FragData[0] = vec4(0.2); }\n", 4) {
+        addInput("src");
+    }
+
+    void internalProcess() override {
+        BasicGLShaderFilter::internalProcess();
+        if (bRaises) {
+            glEnable(0xFFFF);
+        }
+    }
+
+    static inline std::atomic<bool> bRaises{false};
+};
+
+TEST_F(GLFramesTest, AnErrorOfAFrameThatNobodyWaitedForIsNotTheNextOnes) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    TextureImage output(0, 0, kWidth, kHeight);
+    SourcePtr const spSource = makeGLSource(input.handle());
+    Internal::ImageFlowFilter<ErrorShader> prototype({"error", "test", "ORVO", 1}, ORVO_TARGET_GL);
+    prototype.initialize();
+    FilterPtr const spFilter = prototype.clone();
+    SinkPtr const spSink = makeGLSink(output.handle());
+    Connect(spSource, spFilter);
+    Connect(spFilter, spSink);
+    auto const spProcessor = createProcessor(spSink, context());
+    ErrorShader::bRaises = true;
+    spProcessor->asyncProcessFrame(glOptions());
+    while (spProcessor->frameStatus() == IProcessorBase::FRAME_RUNNING) {
+        std::this_thread::yield();
+    }
+    ErrorShader::bRaises = false;
+    spProcessor->processFrame(glOptions());
+    EXPECT_EQ(output.read(), std::vector<std::uint8_t>(4 * kWidth * kHeight, 51));
+
+    ErrorShader::bRaises = true;
+    spProcessor->asyncProcessFrame(glOptions());
+    ORVO_EXPECT_OGL(spProcessor->waitForFrame(kLong, 0.0005), "Processing failure due to OpenGL error");
+    ErrorShader::bRaises = false;
+    spProcessor->processFrame(glOptions());
 }
 
 // ---- Failures
