@@ -24,6 +24,8 @@ public:
     /// Notes the parameters of a texture, which must live until they are put back. Does nothing if no context
     /// is current.
     void keep(OGL::Texture2D const& texture);
+    /// Whether nothing is kept.
+    bool empty() const noexcept { return aKept_.empty(); }
     /// Sets all textures to what was noted, and forgets them. Does nothing if no context is current.
     void putBack() noexcept;
 

@@ -177,6 +177,10 @@ private:
     bool usesTextures() const;
     /// Notes how the client has the textures sampled that a frame reads.
     void keepTextureParameters(ClientTextureParameters& parameters) const;
+    /// At the end of an asynchronous frame: leaves the client's textures complete and sampled as before.
+    void settleTextures();
+    /// Puts back, after an asynchronous frame, what its thread could not, which was refused the context.
+    void putBackTextureParameters();
     /// Whether the current context shares with the graph's.
     bool isHostSharing() const;
     static bool internalCompletionCallback(void* self);

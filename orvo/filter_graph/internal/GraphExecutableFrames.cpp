@@ -179,12 +179,18 @@ bool GraphExecutable::drawsIntoTexture() const {
 bool GraphExecutable::usesTextures() const { return !aTextureInputs_.empty() || drawsIntoTexture(); }
 
 void GraphExecutable::keepTextureParameters(ClientTextureParameters& parameters) const {
-    parameters.putBack(); // what a frame could not whose thread was refused the context
     for (InputAdapter const* const pInput : aTextureInputs_) {
         auto const* const pImage = ImageAccessor::getImpl<ORVO::ImageGPU>(pInput->getImage());
         if (pImage && pImage->texture()) {
             parameters.keep(*pImage->texture());
         }
+    }
+}
+
+void GraphExecutable::putBackTextureParameters() {
+    if (!oTextureParameters_.empty()) {
+        ScopedGraphContext const current(spContext_);
+        oTextureParameters_.putBack();
     }
 }
 
@@ -256,8 +262,7 @@ void* GraphExecutable::asyncProcessFrame() {
         spBedding_->processAsync();
     } catch (...) {
         bFrameOut_ = false;
-        ScopedGraphContext const current(spContext_);
-        oTextureParameters_.putBack();
+        putBackTextureParameters();
         throw;
     }
     bLastFrameBroken_ = false;
@@ -273,6 +278,7 @@ bool GraphExecutable::waitForFrame(double timeout, double interval) {
     bool const bEnded = spController_->wait(timeout, interval);
     if (bEnded) {
         bFrameOut_ = false;
+        putBackTextureParameters();
     }
     return bEnded;
 }
@@ -287,6 +293,7 @@ void GraphExecutable::waitForRunningFrame() {
     try {
         // Completion is recorded a moment before the frame's last step.
         spController_->wait(kNoTimeout, kTailInterval);
+        putBackTextureParameters();
     } catch (...) {
         // An error of OpenGL's in a frame that nobody waited for. It must not come out of the next one.
         bLastFrameBroken_ = true;
@@ -309,26 +316,37 @@ void GraphExecutable::setCompletionCallback(bool (*callback)(void*)) { pCompleti
 
 bool GraphExecutable::internalCompletionCallback(void* self) {
     auto* const pExecutable = static_cast<GraphExecutable*>(self);
-    try {
-        if (pExecutable->usesTextures()) {
-            ScopedGraphContext const current(pExecutable->spContext_);
-            pExecutable->oTextureParameters_.putBack();
-            if (pExecutable->drawsIntoTexture()) {
-                OGL::finishCurrentContext();
-            }
+    auto const attempt = [pExecutable](auto const& step) {
+        try {
+            step();
+        } catch (ExceptionBase const& exception) {
+            pExecutable->spController_->saveException(exception.clone());
+        } catch (...) {
+            pExecutable->spController_->saveException(
+                ORVO_NEW CPURuntimeException(CPURuntimeException::CONDITION_UNKNOWN));
         }
+    };
+    // A frame whose thread is refused the context has ended all the same, and its host is told.
+    attempt([pExecutable] { pExecutable->settleTextures(); });
+    attempt([pExecutable] {
         pExecutable->returnStuff();
         pExecutable->callCompletionCallback();
-    } catch (ExceptionBase const& exception) {
-        pExecutable->spController_->saveException(exception.clone());
-    } catch (...) {
-        pExecutable->spController_->saveException(
-            ORVO_NEW CPURuntimeException(CPURuntimeException::CONDITION_UNKNOWN));
-    }
+    });
     // The host may destroy the frame's results, but not this object, as soon as it sees this.
     pExecutable->bProcessingComplete_.store(true, std::memory_order_release);
     pExecutable->bProcessingComplete_.notify_all();
     return true;
+}
+
+void GraphExecutable::settleTextures() {
+    if (!usesTextures()) {
+        return;
+    }
+    ScopedGraphContext const current(spContext_);
+    oTextureParameters_.putBack();
+    if (drawsIntoTexture()) {
+        OGL::finishCurrentContext();
+    }
 }
 
 void GraphExecutable::callCompletionCallback() {

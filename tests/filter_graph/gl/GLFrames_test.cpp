@@ -1,83 +1,20 @@
-// Frames of processors on OpenGL: synchronous and asynchronous, one after the other, on several contexts,
-// with every call of OpenGL failing in turn.
-#include <epoxy/gl.h>
-
-#include <array>
+// Frames of processors on OpenGL: synchronous and asynchronous, one after the other, on several contexts.
 #include <atomic>
 #include <thread>
 
 #include "orvo/filter_graph/filters/StandardFilters.h"
 #include "orvo/filter_graph/impl/FilterFactory.h"
-#include "orvo/filter_graph/internal/ImageFlowFilter.h"
-#include "orvo/image_flow/filters/BasicGLShaderFilter.h"
-#include "orvo/image_runtime/TexturePool.h"
+#include "orvo/ogl/ExceptionOGL.h"
 #include "orvo/ogl/NativeContext.h"
-#include "tests/support/gl/ExpectOGL.h"
-#include "tests/support/gl/GLFrameTest.h"
+#include "tests/filter_graph/gl/GLChain.h"
+#include "tests/support/Expect.h"
 
 namespace ORVO::FilterGraph {
 namespace {
 
 using namespace ORVO::Test;
 
-constexpr int kWidth = 9;
-constexpr int kHeight = 6;
-constexpr double kLong = 60.0; // seconds, far beyond what any frame here takes
-constexpr float kStep = 1.0f / 255.0f;
-
-/// host memory -> add -> host memory, or textures.
-struct Chain {
-    Chain(ImageBase* pInput, ImageBase* pOutput, OGL::Context const* pContext)
-        : spSource_(makeGLSource(pInput)),
-          spSink_(makeGLSink(pOutput)),
-          spProcessor_(createProcessor(spSink_, pContext)) {
-        Connect(spSource_, spAdd_);
-        Connect(spAdd_, spSink_);
-        add(10);
-    }
-
-    void add(int steps) { setParameter(*spAdd_, "value", static_cast<float>(steps) * kStep); }
-
-    SourcePtr spSource_;
-    FilterPtr spAdd_ = makeAddShader();
-    SinkPtr spSink_;
-    std::shared_ptr<IProcessor> spProcessor_;
-};
-
 class GLFramesTest : public GLFrameTest {};
-
-/// How a texture is sampled.
-struct Sampling {
-    explicit Sampling(OGL::Texture2D const& texture) {
-        glBindTexture(GL_TEXTURE_2D, texture.objectID());
-        constexpr GLenum aNames[] = {GL_TEXTURE_MIN_FILTER, GL_TEXTURE_MAG_FILTER, GL_TEXTURE_WRAP_S,
-                                     GL_TEXTURE_WRAP_T};
-        for (std::size_t i = 0; i < 4; ++i) {
-            glGetTexParameteriv(GL_TEXTURE_2D, aNames[i], &aModes_[i]);
-        }
-        glGetTexParameterfv(GL_TEXTURE_2D, GL_TEXTURE_BORDER_COLOR, aBorder_.data());
-        glBindTexture(GL_TEXTURE_2D, 0);
-    }
-
-    /// Sets a texture to what no filter wants.
-    static void makeOdd(OGL::Texture2D const& texture) {
-        constexpr float aBorder[] = {0.25f, 0.5f, 0.75f, 1.0f};
-        glBindTexture(GL_TEXTURE_2D, texture.objectID());
-        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_NEAREST);
-        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, GL_NEAREST);
-        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_REPEAT);
-        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_MIRRORED_REPEAT);
-        glTexParameterfv(GL_TEXTURE_2D, GL_TEXTURE_BORDER_COLOR, aBorder);
-        glBindTexture(GL_TEXTURE_2D, 0);
-    }
-
-    friend bool operator==(Sampling const& a, Sampling const& b) {
-        return a.aModes_ == b.aModes_ && a.aBorder_ == b.aBorder_;
-    }
-
-    std::array<GLint, 4> aModes_{};
-    std::array<GLfloat, 4> aBorder_{};
-};
 
 TEST_F(GLFramesTest, NewValuesReachTheShader) {
     ByteImage input(0, 0, kWidth, kHeight);
@@ -391,119 +328,6 @@ TEST_F(GLFramesTest, CancelledFramesLeaveTheNextOneRight) {
         }
     }
     ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
-}
-
-/// Leaves an error behind when it is told to.
-class ErrorShader : public BasicGLShaderFilter {
-public:
-    ErrorShader() : BasicGLShaderFilter("ErrorShader", "void main() { gl_FragData[0] = vec4(0.2); }\n", 4) {
-        addInput("src");
-    }
-
-    void internalProcess() override {
-        BasicGLShaderFilter::internalProcess();
-        if (bRaises) {
-            glEnable(0xFFFF);
-        }
-    }
-
-    static inline std::atomic<bool> bRaises{false};
-};
-
-TEST_F(GLFramesTest, AnErrorOfAFrameThatNobodyWaitedForIsNotTheNextOnes) {
-    ByteImage input(0, 0, kWidth, kHeight);
-    TextureImage output(0, 0, kWidth, kHeight);
-    SourcePtr const spSource = makeGLSource(input.handle());
-    Internal::ImageFlowFilter<ErrorShader> prototype({"error", "test", "ORVO", 1}, ORVO_TARGET_GL);
-    prototype.initialize();
-    FilterPtr const spFilter = prototype.clone();
-    SinkPtr const spSink = makeGLSink(output.handle());
-    Connect(spSource, spFilter);
-    Connect(spFilter, spSink);
-    auto const spProcessor = createProcessor(spSink, context());
-    ErrorShader::bRaises = true;
-    spProcessor->asyncProcessFrame(glOptions());
-    while (spProcessor->frameStatus() == IProcessorBase::FRAME_RUNNING) {
-        std::this_thread::yield();
-    }
-    ErrorShader::bRaises = false;
-    spProcessor->processFrame(glOptions());
-    EXPECT_EQ(output.read(), std::vector<std::uint8_t>(4 * kWidth * kHeight, 51));
-
-    ErrorShader::bRaises = true;
-    spProcessor->asyncProcessFrame(glOptions());
-    ORVO_EXPECT_OGL(spProcessor->waitForFrame(kLong, 0.0005), "Processing failure due to OpenGL error");
-    ErrorShader::bRaises = false;
-    spProcessor->processFrame(glOptions());
-}
-
-// ---- Failures
-
-TEST_F(GLFramesTest, EveryCallThatFailsLeavesTheNextFrameRight) {
-    ByteImage input(0, 0, kWidth, kHeight);
-    input.write(pattern(kWidth, kHeight));
-    TextureImage inputTexture(0, 0, kWidth, kHeight);
-    inputTexture.write(pattern(kWidth, kHeight));
-    TextureImage texture(0, 0, kWidth, kHeight);
-    ByteImage output(0, 0, kWidth, kHeight);
-    struct Ends {
-        ImageBase* pInput;
-        ImageBase* pOutput;
-    };
-    for (auto const& [pInput, pOutput] :
-         {Ends{input.handle(), output.handle()}, Ends{input.handle(), texture.handle()},
-          Ends{inputTexture.handle(), texture.handle()}}) {
-        int nFailed = 0;
-        for (std::uint64_t n = 1;; ++n) {
-            // A new processor each time, so that building fails in turn, too.
-            Chain chain(pInput, pOutput, context());
-            TexturePool::Instance()->clearAll();
-            bool bFired = false;
-            std::string sFailed;
-            {
-                GLCallFailure const failure(n);
-                try {
-                    chain.spProcessor_->processFrame(glOptions());
-                } catch (ExceptionBase const&) {
-                    ++nFailed;
-                } catch (std::bad_alloc const&) {
-                    ++nFailed;
-                }
-                bFired = failure.hasFired();
-                sFailed = failure.name();
-            }
-            // A driver that refuses to make the host's context current again leaves none.
-            host().makeCurrent();
-            drainErrors();
-            output.fill(std::uint8_t(1));
-            texture.write(output.bytes());
-            ASSERT_NO_THROW(chain.spProcessor_->processFrame(glOptions())) << "after failed " << sFailed;
-            std::vector<std::uint8_t> const aResult =
-                pOutput == output.handle() ? output.bytes() : texture.read();
-            ASSERT_EQ(aResult, plus(pattern(kWidth, kHeight), 10)) << "after failed " << sFailed;
-            ASSERT_EQ(inputTexture.read(), pattern(kWidth, kHeight)) << "after failed " << sFailed;
-            if (!bFired) {
-                break;
-            }
-        }
-        EXPECT_GT(nFailed, 5);
-    }
-}
-
-TEST_F(GLFramesTest, TheGraphOutlivesTheHostsContext) {
-    ByteImage input(0, 0, kWidth, kHeight);
-    input.write(pattern(kWidth, kHeight));
-    ByteImage output(0, 0, kWidth, kHeight);
-    auto const pSecond = host().another(true);
-    pSecond->makeCurrent();
-    auto const pSecondContext = OGL::Context::adoptCurrent();
-    Chain chain(input.handle(), output.handle(), pSecondContext.get());
-    chain.spProcessor_->processFrame(glOptions());
-    host().makeCurrent();
-    pSecond->destroyContext();
-    chain.add(30);
-    chain.spProcessor_->processFrame(glOptions());
-    EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 30));
 }
 
 // ---- Precision and scales
