@@ -71,9 +71,10 @@ TexturePool::TexturePool(Configuration const& configuration)
 
 template <typename Code>
 void TexturePool::inHiddenContext(Code const& code) {
-    OGL::ScopedContextWrapper const restore;
+    OGL::ScopedContextWrapper wrapper;
     prepareOpenGLContext();
     code();
+    wrapper.restore();
 }
 
 TexturePool::~TexturePool() {
@@ -126,8 +127,16 @@ TextureT* TexturePool::get(TextureFreeList<TextureT>& oFreeList,
         nFreeListBytes_ -= countedBytes(*pTexture);
         return pTexture;
     }
-    OGL::ScopedContextWrapper const restore;
-    return make();
+    OGL::ScopedContextWrapper wrapper;
+    ScopedPtr<TextureT> pMade(make());
+    try {
+        wrapper.restore();
+    } catch (...) {
+        // The caller would go on in the hidden context. What was made for it is there the next time.
+        put(oFreeList, pMade.release());
+        throw;
+    }
+    return pMade.release();
 }
 
 OGL::Texture1D* TexturePool::getTexture1DFromPool(unsigned width, Texture::InternalFormat format,
@@ -236,11 +245,10 @@ void TexturePool::evict() {
     while (!oFreeList1D_.empty() || !oFreeList2D_.empty() || !oFreeList3D_.empty() ||
            !oFreeListRECT_.empty() || !vpTransferClientStorage_.empty()) {
         deleteFront(oFreeList1D_);
-        std::size_t const nFreed2D = deleteFront(oFreeList2D_);
+        pListener_->memoryFreed(deleteFront(oFreeList2D_));
         deleteFront(oFreeList3D_);
         deleteFront(oFreeListRECT_);
         deleteFrontOfClientStorage();
-        pListener_->memoryFreed(nFreed2D);
         if (nFreeListBytes_ <= evictionTarget(nMaximumPoolSize_))
             return;
     }

@@ -4,6 +4,7 @@
 #include "orvo/core/Check.h"
 #include "orvo/core/memory/AlignedMemory.h"
 #include "orvo/core/memory/TrackedNew.h"
+#include "orvo/core/utility/ScopedPtr.h"
 #include "orvo/image_runtime/PixelDataSize.h"
 #include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/ScopedContextWrapper.h"
@@ -85,13 +86,14 @@ OGL::TextureRECT* TexturePool::makeClientStorageTexture(std::size_t nWidth, std:
     std::size_t const nBytes = Texture::SizeInBytes(format, nWidth, nHeight, 1);
     // Asked here, since no memory of such a size is to be allocated first.
     ORVO_CHECK_PARAMETER(nBytes <= UINT32_MAX, "Texture size is too large");
-    OGL::ScopedContextWrapper const restore;
+    OGL::ScopedContextWrapper wrapper;
     prepareOpenGLContext();
     std::unique_ptr<void, AlignedDeleter> pMemory(
         ORVO_private::newAlignedMemory(MEMORY_TYPE_IMAGE, nBytes, 64));
-    OGL::TextureRECT* const pTexture = ORVO_NEW OGL::TextureRECT(format, nWidth, nHeight, pMemory.get());
+    ScopedPtr<OGL::TextureRECT> pTexture(ORVO_NEW OGL::TextureRECT(format, nWidth, nHeight, pMemory.get()));
+    wrapper.restore();
     static_cast<void>(pMemory.release());
-    return pTexture;
+    return pTexture.release();
 }
 
 void TexturePool::returnClientStorageTextureRECTToPool(OGL::TextureRECT* pTexture) {

@@ -2,14 +2,29 @@
 
 namespace ORVO::OGL {
 
+namespace {
+
+/// Leaves no context current. A destructor lets nothing out; the next use of a context reports what is wrong.
+void releaseCurrent() noexcept {
+    try {
+        NativeContext().makeCurrent();
+    } catch (...) {
+        return;
+    }
+}
+
+} // namespace
+
 ScopedContextWrapper::ScopedContextWrapper() noexcept : oSaved_(NativeContext::current()) {}
 
 ScopedContextWrapper::~ScopedContextWrapper() {
     try {
-        oSaved_.makeCurrent();
+        restore();
     } catch (...) {
-        // A destructor lets nothing out; the next use of a context reports what is wrong with it.
+        releaseCurrent();
     }
 }
+
+void ScopedContextWrapper::restore() { oSaved_.makeCurrent(); }
 
 } // namespace ORVO::OGL

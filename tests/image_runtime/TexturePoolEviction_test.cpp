@@ -118,6 +118,40 @@ TEST_F(TexturePoolEviction, GoesRoundOverTheKindsOldestFirst) {
     pool().returnClientStorageTextureRECTToPool(aClient[1]);
 }
 
+/// Counts the textures that are left when it is told of freed memory.
+class CountingListener : public VideoMemory::VideoMemoryListener {
+public:
+    explicit CountingListener(long (*pTextures)()) : pTextures_(pTextures) {}
+    void memoryFreed(std::size_t) override { nLeft_ = pTextures_(); }
+
+    long nLeft_ = -1;
+
+private:
+    long (*pTextures_)();
+};
+
+TEST_F(TexturePoolEviction, TellsOfA2DTextureBeforeTheOtherKindsFollow) {
+    CountingListener listener(&TexturePoolEviction::textures);
+    oConfiguration_.setVideoMemoryListener(&listener);
+    remake();
+    long const nBefore = textures();
+    OGL::Texture1D* const p1D = take1D(10);
+    OGL::Texture2D* const p2D = takeBytes(20);
+    OGL::Texture3D* const p3D = take3D(30);
+    OGL::TextureRECT* const pRECT = takeRECT(40);
+    OGL::TextureRECT* const pClient = takeClient(64, 64);
+    pool().returnTexture1DToPool(p1D);
+    pool().returnTexture2DToPool(p2D);
+    pool().returnTexture3DToPool(p3D);
+    pool().returnTextureRECTToPool(pRECT);
+    pool().returnClientStorageTextureRECTToPool(pClient);
+    ASSERT_EQ(nBefore + 5, textures());
+    pool().setMaximumPoolSize(0);
+    EXPECT_EQ(nBefore + 3, listener.nLeft_);
+    EXPECT_EQ(nBefore, textures());
+    pPool_.reset();
+}
+
 TEST_F(TexturePoolEviction, TellsOfEachPassAlsoWithout2DTextures) {
     pool().returnTexture1DToPool(take1D(8));
     pool().returnTexture1DToPool(take1D(9));

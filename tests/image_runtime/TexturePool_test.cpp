@@ -467,7 +467,7 @@ TEST_F(TexturePoolTest, SurvivesEveryFailureOfTheDriver) {
         pOwn.reset();
         EXPECT_EQ(0u, drainErrors());
     };
-    // A refusal to go back to the caller's context has nobody to tell.
+    // Where the pool begins or ends, a refusal to go back to the caller's context has nobody to tell.
     std::set<std::string> const aFailed = ORVO::Test::failEveryCallBefore(code, end, {"eglMakeCurrent"});
     EXPECT_EQ(1u, aFailed.count("eglCreateContext"));
     EXPECT_EQ(1u, aFailed.count("eglMakeCurrent"));
@@ -476,6 +476,33 @@ TEST_F(TexturePoolTest, SurvivesEveryFailureOfTheDriver) {
     EXPECT_EQ(1u, aFailed.count("glTexImage1D"));
     EXPECT_EQ(1u, aFailed.count("glTexImage2D"));
     EXPECT_EQ(1u, aFailed.count("glTexImage3D"));
+}
+
+TEST_F(TexturePoolTest, SaysWhenItCannotGoBackToTheCallersContext) {
+    auto const refused = [this](auto const& code) {
+        // The first call goes to the hidden context, the second one back.
+        ORVO::Test::GLCallFailure const failure("eglMakeCurrent", 2);
+        ORVO_EXPECT_OGL(code(), "The OpenGL context could not be made current");
+        EXPECT_TRUE(failure.hasFired());
+        EXPECT_EQ(host().handle(), OGL::NativeContext::currentHandle()) << "the second attempt";
+    };
+    refused([this] { pool().getTexture2DFromPool(4, 4, eRGBA8, true); });
+    EXPECT_EQ((Events{{"impending", 64}, {"allocated", 64}}), oListener_.take());
+    EXPECT_EQ(64u, freeBytes()) << "what was made is there the next time";
+    refused([this] { pool().getTexture1DFromPool(4, eRGBA8, true); });
+    refused([this] { pool().getTexture3DFromPool(4, 4, 4, eRGBA8, true); });
+    refused([this] { pool().getTextureRECTFromPool(4, 4, eRGBA8, true); });
+    EXPECT_EQ(64u + 16 + 256 + 64, freeBytes());
+    refused([this] {
+        pool().getClientStorageTextureRECTFromPool(4, 4, Texture::FORMAT_RGBA, Texture::TYPE_UNSIGNED_BYTE);
+    });
+    EXPECT_EQ(64u + 16 + 256 + 64, freeBytes());
+    OGL::Texture2D* const pTexture = pool().getTexture2DFromPool(4, 4, eRGBA8, true);
+    EXPECT_EQ(Events(), oListener_.take());
+    pool().returnTexture2DToPool(pTexture);
+    refused([this] { pool().setMaximumPoolSize(100); });
+    EXPECT_GE(75u, freeBytes());
+    refused([this] { pool().clear2DPool(); });
 }
 
 TEST_F(TexturePoolTest, DiesWhereItsOwnContextIsRefused) {

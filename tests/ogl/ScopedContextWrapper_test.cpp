@@ -1,9 +1,11 @@
 #include "orvo/ogl/ScopedContextWrapper.h"
 
+#include <memory>
 #include <type_traits>
 
 #include "orvo/ogl/ContextOffscreen.h"
 #include "orvo/ogl/NativeContext.h"
+#include "tests/support/gl/ExpectOGL.h"
 #include "tests/support/gl/GLTest.h"
 
 namespace {
@@ -68,7 +70,60 @@ TEST_P(ScopedContextWrapper, LetsNothingOutWhenTheContextHasDied) {
     EXPECT_NE(host().handle(), NativeContext::currentHandle());
 }
 
+TEST_P(ScopedContextWrapper, BringsTheContextBackBeforeItsEnd) {
+    auto const pHost = OGL::Context::adoptCurrent();
+    OGL::ContextOffscreen const offscreen(pHost.get());
+    NativeContext const before = NativeContext::current();
+    OGL::ScopedContextWrapper wrapper;
+    offscreen.makeCurrent();
+    wrapper.restore();
+    EXPECT_EQ(before, NativeContext::current());
+}
+
 ORVO_INSTANTIATE_ON_EACH_INTERFACE(ScopedContextWrapper);
+
+class ScopedContextWrapperRefused : public ORVO::Test::GLTest {
+protected:
+    void SetUp() override {
+        GLTest::SetUp();
+        pHost_ = OGL::Context::adoptCurrent();
+        pOffscreen_ = std::make_unique<OGL::ContextOffscreen>(pHost_.get());
+    }
+
+    void TearDown() override {
+        host().makeCurrent();
+        pOffscreen_.reset();
+        pHost_.reset();
+        GLTest::TearDown();
+    }
+
+    std::unique_ptr<OGL::Context> pHost_;
+    std::unique_ptr<OGL::ContextOffscreen> pOffscreen_;
+};
+
+TEST_F(ScopedContextWrapperRefused, LeavesNoneCurrentAtItsEnd) {
+    auto pWrapper = std::make_unique<OGL::ScopedContextWrapper>();
+    pOffscreen_->makeCurrent();
+    {
+        ORVO::Test::GLCallFailure const failure("eglMakeCurrent", 1);
+        pWrapper.reset();
+        EXPECT_TRUE(failure.hasFired());
+    }
+    EXPECT_EQ(nullptr, NativeContext::currentHandle());
+}
+
+TEST_F(ScopedContextWrapperRefused, SaysSoWhenItIsAskedToRestore) {
+    {
+        OGL::ScopedContextWrapper wrapper;
+        pOffscreen_->makeCurrent();
+        {
+            ORVO::Test::GLCallFailure const failure("eglMakeCurrent", 1);
+            ORVO_EXPECT_OGL(wrapper.restore(), "The OpenGL context could not be made current");
+        }
+        EXPECT_NE(host().handle(), NativeContext::currentHandle());
+    }
+    EXPECT_EQ(host().handle(), NativeContext::currentHandle()) << "the end tries once more";
+}
 
 TEST(NativeContext, IsEmptyWhereNoneIsCurrent) {
     NativeContext const none = NativeContext::current();

@@ -4,10 +4,10 @@
 #include "orvo/core/utility/SharedPtr.h"
 #include "orvo/filter_graph/internal/ImageAccessor.h"
 #include "orvo/image_runtime/images/ImageGPU.h"
-#include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/Framebuffer.h"
 #include "orvo/ogl/Texture2D.h"
-#include "orvo/ogl/internal/GL.h"
+#include "orvo/ogl/internal/Failure.h"
+#include "orvo/ogl/internal/ScopedFramebufferBindings.h"
 
 #include <memory>
 #include <utility>
@@ -22,20 +22,6 @@ struct ForgetTexture {
         pImage->forgetTexture();
         trackedDelete(pImage);
     }
-};
-
-/// Binds the framebuffer that was bound, at the end of the scope.
-class FramebufferRestore {
-public:
-    explicit FramebufferRestore(OGL::Framebuffer const& framebuffer) : nSaved_(framebuffer.getBoundID()) {}
-    ~FramebufferRestore() {
-        OGL::ExtensionManager::Instance()->table()->glBindFramebuffer(GL_FRAMEBUFFER, nSaved_);
-    }
-    FramebufferRestore(FramebufferRestore const&) = delete;
-    FramebufferRestore& operator=(FramebufferRestore const&) = delete;
-
-private:
-    unsigned nSaved_;
 };
 
 } // namespace
@@ -75,11 +61,12 @@ void ImageGL::clear() {
     if (!pImage) {
         return;
     }
+    OGL::Internal::ScopedFramebufferBindings const restore;
     OGL::Framebuffer framebuffer;
-    FramebufferRestore const restore(framebuffer);
     framebuffer.bind();
     framebuffer.attach(pImage->texture(), 0, 0);
     pImage->initializeToTransparentBlack();
+    ORVO_OGL_THROW_ON_ERROR("The texture could not be cleared");
 }
 
 } // namespace ORVO::FilterGraph

@@ -15,6 +15,7 @@
 #include "orvo/filter_graph/internal/GraphTraverser.h"
 #include "orvo/filter_graph/internal/IFilterExecutable.h"
 #include "orvo/filter_graph/internal/ImageFlowFilterExecutable.h"
+#include "orvo/filter_graph/internal/InputAdapter.h"
 #include "orvo/filter_graph/internal/OutputAdapter.h"
 #include "orvo/filter_graph/internal/OutputAdapterExecutable.h"
 #include "orvo/filter_graph/internal/ScopedGraphContext.h"
@@ -300,6 +301,10 @@ InputConnector* GraphExecutable::prependImageFlowConverter(std::shared_ptr<Image
 void GraphExecutable::collectForFrames() {
     for (auto const& [pFilter, spExecutable] : aFilterExecutables_) {
         aExecutablesInOrder_.push_back(spExecutable.get());
+        auto* const pInput = dynamic_cast<InputAdapter*>(pFilter);
+        if (pInput && pInput->getImageDescriptor().type() == ORVO_TARGET_GL) {
+            aTextureInputs_.push_back(pInput);
+        }
         if (dynamic_cast<IAdapter*>(pFilter)) {
             aAdapterExecutables_.push_back(spExecutable.get());
         }

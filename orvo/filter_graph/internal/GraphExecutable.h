@@ -9,6 +9,7 @@
 #include "orvo/core/Export.h"
 #include "orvo/core/TargetPlatform.h"
 #include "orvo/filter_graph/impl/IProcessorBase.h"
+#include "orvo/filter_graph/internal/ClientTextureParameters.h"
 #include "orvo/filter_graph/internal/ParameterForwarder.h"
 
 namespace ORVO {
@@ -36,6 +37,7 @@ namespace ORVO::FilterGraph::Internal {
 
 class Filter;
 class IFilterExecutable;
+class InputAdapter;
 class OutputAdapter;
 
 /// The compiled form of one intermediate graph for one set of options: image nodes on a controller, wired
@@ -46,9 +48,12 @@ class OutputAdapter;
 /// differs: the layout that a node wants its pixels in, and the place where the client's images live.
 ///
 /// With a context the graph has a hidden context of its own that shares with it. Nodes are built, run and
-/// freed in that one, and whatever context the host has current is current again after each call. What a
-/// frame draws into a client's texture is drawn before anything that the host's context, current at
-/// `processFrame`, is given afterwards; at the end of an asynchronous frame it is complete.
+/// freed in that one, and whatever context the host has current is current again after each call. What the
+/// host's context, current at a launch, was given before is done before the frame touches a client's texture.
+/// What a frame draws into one is drawn before anything that the host's context, current at `processFrame`,
+/// is given afterwards; at the end of an asynchronous frame, or where the host has none current, it is
+/// complete. Filters, wrap modes and border colours of the textures that a frame reads are another's while it
+/// runs and what they were at its end.
 ///
 /// What a frame may keep of the one before: with `cachingMode` 0 nothing. With any other mode the results of
 /// the nodes that are not dirty, where dirty is a node one of whose parameters changed, a source whose image
@@ -168,6 +173,16 @@ private:
     void returnStuff();
     /// Whether frames draw into a client's texture.
     bool drawsIntoTexture() const;
+    /// Whether frames read or draw into a client's texture.
+    bool usesTextures() const;
+    /// Notes how the client has the textures sampled that a frame reads.
+    void keepTextureParameters(ClientTextureParameters& parameters) const;
+    /// At the end of an asynchronous frame: leaves the client's textures complete and sampled as before.
+    void settleTextures();
+    /// Puts back, after an asynchronous frame, what its thread could not, which was refused the context.
+    void putBackTextureParameters();
+    /// Whether the current context shares with the graph's.
+    bool isHostSharing() const;
     static bool internalCompletionCallback(void* self);
     void callCompletionCallback();
 
@@ -184,12 +199,14 @@ private:
 
     std::vector<IFilterExecutable*> aExecutablesInOrder_; // the values of aFilterExecutables_ in map order
     std::vector<IFilterExecutable*> aAdapterExecutables_; // those among them whose key is an adapter
+    std::vector<InputAdapter*> aTextureInputs_;           // those whose image is a client's texture
     std::vector<ImageFilter*> aNodesProducersFirst_;      // all that the sink reaches
     std::vector<ImageFilter*> aFanOutNodes_;              // those among them with more than one output
 
     bool bFrameOut_ = false;                         // an asynchronous frame was launched and not waited for
     std::atomic<bool> bLastFrameBroken_{false};      // the last frame threw, or failed on its thread
     std::atomic<bool> bCancelled_{false};            // a cancel was asked for since the last launch
+    ClientTextureParameters oTextureParameters_;     // of the asynchronous frame that is out
     std::atomic<std::thread::id> oCallbackThread_{}; // the thread that is inside the completion callback
 };
 

@@ -12,6 +12,8 @@
 #include "orvo/filter_graph/impl/FilterGraphLibrary.h"
 #include "orvo/filter_graph/impl/ImageDescriptor.h"
 #include "orvo/filter_graph/internal/IFilterExecutable.h"
+#include "orvo/filter_graph/internal/ImageAccessor.h"
+#include "orvo/filter_graph/internal/InputAdapter.h"
 #include "orvo/filter_graph/internal/OutputAdapter.h"
 #include "orvo/filter_graph/internal/ScopedGraphContext.h"
 #include "orvo/image_flow/controllers/Bedding.h"
@@ -30,6 +32,14 @@ using DataFlow::OutputConnector;
 constexpr double kNoTimeout = std::numeric_limits<double>::infinity();
 constexpr double kTailInterval =
     1e-4; // seconds between two looks at a frame whose end is a few instructions away
+
+/// Lets the current context, which shares with the one of the mark, run behind the mark; then frees it.
+void waitFor(std::optional<OGL::Fence>& oMark) noexcept {
+    if (oMark) {
+        oMark->wait();
+        oMark.reset();
+    }
+}
 
 /// Takes the image that one output of the node holds to all those that hold none. False if an output is for
 /// another kind of image.
@@ -166,20 +176,55 @@ bool GraphExecutable::drawsIntoTexture() const {
     return spContext_ && pOutput_->getImageDescriptor().type() == ORVO_TARGET_GL;
 }
 
+bool GraphExecutable::usesTextures() const { return !aTextureInputs_.empty() || drawsIntoTexture(); }
+
+void GraphExecutable::keepTextureParameters(ClientTextureParameters& parameters) const {
+    for (InputAdapter const* const pInput : aTextureInputs_) {
+        auto const* const pImage = ImageAccessor::getImpl<ORVO::ImageGPU>(pInput->getImage());
+        if (pImage && pImage->texture()) {
+            parameters.keep(*pImage->texture());
+        }
+    }
+}
+
+void GraphExecutable::putBackTextureParameters() {
+    if (!oTextureParameters_.empty()) {
+        ScopedGraphContext const current(spContext_);
+        oTextureParameters_.putBack();
+    }
+}
+
+bool GraphExecutable::isHostSharing() const {
+    return spContext_ && spContext_->isSharingWithCurrentContext();
+}
+
 void GraphExecutable::processFrame() {
     waitForRunningFrame(); // whose thread has the graph's context
+    bool const bHostShares = isHostSharing();
+    std::optional<OGL::Fence> oGiven;
+    if (bHostShares && usesTextures()) {
+        oGiven.emplace();
+    }
     std::optional<OGL::Fence> oDrawn;
     {
-        ScopedGraphContext const current(spContext_);
+        ScopedGraphContext current(spContext_);
+        waitFor(oGiven);
         settleLastFrame();
         ORVO_CHECK(pOutput_, "pOutputAdapter");
         bProcessingComplete_.store(false, std::memory_order_release);
         bLastFrameBroken_ = true;
         prepareNodes();
         prepareCaches();
-        spBedding_->process();
-        if (drawsIntoTexture()) {
+        {
+            ClientTextureParameters parameters;
+            keepTextureParameters(parameters);
+            spBedding_->process();
+        }
+        if (drawsIntoTexture() && bHostShares) {
             oDrawn.emplace();
+            current.restore();
+        } else if (drawsIntoTexture()) {
+            OGL::finishCurrentContext();
         }
     }
     if (oDrawn) {
@@ -192,9 +237,14 @@ void GraphExecutable::processFrame() {
 
 void* GraphExecutable::asyncProcessFrame() {
     waitForRunningFrame(); // whose thread has the graph's context
+    std::optional<OGL::Fence> oGiven;
+    if (usesTextures() && isHostSharing()) {
+        oGiven.emplace();
+    }
     {
         // Let go of before the launch: the frame's thread makes the same context current.
         ScopedGraphContext const current(spContext_);
+        waitFor(oGiven);
         settleLastFrame();
         ORVO_CHECK(pOutput_, "pOutputAdapter");
         bProcessingComplete_.store(false, std::memory_order_release);
@@ -205,12 +255,14 @@ void* GraphExecutable::asyncProcessFrame() {
         if (Library::getInitializationOptions().getAllocationMode() == 1) {
             allocateOutputImages();
         }
+        keepTextureParameters(oTextureParameters_);
     }
     bFrameOut_ = true;
     try {
         spBedding_->processAsync();
     } catch (...) {
         bFrameOut_ = false;
+        putBackTextureParameters();
         throw;
     }
     bLastFrameBroken_ = false;
@@ -226,6 +278,7 @@ bool GraphExecutable::waitForFrame(double timeout, double interval) {
     bool const bEnded = spController_->wait(timeout, interval);
     if (bEnded) {
         bFrameOut_ = false;
+        putBackTextureParameters();
     }
     return bEnded;
 }
@@ -237,8 +290,14 @@ void GraphExecutable::waitForRunningFrame() {
     ORVO_CHECK(oCallbackThread_.load() != std::this_thread::get_id(),
                "The completion callback must not change the frame that it ends");
     bProcessingComplete_.wait(false, std::memory_order_acquire);
-    // Completion is recorded a moment before the frame's last step.
-    spController_->wait(kNoTimeout, kTailInterval);
+    try {
+        // Completion is recorded a moment before the frame's last step.
+        spController_->wait(kNoTimeout, kTailInterval);
+        putBackTextureParameters();
+    } catch (...) {
+        // An error of OpenGL's in a frame that nobody waited for. It must not come out of the next one.
+        bLastFrameBroken_ = true;
+    }
     bFrameOut_ = false;
 }
 
@@ -257,23 +316,37 @@ void GraphExecutable::setCompletionCallback(bool (*callback)(void*)) { pCompleti
 
 bool GraphExecutable::internalCompletionCallback(void* self) {
     auto* const pExecutable = static_cast<GraphExecutable*>(self);
-    try {
-        if (pExecutable->drawsIntoTexture()) {
-            ScopedGraphContext const current(pExecutable->spContext_);
-            OGL::finishCurrentContext();
+    auto const attempt = [pExecutable](auto const& step) {
+        try {
+            step();
+        } catch (ExceptionBase const& exception) {
+            pExecutable->spController_->saveException(exception.clone());
+        } catch (...) {
+            pExecutable->spController_->saveException(
+                ORVO_NEW CPURuntimeException(CPURuntimeException::CONDITION_UNKNOWN));
         }
+    };
+    // A frame whose thread is refused the context has ended all the same, and its host is told.
+    attempt([pExecutable] { pExecutable->settleTextures(); });
+    attempt([pExecutable] {
         pExecutable->returnStuff();
         pExecutable->callCompletionCallback();
-    } catch (ExceptionBase const& exception) {
-        pExecutable->spController_->saveException(exception.clone());
-    } catch (...) {
-        pExecutable->spController_->saveException(
-            ORVO_NEW CPURuntimeException(CPURuntimeException::CONDITION_UNKNOWN));
-    }
+    });
     // The host may destroy the frame's results, but not this object, as soon as it sees this.
     pExecutable->bProcessingComplete_.store(true, std::memory_order_release);
     pExecutable->bProcessingComplete_.notify_all();
     return true;
+}
+
+void GraphExecutable::settleTextures() {
+    if (!usesTextures()) {
+        return;
+    }
+    ScopedGraphContext const current(spContext_);
+    oTextureParameters_.putBack();
+    if (drawsIntoTexture()) {
+        OGL::finishCurrentContext();
+    }
 }
 
 void GraphExecutable::callCompletionCallback() {

@@ -19,6 +19,14 @@ public:
         }
     }
 
+    /// Makes the former context current before the end of the scope. Throws OGL::ExceptionOGL if the driver
+    /// refuses.
+    void restore() {
+        if (oSaved_) {
+            oSaved_->restore();
+        }
+    }
+
 private:
     std::optional<OGL::ScopedContextWrapper> oSaved_;
 };

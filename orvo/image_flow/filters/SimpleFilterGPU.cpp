@@ -267,6 +267,14 @@ void SimpleFilterGPU::unbindInputs() {
     }
 }
 
+void SimpleFilterGPU::forgetBindings() const noexcept {
+    for (std::size_t iInput = 0; iInput < numberOfImageInputs(); ++iInput) {
+        if (ImageGPU const* const pImage = inputImageGPU(iInput)) {
+            pImage->forgetBinding();
+        }
+    }
+}
+
 bool SimpleFilterGPU::hasUnfinishedPass() const noexcept { return pOutputImage_ != nullptr; }
 
 void SimpleFilterGPU::dropUnfinishedPass() noexcept {
@@ -291,6 +299,7 @@ void SimpleFilterGPU::abandonPass() noexcept {
         // The context that the pass ran in is gone, and what it bound with it.
         pFramebuffer_ = nullptr;
     }
+    forgetBindings();
     pFramebuffer_ = nullptr;
     pOutputImage_ = nullptr;
     spNewImage_.reset();

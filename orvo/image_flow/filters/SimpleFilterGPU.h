@@ -108,6 +108,8 @@ private:
     ImageGPU::tePixelFormat outputFormat();
     void setUpQuad();
     void unbindInputs();
+    /// An image of a client's would otherwise count as bound, for ever, to a unit of a context that is gone.
+    void forgetBindings() const noexcept;
 
     /// The image of this pass until it is handed on; empty where the output is bound.
     DataFlow::ConstDataPointer<ImageGPU> spNewImage_;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "orvo/ogl/Framebuffer.h"
+#include "orvo/ogl/internal/ScopedFramebufferBindings.h"
 
 namespace ORVO {
 
@@ -22,21 +23,8 @@ public:
     ScopedReadFramebuffer& operator=(ScopedReadFramebuffer const&) = delete;
 
 private:
-    /// The bindings, put back after the framebuffer is gone.
-    class Bindings {
-    public:
-        Bindings();
-        ~Bindings();
-        Bindings(Bindings const&) = delete;
-        Bindings& operator=(Bindings const&) = delete;
-
-    private:
-        bool bSeparate_;
-        unsigned nDraw_;
-        unsigned nRead_;
-    };
-
-    Bindings oBindings_;
+    /// Put back after the framebuffer is gone.
+    OGL::Internal::ScopedFramebufferBindings oBindings_;
     OGL::Framebuffer oFramebuffer_;
     OGL::Texture2& texture_;
 };

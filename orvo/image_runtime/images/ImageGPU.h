@@ -112,6 +112,9 @@ public:
     void bind(unsigned unit) const;
     /// Binds no texture to the unit that the image is bound to; does nothing for an unbound image.
     void bindDefault() const;
+    /// Counts as unbound, without a call to OpenGL: for holders whose context is gone, and with it what was
+    /// bound there.
+    void forgetBinding() const noexcept { nBoundTexUnit_ = -1; }
     /// Switch texturing of fixed function on a unit, which becomes the active one.
     /// @throws ParameterException "The texture unit does not exist".
     void enable(unsigned unit) const;

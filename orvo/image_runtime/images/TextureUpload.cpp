@@ -147,10 +147,11 @@ private:
 void copyRows(unsigned char* pDestination, unsigned char const* pSource, std::size_t nSourceStride,
               std::size_t nRowBytes, std::size_t nRows) {
     // A thread that waits for its helpers may meanwhile run work that makes another context current.
-    OGL::ScopedContextWrapper const restoreContext;
+    OGL::ScopedContextWrapper wrapper;
     tbb::affinity_partitioner partitioner;
     tbb::parallel_for(tbb::blocked_range<std::size_t>(0, nRows),
                       ArrayMemCopy(pDestination, nRowBytes, pSource, nSourceStride, nRowBytes), partitioner);
+    wrapper.restore();
 }
 
 /// A buffer of the pool's queue. What fails on the way to its return leaves it unmapped, unbound and returned

@@ -1,43 +1,18 @@
-// Frames of processors on OpenGL: synchronous and asynchronous, one after the other, on several contexts,
-// with every call of OpenGL failing in turn.
+// Frames of processors on OpenGL: synchronous and asynchronous, one after the other, on several contexts.
 #include <atomic>
 #include <thread>
 
 #include "orvo/filter_graph/filters/StandardFilters.h"
 #include "orvo/filter_graph/impl/FilterFactory.h"
-#include "orvo/image_runtime/TexturePool.h"
+#include "orvo/ogl/ExceptionOGL.h"
 #include "orvo/ogl/NativeContext.h"
+#include "tests/filter_graph/gl/GLChain.h"
 #include "tests/support/Expect.h"
-#include "tests/support/gl/GLFrameTest.h"
 
 namespace ORVO::FilterGraph {
 namespace {
 
 using namespace ORVO::Test;
-
-constexpr int kWidth = 9;
-constexpr int kHeight = 6;
-constexpr double kLong = 60.0; // seconds, far beyond what any frame here takes
-constexpr float kStep = 1.0f / 255.0f;
-
-/// host memory -> add -> host memory, or textures.
-struct Chain {
-    Chain(ImageBase* pInput, ImageBase* pOutput, OGL::Context const* pContext)
-        : spSource_(makeGLSource(pInput)),
-          spSink_(makeGLSink(pOutput)),
-          spProcessor_(createProcessor(spSink_, pContext)) {
-        Connect(spSource_, spAdd_);
-        Connect(spAdd_, spSink_);
-        add(10);
-    }
-
-    void add(int steps) { setParameter(*spAdd_, "value", static_cast<float>(steps) * kStep); }
-
-    SourcePtr spSource_;
-    FilterPtr spAdd_ = makeAddShader();
-    SinkPtr spSink_;
-    std::shared_ptr<IProcessor> spProcessor_;
-};
 
 class GLFramesTest : public GLFrameTest {};
 
@@ -128,6 +103,27 @@ TEST_F(GLFramesTest, TheHostsStateAndContextAreAsTheyWere) {
     EXPECT_EQ(OGL::NativeContext::currentHandle(), pHandle);
 }
 
+TEST_F(GLFramesTest, TexturesAreSampledAsTheHostLeftThem) {
+    TextureImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    TextureImage output(0, 0, kWidth, kHeight);
+    Sampling::makeOdd(input.texture());
+    Sampling::makeOdd(output.texture());
+    Sampling const before(input.texture());
+    Chain chain(input.handle(), output.handle(), context());
+    chain.spProcessor_->processFrame(glOptions());
+    EXPECT_TRUE(Sampling(input.texture()) == before);
+    chain.spProcessor_->asyncProcessFrame(glOptions());
+    ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+    EXPECT_TRUE(Sampling(input.texture()) == before);
+    {
+        GLCallFailure const failure("glCheckFramebufferStatus", 1);
+        EXPECT_THROW(chain.spProcessor_->processFrame(glOptions()), OGL::ExceptionOGL);
+    }
+    EXPECT_TRUE(Sampling(input.texture()) == before) << "after a frame that failed";
+    EXPECT_TRUE(Sampling(output.texture()) == before);
+}
+
 TEST_F(GLFramesTest, RunWithNoContextCurrent) {
     ByteImage input(0, 0, kWidth, kHeight);
     input.write(pattern(kWidth, kHeight));
@@ -144,6 +140,60 @@ TEST_F(GLFramesTest, RunWithNoContextCurrent) {
         EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 20));
     } // the graph dies with no context current
     EXPECT_EQ(OGL::NativeContext::currentHandle(), nullptr);
+}
+
+TEST_F(GLFramesTest, TexturesAreTouchedInTheOrderOfTheHostsCommands) {
+    ByteImage bytesIn(0, 0, kWidth, kHeight);
+    ByteImage bytesOut(0, 0, kWidth, kHeight);
+    TextureImage textureIn(0, 0, kWidth, kHeight);
+    TextureImage textureOut(0, 0, kWidth, kHeight);
+    struct Row {
+        ImageBase* pInput;
+        ImageBase* pOutput;
+        std::uint64_t nWaits;      // a frame's for the host, and the host's for the frame
+        std::uint64_t nAsyncWaits; // those of an asynchronous frame, which is complete when it ends
+    };
+    for (Row const& row :
+         {Row{bytesIn.handle(), bytesOut.handle(), 0, 0}, Row{textureIn.handle(), bytesOut.handle(), 1, 1},
+          Row{bytesIn.handle(), textureOut.handle(), 2, 1},
+          Row{textureIn.handle(), textureOut.handle(), 2, 1}}) {
+        Chain chain(row.pInput, row.pOutput, context());
+        chain.spProcessor_->processFrame(glOptions());
+        ObjectCounts const objects = GLHooks::objects();
+        std::uint64_t const nWaits = GLHooks::calls("glWaitSync");
+        chain.spProcessor_->processFrame(glOptions());
+        EXPECT_EQ(GLHooks::calls("glWaitSync") - nWaits, row.nWaits);
+        chain.spProcessor_->asyncProcessFrame(glOptions());
+        ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+        EXPECT_EQ(GLHooks::calls("glWaitSync") - nWaits, row.nWaits + row.nAsyncWaits);
+        EXPECT_EQ(GLHooks::objects(), objects);
+    }
+}
+
+TEST_F(GLFramesTest, ATextureIsCompleteWhereTheHostHasNoContextToWaitIn) {
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    TextureImage output(0, 0, kWidth, kHeight);
+    auto const pForeign = host().another(false);
+    {
+        Chain chain(input.handle(), output.handle(), context());
+        chain.spProcessor_->processFrame(glOptions());
+        ObjectCounts const objects = GLHooks::objects();
+        for (bool const bForeign : {false, true}) {
+            output.write(std::vector<std::uint8_t>(4 * kWidth * kHeight, 1));
+            if (bForeign) {
+                pForeign->makeCurrent();
+            } else {
+                host().release();
+            }
+            std::uint64_t const nFinishes = GLHooks::calls("glFinish");
+            chain.spProcessor_->processFrame(glOptions());
+            EXPECT_EQ(GLHooks::calls("glFinish") - nFinishes, 1u);
+            EXPECT_EQ(GLHooks::objects(), objects);
+            host().makeCurrent();
+            EXPECT_EQ(output.read(), plus(pattern(kWidth, kHeight), 10));
+        }
+    }
 }
 
 TEST_F(GLFramesTest, RunUnderAForeignContext) {
@@ -231,6 +281,34 @@ TEST_F(GLFramesTest, AsynchronousFramesDrawIntoTextures) {
     EXPECT_EQ(nCallbacks, 20);
 }
 
+/// The layers let frames allocate on the thread that launches them.
+class GLAllocationFramesTest : public GLFrameTest {
+protected:
+    GLAllocationFramesTest() : GLFrameTest(Library::InitializationOptions(Library::ALLOCATE_BEFORE_LAUNCH)) {}
+};
+
+TEST_F(GLAllocationFramesTest, AreAsRightAsTheOthers) {
+    ByteImage bytes(0, 0, kWidth, kHeight);
+    TextureImage texture(0, 0, kWidth, kHeight);
+    ByteImage input(0, 0, kWidth, kHeight);
+    input.write(pattern(kWidth, kHeight));
+    for (ImageBase* const pOutput :
+         {static_cast<ImageBase*>(bytes.handle()), static_cast<ImageBase*>(texture.handle())}) {
+        Chain chain(input.handle(), pOutput, context());
+        for (int const steps : {1, 2, 3}) {
+            chain.add(steps);
+            chain.spProcessor_->asyncProcessFrame(glOptions());
+            ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
+            EXPECT_EQ(pOutput == bytes.handle() ? bytes.bytes() : texture.read(),
+                      plus(pattern(kWidth, kHeight), steps));
+        }
+        chain.add(9);
+        chain.spProcessor_->processFrame(glOptions());
+        EXPECT_EQ(pOutput == bytes.handle() ? bytes.bytes() : texture.read(),
+                  plus(pattern(kWidth, kHeight), 9));
+    }
+}
+
 TEST_F(GLFramesTest, CancelledFramesLeaveTheNextOneRight) {
     ByteImage input(0, 0, kWidth, kHeight);
     input.write(pattern(kWidth, kHeight));
@@ -250,67 +328,6 @@ TEST_F(GLFramesTest, CancelledFramesLeaveTheNextOneRight) {
         }
     }
     ASSERT_EQ(chain.spProcessor_->waitForFrame(kLong, 0.0005), IProcessorBase::FRAME_COMPLETE);
-}
-
-// ---- Failures
-
-TEST_F(GLFramesTest, EveryCallThatFailsLeavesTheNextFrameRight) {
-    ByteImage input(0, 0, kWidth, kHeight);
-    input.write(pattern(kWidth, kHeight));
-    TextureImage texture(0, 0, kWidth, kHeight);
-    ByteImage output(0, 0, kWidth, kHeight);
-    for (ImageBase* const pOutput :
-         {static_cast<ImageBase*>(output.handle()), static_cast<ImageBase*>(texture.handle())}) {
-        int nFailed = 0;
-        for (std::uint64_t n = 1;; ++n) {
-            // A new processor each time, so that building fails in turn, too.
-            Chain chain(input.handle(), pOutput, context());
-            TexturePool::Instance()->clearAll();
-            bool bFired = false;
-            std::string sFailed;
-            {
-                GLCallFailure const failure(n);
-                try {
-                    chain.spProcessor_->processFrame(glOptions());
-                } catch (ExceptionBase const&) {
-                    ++nFailed;
-                } catch (std::bad_alloc const&) {
-                    ++nFailed;
-                }
-                bFired = failure.hasFired();
-                sFailed = failure.name();
-            }
-            // A driver that refuses to make the host's context current again leaves the graph's.
-            host().makeCurrent();
-            drainErrors();
-            output.fill(std::uint8_t(1));
-            texture.write(output.bytes());
-            ASSERT_NO_THROW(chain.spProcessor_->processFrame(glOptions())) << "after failed " << sFailed;
-            std::vector<std::uint8_t> const aResult =
-                pOutput == output.handle() ? output.bytes() : texture.read();
-            ASSERT_EQ(aResult, plus(pattern(kWidth, kHeight), 10)) << "after failed " << sFailed;
-            if (!bFired) {
-                break;
-            }
-        }
-        EXPECT_GT(nFailed, 5);
-    }
-}
-
-TEST_F(GLFramesTest, TheGraphOutlivesTheHostsContext) {
-    ByteImage input(0, 0, kWidth, kHeight);
-    input.write(pattern(kWidth, kHeight));
-    ByteImage output(0, 0, kWidth, kHeight);
-    auto const pSecond = host().another(true);
-    pSecond->makeCurrent();
-    auto const pSecondContext = OGL::Context::adoptCurrent();
-    Chain chain(input.handle(), output.handle(), pSecondContext.get());
-    chain.spProcessor_->processFrame(glOptions());
-    host().makeCurrent();
-    pSecond->destroyContext();
-    chain.add(30);
-    chain.spProcessor_->processFrame(glOptions());
-    EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 30));
 }
 
 // ---- Precision and scales

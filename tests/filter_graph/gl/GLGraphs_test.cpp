@@ -162,6 +162,34 @@ TEST_F(GLGraphsTest, TheConsumersOnOpenGLShareOneUpload) {
     EXPECT_EQ(output.bytes(), plus(pattern(kWidth, kHeight), 20));
 }
 
+TEST_F(GLGraphsTest, ASIMDProducerIsConvertedOnceForThePlainAndForTheTextureConsumer) {
+    FloatImage input(0, 0, kWidth, kHeight, 1, 0.1f);
+    FloatImage output(0, 0, kWidth, kHeight, 1, 9.0f);
+    SourcePtr const spSource = makeSource(input);
+    FilterPtr const spSIMD = makeFilter<SIMDGainNode>("simd");
+    FilterPtr const spPlain = makeFilter<AddConstantNode>("plain");
+    FilterPtr const spMean = makeMeanShader("mean", ORVO_TARGET_CPU);
+    SinkPtr const spSink = makeSink(output);
+    setParameter(*spSIMD, "gain", 2.0f);
+    setParameter(*spPlain, "value", 0.4f);
+    Connect(spSource, spSIMD);
+    Connect(spSIMD, spPlain);
+    Connect(spSIMD, spMean->input("a"));
+    Connect(spPlain, spMean->input("b"));
+    Connect(spMean, spSink);
+    auto const pExecutable = build(spSink, cpuOptions());
+    EXPECT_EQ(wiresOf(*pExecutable),
+              (Wires{"AddConstant -> CPU2GPU", "CPU2GPU -> MeanShader", "CPU2GPU -> MeanShader",
+                     "ConvertFromSIMDOptimized -> AddConstant", "ConvertFromSIMDOptimized -> CPU2GPU",
+                     "ConvertToSIMDOptimized -> SIMDGain", "ImageCPUInput -> ConvertToSIMDOptimized",
+                     "MeanShader -> GPU2CPU", "SIMDGain -> ConvertFromSIMDOptimized"}));
+    runFrame(*pExecutable);
+    // The mean of 0.2 and 0.6, which is a number of 255ths: the shader's result has 8 bits.
+    for (float const value : output.pixels()) {
+        EXPECT_NEAR(value, 0.4f, 1e-6f);
+    }
+}
+
 TEST_F(GLGraphsTest, OneTextureFeedsTwoInputsOfAFilter) {
     TextureImage input(0, 0, kWidth, kHeight);
     input.write(pattern(kWidth, kHeight));

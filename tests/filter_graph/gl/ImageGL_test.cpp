@@ -6,7 +6,10 @@
 #include "orvo/filter_graph/internal/ImageAccessor.h"
 #include "orvo/image_runtime/images/ImageGPU.h"
 #include "tests/support/Expect.h"
+#include "tests/support/gl/FailEveryCall.h"
 #include "tests/support/gl/GLFrameTest.h"
+
+#include <set>
 
 namespace ORVO::FilterGraph::Internal {
 namespace {
@@ -144,6 +147,54 @@ TEST_F(ImageGLTest, ClearBlackensATextureThatIsLargerThanTheImageAlone) {
     part.clear();
     EXPECT_EQ(before.differencesTo(GLState::capture()), "");
     EXPECT_EQ(larger.read(), std::vector<std::uint8_t>(aGrey.size(), 0));
+}
+
+TEST_F(ImageGLTest, ClearDoesNotMindTheHostsStateAndKeepsIt) {
+    TextureImage larger(0, 0, 4, 2);
+    larger.write(std::vector<std::uint8_t>(4 * 4 * 2, 9));
+    ImageGL part(oDescriptor_, rect(0, 0, 3, 2), &larger.texture());
+    GLuint aFramebuffers[2] = {};
+    glGenFramebuffers(2, aFramebuffers);
+    glBindFramebuffer(GL_DRAW_FRAMEBUFFER, aFramebuffers[0]);
+    glBindFramebuffer(GL_READ_FRAMEBUFFER, aFramebuffers[1]);
+    glPushAttrib(GL_ALL_ATTRIB_BITS);
+    glEnable(GL_SCISSOR_TEST);
+    glScissor(1, 1, 1, 1);
+    glColorMask(GL_TRUE, GL_FALSE, GL_TRUE, GL_FALSE);
+    glClearColor(0.5f, 0.25f, 0.75f, 1.0f);
+    glViewport(1, 2, 3, 4);
+    GLState const before = GLState::capture();
+    part.clear();
+    EXPECT_EQ(before.differencesTo(GLState::capture()), "");
+    EXPECT_EQ(larger.read(), std::vector<std::uint8_t>(4 * 4 * 2, 0));
+    glPopAttrib();
+    glBindFramebuffer(GL_FRAMEBUFFER, 0);
+    glDeleteFramebuffers(2, aFramebuffers);
+}
+
+TEST_F(ImageGLTest, ClearReportsEveryCallThatFails) {
+    std::vector<std::uint8_t> const aGrey(4 * 4 * 2, 9);
+    TextureImage larger(0, 0, 4, 2);
+    larger.write(aGrey);
+    ImageGL part(oDescriptor_, rect(0, 0, 3, 2), &larger.texture());
+    GLState const before = GLState::capture();
+    std::set<std::string> const aFailed =
+        failEveryCall([&] { part.clear(); },
+                      [&] {
+                          EXPECT_EQ(glGetError(), GL_NO_ERROR);
+                          EXPECT_EQ(before.differencesTo(GLState::capture()), "");
+                          EXPECT_EQ(larger.read(), aGrey);
+                      });
+    EXPECT_EQ(aFailed.count("glGenFramebuffers"), 1u);
+    EXPECT_EQ(aFailed.count("glFramebufferTexture2D"), 1u);
+    EXPECT_EQ(larger.read(), std::vector<std::uint8_t>(aGrey.size(), 0)) << "the run without a failure";
+}
+
+TEST_F(ImageGLTest, TakesHalvesOfThreeChannels) {
+    OGL::Texture2D texture(Texture::INTERNAL_FORMAT_RGB16F, 4, 2, false, nullptr);
+    ImageDescriptorGL const descriptor({3, ImageDescriptor::CHANNEL_TYPE_FLOAT16}, PixelExtentInWorldSpace());
+    ImageGL const image(descriptor, rect(0, 0, 4, 2), &texture);
+    EXPECT_EQ(ImageAccessor::getImpl<GPU>(&image)->pixelFormat(), GPU::PIXEL_FORMAT_RGB16F);
 }
 
 TEST_F(ImageGLTest, WrapsARuntimeImage) {

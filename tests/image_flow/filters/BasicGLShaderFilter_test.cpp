@@ -193,6 +193,21 @@ TEST_F(BasicGLShaderFilterTest, GivesAnImageOnTwoInputsOneUnit) {
     expectTexels(actual, expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
 }
 
+TEST_F(BasicGLShaderFilterTest, RefusesAnImageThatSomebodyElseHasBound) {
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 3, 3), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ShaderNode node(copyShader());
+    ShaderRoad road(frameContext(), node);
+    road.setInput(0, *upInput);
+    frameContext().makeCurrent();
+    upInput->bind(3);
+    host().makeCurrent();
+    ORVO_EXPECT_INTERNAL(road.run(world(0, 0, 3, 3)), "texUnitCount_ == firstTexUnit");
+    EXPECT_EQ(-1, upInput->boundTexUnit());
+    EXPECT_EQ(1, node.texUnitCount_);
+    expectTexels(Texels(*road.run(world(0, 0, 3, 3))), Texels(*upInput),
+                 Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
+}
+
 TEST_F(BasicGLShaderFilterTest, RunsAProgramWithoutAnyOfTheUniforms) {
     ImageGPUPtr const upInput = textureImage(pixels(0, 0, 3, 3), ImageGPU::PIXEL_FORMAT_RGBA8);
     ShaderNode node("void main() { gl_FragColor = vec4(gl_TexCoord[0].xy, 8.0, 16.0) * 0.0625; }");
@@ -529,10 +544,23 @@ TEST_F(BasicGLShaderFilterTest, AFailedFrameDoesNotSpoilTheNext) {
         EXPECT_LT(1U, n) << pName;
         EXPECT_GT(20U, n) << pName;
     }
-    // The frame's own context, then the pool's. A driver that refuses to go back from there is another
-    // matter.
-    EXPECT_TRUE(failedCall("eglMakeCurrent", 1));
-    EXPECT_TRUE(failedCall("eglMakeCurrent", 2));
+    // The frame's own context, the pool's, and back from there.
+    for (std::uint64_t n = 1; n <= 3; ++n)
+        EXPECT_TRUE(failedCall("eglMakeCurrent", n)) << n;
+}
+
+TEST_F(BasicGLShaderFilterTest, AContextThatGoesInTheMidstOfAPassDoesNotSpoilTheNext) {
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 3, 3), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ShaderNode node(copyShader());
+    ShaderRoad road(frameContext(), node);
+    road.setInput(0, *upInput);
+    node.onPreProcessed_ = [this] { host().release(); };
+    EXPECT_THROW(road.run(world(0, 0, 3, 3)), ExceptionBase);
+    EXPECT_EQ(-1, upInput->boundTexUnit());
+    host().makeCurrent();
+    node.onPreProcessed_ = nullptr;
+    expectTexels(Texels(*road.run(world(0, 0, 3, 3))), Texels(*upInput),
+                 Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8));
 }
 
 TEST_F(BasicGLShaderFilterTest, AFailureOfASubclassDoesNotSpoilTheNextFrame) {

@@ -103,9 +103,9 @@ public:
 };
 
 template <typename Node>
-FilterPtr makeShader(std::string const& name) {
+FilterPtr makeShader(std::string const& name, TargetPlatform target = ORVO_TARGET_GL) {
     FilterGraph::Internal::ImageFlowFilter<Node> prototype(
-        FilterGraph::IFilter::Identifier(name, "test", "ORVO", 1), ORVO_TARGET_GL);
+        FilterGraph::IFilter::Identifier(name, "test", "ORVO", 1), target);
     prototype.initialize();
     return prototype.clone();
 }
@@ -174,7 +174,9 @@ SinkPtr makeGLSink(FilterGraph::ImageBase* pImage) {
 
 FilterPtr makeAddShader(std::string const& name) { return makeShader<AddShader>(name); }
 
-FilterPtr makeMeanShader(std::string const& name) { return makeShader<MeanShader>(name); }
+FilterPtr makeMeanShader(std::string const& name, TargetPlatform target) {
+    return makeShader<MeanShader>(name, target);
+}
 
 FilterPtr makeBrokenShader() { return makeShader<BrokenShader>("broken"); }
 

@@ -23,22 +23,26 @@ inline OptimizationOptions glOptions() { return OptimizationOptions(); }
 
 /// All layers, started with one context, up for a scope.
 struct GLFrameLayers {
-    explicit GLFrameLayers(OGL::Context const* pContext)
-        : oImageRuntime_(pContext, VideoMemory::Configuration()) {}
+    GLFrameLayers(OGL::Context const* pContext, FilterGraph::Library::InitializationOptions const& options)
+        : oImageRuntime_(pContext, VideoMemory::Configuration()), oFilterGraph_(options) {}
 
     ImageRuntime::AutoInitializer oImageRuntime_;
     DataFlow::AutoInitializer oDataFlow_;
     ImageFlow::AutoInitializer oImageFlow_{true};
-    FilterGraph::AutoInitializer oFilterGraph_{FilterGraph::Library::InitializationOptions()};
+    FilterGraph::AutoInitializer oFilterGraph_;
 };
 
 /// All layers on a host's context. What a test makes of OpenGL must be gone when its body ends.
 class GLFrameTest : public GLTest {
 protected:
+    explicit GLFrameTest(FilterGraph::Library::InitializationOptions const& options =
+                             FilterGraph::Library::InitializationOptions())
+        : oOptions_(options) {}
+
     void SetUp() override {
         GLTest::SetUp();
         pContext_ = OGL::Context::adoptCurrent();
-        oLayers_.emplace(pContext_.get());
+        oLayers_.emplace(pContext_.get(), oOptions_);
     }
 
     void TearDown() override {
@@ -51,6 +55,7 @@ protected:
     OGL::Context const* context() const { return pContext_.get(); }
 
 private:
+    FilterGraph::Library::InitializationOptions oOptions_;
     std::unique_ptr<OGL::Context> pContext_;
     std::optional<GLFrameLayers> oLayers_;
 };
@@ -102,8 +107,9 @@ SinkPtr makeGLSink(FilterGraph::ImageBase* pImage);
 
 /// A filter on OpenGL that adds "value" to every channel of "src".
 FilterPtr makeAddShader(std::string const& name = "add");
-/// The mean of the inputs "a" and "b".
-FilterPtr makeMeanShader(std::string const& name = "mean");
+/// The mean of the inputs "a" and "b". With `ORVO_TARGET_CPU` the filter passes for one that graphs on the
+/// CPU can run, though its node works on textures.
+FilterPtr makeMeanShader(std::string const& name = "mean", TargetPlatform target = ORVO_TARGET_GL);
 /// A filter whose shader does not compile: its node is made, but says that it does not run in hardware.
 FilterPtr makeBrokenShader();
 

@@ -244,6 +244,7 @@ void hookCalls() {
     HOOK_COUNT(glUniformMatrix4fv);
     HOOK_COUNT(glUseProgram);
     HOOK_COUNT(glValidateProgram);
+    HOOK_COUNT(glWaitSync);
 }
 
 #undef HOOK_GENERATE
