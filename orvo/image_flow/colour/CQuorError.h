@@ -3,6 +3,7 @@
 #include "orvo/colour_engine/VantleHandles.h"
 #include "orvo/core/Export.h"
 
+#include <cstdint>
 #include <exception>
 #include <string>
 
@@ -28,7 +29,11 @@ public:
     ORVO::QuorError* error() const noexcept;
 
 private:
+    void addReference() noexcept;
+    void dropReference() noexcept;
+
     ORVO::QuorError* pError_;
+    std::uint32_t iGeneration_; ///< of the binding that the object belongs to
     std::string sText_;
 };
 

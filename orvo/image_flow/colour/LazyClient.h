@@ -10,8 +10,9 @@ namespace Quor_T_MT {
 /// Threads: `add` from any thread; the list runs on the thread that stops the layers.
 class ORVO_API LazyTerminate {
 public:
-    /// `pTerminate` must not throw.
-    explicit constexpr LazyTerminate(void (*pTerminate)()) noexcept : pTerminate_(pTerminate) {}
+    /// `pTerminate` must not throw; it is handed `pContext`.
+    constexpr LazyTerminate(void (*pTerminate)(void*), void* pContext) noexcept
+        : pTerminate_(pTerminate), pContext_(pContext) {}
 
     LazyTerminate(LazyTerminate const&) = delete;
     LazyTerminate& operator=(LazyTerminate const&) = delete;
@@ -23,7 +24,8 @@ public:
     static void runAll() noexcept;
 
 private:
-    void (*pTerminate_)();
+    void (*pTerminate_)(void*);
+    void* pContext_;
     LazyTerminate* pNext_ = nullptr;
     bool bListed_ = false;
 };

@@ -39,6 +39,9 @@ public:
     /// Asks the address procedure; null where there is none.
     static void* resolve(char const* pInterface, char const* pSelector, char const* pProcName);
 
+    /// How many starts have succeeded or are under way: tells what belongs to an earlier binding. 0 before
+    /// the first.
+    static std::uint32_t generation() noexcept;
     /// The global counter of unregistrations, 0 where nothing is bound.
     static std::uint32_t unregisterCount() noexcept;
 

@@ -8,10 +8,10 @@ namespace ORVO::ImageFlow {
 /// The base interfaces of the layer, with the rows that the system uses.
 ///
 /// Threads: as QuorTable.
-QuorTable& quorContainerInterface() noexcept;
-QuorTable& quorErrorInterface() noexcept;
-QuorTable& quorStringInterface() noexcept;
-QuorTable& quorMemoryInterface() noexcept;
+ORVO_API QuorTable& quorContainerInterface() noexcept;
+ORVO_API QuorTable& quorErrorInterface() noexcept;
+ORVO_API QuorTable& quorStringInterface() noexcept;
+ORVO_API QuorTable& quorMemoryInterface() noexcept;
 
 /// The slots of those rows.
 enum QuorContainerSlot : std::size_t {

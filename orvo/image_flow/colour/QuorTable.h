@@ -52,11 +52,13 @@ public:
     char const* interfaceName() const noexcept { return pInterface_; }
 
 private:
+    bool tryLoad() noexcept;
+
     char const* pInterface_;
     QuorRow const* pRows_;
     std::size_t nRows_;
     std::atomic<void*>* pSlots_;
-    std::atomic<bool> bLoaded_{false};
+    std::atomic<std::uint32_t> iGeneration_{0}; ///< of the binding that it was loaded through; 0: not loaded
     std::atomic<std::uint32_t> iLoadCount_{0};
 };
 
