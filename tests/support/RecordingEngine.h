@@ -2,17 +2,18 @@
 /// operation fail. It can also serve one shader of a test's own, with a record of the calls.
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <map>
 #include <set>
 #include <string>
 #include <utility>
 #include <vector>
 
+#include "orvo/colour_engine/EmbeddedEngine.h"
 #include "orvo/colour_engine/QuorProcedures.h"
 #include "orvo/colour_engine/VantleProcedures.h"
 #include "orvo/colour_engine/VantleShaderParameterData.h"
@@ -43,8 +44,6 @@ public:
     /// that of image flow.
     static void install() {
         reset();
-        if (pEmbedded_ == nullptr)
-            pEmbedded_ = GetQuorGetAddressProc();
         Core::Library::setQuorGetAddressProc(&address);
     }
     static void reset() {
@@ -168,7 +167,7 @@ private:
     }
 
     static void* address(char const* pInterface, char const* pSelector, char const* pProcName) {
-        void* const pOriginal = pEmbedded_(pInterface, pSelector, pProcName);
+        void* const pOriginal = ColourEngine::embeddedEngine()(pInterface, pSelector, pProcName);
         for (std::size_t iRow = 0; iRow < ROWS; ++iRow) {
             Row const& row = rows()[iRow];
             if (std::strcmp(row.pInterface_, pInterface) == 0 &&
@@ -182,8 +181,8 @@ private:
 
     static VantleResult refusal() {
         QuorError* pError = nullptr;
-        reinterpret_cast<QuorNewErrorProc>(pEmbedded_("QuorErrorInterface", "NewError", "QuorNewErrorProc"))(
-            &pError, "refused", "test");
+        reinterpret_cast<QuorNewErrorProc>(ColourEngine::embeddedEngine()(
+            "QuorErrorInterface", "NewError", "QuorNewErrorProc"))(&pError, "refused", "test");
         return reinterpret_cast<VantleResult>(pError);
     }
 
@@ -282,7 +281,6 @@ private:
         return done("CopyData " + std::to_string(index) + (pTarget != nullptr ? " data" : " size"));
     }
 
-    static inline QuorGetAddressProc pEmbedded_ = nullptr;
     static inline std::array<void*, ROWS> aOriginals_{};
     static inline std::array<std::atomic<std::uint64_t>, ROWS> aCalls_{};
     static inline std::atomic<std::uint32_t> failing_{0};

@@ -38,13 +38,21 @@ void giveBack(Textures& textures) noexcept {
     textures.clear();
 }
 
-/// Puts a texture under its name; the one that was there goes back.
+/// Gives the texture of a name back, so that its successor can be the same one.
+template <typename Textures>
+void drop(Textures& textures, std::string const& sName) {
+    auto const iEntry = textures.find(sName);
+    if (iEntry != textures.end()) {
+        trackedDelete(iEntry->second.first);
+        textures.erase(iEntry);
+    }
+}
+
 template <typename Textures, typename ScopedTexture>
 void store(Textures& textures, std::string const& sName, ScopedTexture* pTexture, unsigned unit) {
-    ScopedPtr<ScopedTexture> pNew(pTexture);
-    auto& entry = textures[sName];
-    ScopedPtr<ScopedTexture> const pOld(entry.first);
-    entry = {pNew.release(), unit};
+    ScopedPtr<ScopedTexture> scoped(pTexture);
+    textures.emplace(sName, std::pair(pTexture, unit));
+    static_cast<void>(scoped.release());
 }
 
 /// What OpenGL's numbers in a record stand for.
@@ -222,14 +230,17 @@ void VantleDataAdapter::populateGLObjects(unsigned firstTextureUnit) {
             break;
         }
         case Record::KIND_TEXTURE_1D:
+            drop(tex1D_, sName);
             store(tex1D_, sName, constructTexture1DFromData(record, unit), unit);
             ++unit;
             break;
         case Record::KIND_TEXTURE_2D:
+            drop(tex2D_, sName);
             store(tex2D_, sName, constructTexture2DFromData(record, unit), unit);
             ++unit;
             break;
         case Record::KIND_TEXTURE_3D:
+            drop(tex3D_, sName);
             store(tex3D_, sName, constructTexture3DFromData(record, unit), unit);
             ++unit;
             break;
