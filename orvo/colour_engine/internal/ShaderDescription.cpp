@@ -25,14 +25,14 @@ constexpr std::uint32_t nNearest = 0x2600;
 constexpr std::uint32_t nLinear = 0x2601;
 constexpr std::uint32_t nClampToEdge = 0x812F;
 
-constexpr char const* pEntryPoint = "orvoColourTransform";
+constexpr char const* pShaderEntryPoint = "orvoColourTransform";
 constexpr std::size_t nCurveEntries = 4096;
 
 /// The driver would interpolate a table of floats in half precision, if at all, so the two neighbours are
-/// read one by one: the texel n lies at (n + 0.5) / 4096.
+/// read one by one: the texel n lies at (n + 0.5) / 4096, and beyond the last one the last is read.
 constexpr char const* pCurveFunction = "float orvoCurve(sampler1D table, float x) {\n"
                                        "    float position = clamp(x, 0.0, 1.0) * 4095.0;\n"
-                                       "    float entry = min(floor(position), 4094.0);\n"
+                                       "    float entry = floor(position);\n"
                                        "    float lower = texture1D(table, (entry + 0.5) / 4096.0).r;\n"
                                        "    float upper = texture1D(table, (entry + 1.5) / 4096.0).r;\n"
                                        "    return lower + (upper - lower) * (position - entry);\n"
@@ -94,7 +94,7 @@ std::string declarationsOf(ShaderParameters const& aParameters) {
 }
 
 std::string entryFunction(std::string const& sBody) {
-    return std::string("void ") + pEntryPoint + "(inout vec4 color) {\n" + sBody + "}\n";
+    return std::string("void ") + pShaderEntryPoint + "(inout vec4 color) {\n" + sBody + "}\n";
 }
 
 std::string describeShaper(MatrixShaper const& shaper, ShaderParameters& aParameters) {
@@ -140,7 +140,7 @@ std::string describeCube(ColourCube const& cube, ShaderParameters& aParameters) 
 
 } // namespace
 
-ShaderDescription::ShaderDescription(ResolvedTransform const& transform) : sEntryPoint_(pEntryPoint) {
+ShaderDescription::ShaderDescription(ResolvedTransform const& transform) : sEntryPoint_(pShaderEntryPoint) {
     if (MatrixShaper const* const pShaper = transform.matrixShaper()) {
         sCode_ = describeShaper(*pShaper, aParameters_);
     } else {
