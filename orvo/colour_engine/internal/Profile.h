@@ -1,6 +1,7 @@
 #pragma once
 
 #include "orvo/colour_engine/ProfileCodes.h"
+#include "orvo/core/Export.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -12,7 +13,7 @@ namespace ORVO::ColourEngine::Internal {
 /// A colour space of one or three channels, immutable.
 ///
 /// Threads: any; what reads handle() takes the lock of the resolver.
-class Profile {
+class ORVO_API Profile {
 public:
     /// Throws `std::bad_alloc` alone.
     explicit Profile(BuiltInProfile const& space);
@@ -46,6 +47,6 @@ private:
 
 /// The profile of a code, null if there is none. Built-in ones are made on first use.
 /// Threads: any.
-std::shared_ptr<Profile const> profileFromCode(std::uint32_t code);
+ORVO_API std::shared_ptr<Profile const> profileFromCode(std::uint32_t code);
 
 } // namespace ORVO::ColourEngine::Internal

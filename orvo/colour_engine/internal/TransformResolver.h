@@ -18,7 +18,9 @@ constexpr std::uint32_t TRANSFORM_BLACK_POINT_COMPENSATION = 1;
 /// that road. Throws `std::runtime_error` where the colour library knows no road between the two.
 ///
 /// Threads: any; one at a time works.
-std::shared_ptr<ResolvedTransform const> resolveTransform(Profile const& source, Profile const& destination,
-                                                          std::uint32_t intent, std::uint32_t options);
+ORVO_API std::shared_ptr<ResolvedTransform const> resolveTransform(Profile const& source,
+                                                                   Profile const& destination,
+                                                                   std::uint32_t intent,
+                                                                   std::uint32_t options);
 
 } // namespace ORVO::ColourEngine::Internal
