@@ -79,6 +79,10 @@ void QuorClient::stop() noexcept {
     }
     Quor_T_MT::LazyTerminate::runAll();
     forget();
+    for (QuorTable* const pTable :
+         {&quorContainerInterface(), &quorErrorInterface(), &quorStringInterface(), &quorMemoryInterface()}) {
+        pTable->clear();
+    }
 }
 
 void QuorClient::forget() noexcept {
@@ -86,10 +90,6 @@ void QuorClient::forget() noexcept {
     bStrict.store(false, std::memory_order_release);
     pUnregisterCount.store(nullptr, std::memory_order_release);
     pAddressProc.store(nullptr, std::memory_order_release);
-    for (QuorTable* const pTable :
-         {&quorContainerInterface(), &quorErrorInterface(), &quorStringInterface(), &quorMemoryInterface()}) {
-        pTable->clear();
-    }
 }
 
 bool QuorClient::isLive() noexcept { return bLive.load(std::memory_order_acquire); }

@@ -2,6 +2,7 @@
 
 #include "orvo/image_flow/colour/CQuorError.h"
 #include "orvo/image_flow/colour/QuorClient.h"
+#include "orvo/image_flow/colour/QuorInterfaces.h"
 #include "orvo/image_flow/colour/QuorMethodTable.h"
 #include "tests/image_flow/colour/FakeEngine.h"
 
@@ -80,10 +81,14 @@ TEST(QuorTable, ALenientLoadReportsAndLeavesTheEarlierRowsAsTheyAre) {
     ASSERT_FALSE(QuorClient::isStrict());
     TestTable test;
     EXPECT_EQ(0, test.oTable_.load()) << "nothing is bound";
-    // An interface of the base is loaded before the strict mode: the start reports instead of throwing.
-    FakeEngine::missing() = {"QuorMemoryInterface/Alloc"};
+    // The base interfaces are loaded before the strict mode.
+    ASSERT_EQ(nullptr, quorContainerInterface().procedure(QUOR_CONTAINER_GET_METHOD));
+    FakeEngine::missing() = {"QuorContainerInterface/Release"};
     EXPECT_NO_THROW(EXPECT_EQ(0, QuorClient::start(&FakeEngine::address)));
-    EXPECT_EQ(Names(), FakeEngine::calls());
+    EXPECT_EQ(Names(), FakeEngine::calls()) << "no error object is made";
+    EXPECT_NE(nullptr, quorContainerInterface().procedure(QUOR_CONTAINER_GET_METHOD));
+    EXPECT_EQ(nullptr, quorContainerInterface().procedure(QUOR_CONTAINER_RELEASE));
+    EXPECT_EQ(nullptr, quorContainerInterface().procedure(QUOR_CONTAINER_ADD_REF));
 }
 
 TEST(QuorTable, StaysAsItIsUntilTheCounterMoves) {
