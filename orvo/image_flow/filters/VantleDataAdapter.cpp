@@ -13,6 +13,7 @@
 #include "orvo/ogl/Texture1D.h"
 #include "orvo/ogl/Texture2D.h"
 #include "orvo/ogl/Texture3D.h"
+#include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/GL.h"
 
 #include <algorithm>
@@ -266,6 +267,7 @@ ScopedTexture1D* VantleDataAdapter::constructTexture1DFromData(Record const& par
     pTexture->setWrap(table.wrapS_);
     pTexture->subImage(parameterData.level, 0, parameterData.width, table.format_, table.type_,
                        parameterData.data, OGL::PixelUnpackParameters());
+    ORVO_OGL_THROW_ON_ERROR("A table of a colour transform could not be uploaded");
     return pScoped.release();
 }
 
@@ -285,6 +287,7 @@ ScopedTexture2D* VantleDataAdapter::constructTexture2DFromData(Record const& par
     pTexture->setWrap(table.wrapS_, table.wrapT_);
     pTexture->subImage(parameterData.level, 0, 0, parameterData.width, parameterData.height, table.format_,
                        table.type_, parameterData.data, OGL::PixelUnpackParameters());
+    ORVO_OGL_THROW_ON_ERROR("A table of a colour transform could not be uploaded");
     return pScoped.release();
 }
 
@@ -305,6 +308,7 @@ ScopedTexture3D* VantleDataAdapter::constructTexture3DFromData(Record const& par
     pTexture->subImage(parameterData.level, 0, 0, 0, parameterData.width, parameterData.height,
                        parameterData.depth, table.format_, table.type_, parameterData.data,
                        OGL::PixelUnpackParameters());
+    ORVO_OGL_THROW_ON_ERROR("A table of a colour transform could not be uploaded");
     return pScoped.release();
 }
 
