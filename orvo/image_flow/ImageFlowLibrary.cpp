@@ -7,6 +7,7 @@
 #include "orvo/data_flow/DataFlowLibrary.h"
 #include "orvo/data_flow/librarian/NodeLibrarian.h"
 #include "orvo/data_flow/librarian/NodeMetaData.h"
+#include "orvo/image_flow/colour/QuorClient.h"
 #include "orvo/image_flow/colour/ScopedQuorInitializer.h"
 #include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
@@ -113,7 +114,12 @@ void checkLowerLayers() {
 
 /// A host may do without an engine: the binding stays closed then, and who asks for a transform is told so.
 void openColourEngine() {
-    if (QuorGetAddressProc const pProc = GetQuorGetAddressProc(); pProc != nullptr) {
+    QuorGetAddressProc const pProc = GetQuorGetAddressProc();
+    if (pProc != QuorClient::addressProc()) {
+        // Left open by a start that failed later, before the host chose another engine.
+        oColourEngine.terminate();
+    }
+    if (pProc != nullptr) {
         oColourEngine.initialize(pProc);
     }
 }

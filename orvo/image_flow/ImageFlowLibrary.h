@@ -18,7 +18,7 @@ public:
     /// and registers the node types of the layer with the `DataFlow::NodeLibrarian`. `checkGPU` asks for the
     /// check of the OpenGL driver, which takes place only where the image runtime was given a context. After
     /// a failure the library is not initialized and may be started again; the binding may be open then, and
-    /// is kept.
+    /// is kept for the next start with the same engine.
     ///
     /// Throws "ImageFlow already initialized", "Core::Library::isInitialized()",
     /// "DataFlow::Library::isInitialized()", "OGL::Library::isInitialized()" or

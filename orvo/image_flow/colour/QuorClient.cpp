@@ -92,6 +92,8 @@ void QuorClient::forget() noexcept {
     pAddressProc.store(nullptr, std::memory_order_release);
 }
 
+QuorGetAddressProc QuorClient::addressProc() noexcept { return pAddressProc.load(std::memory_order_acquire); }
+
 bool QuorClient::isLive() noexcept { return bLive.load(std::memory_order_acquire); }
 
 bool QuorClient::isStrict() noexcept { return bStrict.load(std::memory_order_acquire); }

@@ -31,6 +31,8 @@ public:
     /// nothing if nothing is bound.
     static void stop() noexcept;
 
+    /// The address procedure that is bound, null if none is.
+    static QuorGetAddressProc addressProc() noexcept;
     /// Whether a start succeeded and no stop came since.
     static bool isLive() noexcept;
     /// Whether a table that lacks a procedure throws (true) or reports (false) at its load.

@@ -23,6 +23,16 @@ bool VantleGuard::check() {
     return true;
 }
 
+void* VantleGuard::checkedProcedure(std::size_t slot) {
+    check();
+    void* const pProcedure = oTable_.procedure(slot);
+    // Another thread may have found the engine gone since.
+    if (pProcedure == nullptr) {
+        throw TrelException("couldn't init CVantle");
+    }
+    return pProcedure;
+}
+
 void VantleGuard::forget(void* pGuard) noexcept {
     auto& guard = *static_cast<VantleGuard*>(pGuard);
     guard.pTable_.store(nullptr, std::memory_order_release);

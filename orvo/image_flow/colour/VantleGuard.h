@@ -21,14 +21,14 @@ public:
     /// The same without throwing.
     bool isAvailable() noexcept;
 
-    /// A procedure of the table, guarded.
+    /// A procedure of the table, guarded; never null.
     template <typename Procedure>
     Procedure procedure(std::size_t slot) {
-        check();
-        return reinterpret_cast<Procedure>(oTable_.procedure(slot));
+        return reinterpret_cast<Procedure>(checkedProcedure(slot));
     }
 
 private:
+    void* checkedProcedure(std::size_t slot);
     static void forget(void* pGuard) noexcept;
 
     QuorTable& oTable_;

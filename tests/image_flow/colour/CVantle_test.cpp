@@ -157,7 +157,18 @@ TEST(CVantle, AnEngineMayGoAndComeBackUnderARunningSystem) {
     FakeEngine::serveNewVersion();
     EXPECT_TRUE(CVantle::isAvailable());
     EXPECT_EQ(0u, CVantle::ReferenceTransform(handle<VantleTransform>(4)));
-    EXPECT_EQ((Names{"ReferenceTransform 1", "ReferenceTransform 2", "new ReferenceTransform 4"}),
+    EXPECT_EQ((Names{"ReferenceTransform 1", "ReferenceTransform 2", "ReferenceTransformAnew 4"}),
+              FakeEngine::calls());
+}
+
+TEST(CVantle, CallsTheNewProceduresOnceTheCounterMoved) {
+    FakeBinding const binding;
+    CVantle::ReferenceTransform(handle<VantleTransform>(1));
+    FakeEngine::serveNewVersion();
+    CVantle::ReferenceTransform(handle<VantleTransform>(2));
+    FakeEngine::unregister();
+    CVantle::ReferenceTransform(handle<VantleTransform>(3));
+    EXPECT_EQ((Names{"ReferenceTransform 1", "ReferenceTransform 2", "ReferenceTransformAnew 3"}),
               FakeEngine::calls());
 }
 

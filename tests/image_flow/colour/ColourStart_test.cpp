@@ -112,6 +112,38 @@ TEST(ColourStart, BindsTheHostsEngine) {
     EXPECT_NE(0u, CVantle::ReferenceTransform(FakeEngine::handle<VantleTransform>(3)));
 }
 
+TEST(ColourStart, AFailureAfterTheBindingLeavesItOpenForTheNextStart) {
+    Core::AutoInitializer const core;
+    OGL::AutoInitializer const ogl;
+    DataFlow::AutoInitializer const dataFlow;
+    ORVO_EXPECT_INTERNAL(ImageFlow::Library::initialize(false), "ImageRuntime::Library::isInitialized()");
+    EXPECT_FALSE(ImageFlow::Library::isInitialized());
+    EXPECT_TRUE(QuorClient::isLive());
+    ImageRuntime::AutoInitializer const imageRuntime(static_cast<OGL::Context const*>(nullptr),
+                                                     VideoMemory::Configuration());
+    std::uint32_t const iGeneration = QuorClient::generation();
+    {
+        ImageFlow::AutoInitializer const imageFlow(false);
+        EXPECT_EQ(iGeneration, QuorClient::generation());
+        EXPECT_TRUE(CVantle::isAvailable());
+    }
+    EXPECT_FALSE(QuorClient::isLive());
+}
+
+TEST(ColourStart, ABindingLeftOpenYieldsToTheHostsChoice) {
+    LayersBelow const below;
+    {
+        ImageRuntime::Library::terminate();
+        ORVO_EXPECT_INTERNAL(ImageFlow::Library::initialize(false), "ImageRuntime::Library::isInitialized()");
+        ImageRuntime::Library::initialize(static_cast<OGL::Context const*>(nullptr),
+                                          VideoMemory::Configuration());
+    }
+    EXPECT_TRUE(QuorClient::isLive());
+    Core::Library::setQuorGetAddressProc(nullptr);
+    ImageFlow::AutoInitializer const imageFlow(false);
+    EXPECT_FALSE(QuorClient::isLive());
+}
+
 TEST(ColourStart, AnEngineThatLacksABaseInterfaceFailsTheStart) {
     FakeEngine::reset();
     FakeEngine::missing() = {"QuorStringInterface/NewStringAtom"};

@@ -33,7 +33,7 @@ public:
         aMissing_.clear();
         aResults_.clear();
         nUnregistered_ = 7;
-        iVersion_ = 0;
+        bNewVersion_ = false;
         nAtoms_ = 0;
         methodResult_ = nullptr;
         bCountRefused_ = false;
@@ -54,8 +54,8 @@ public:
     /// The counter, which an engine raises when an interface goes.
     static void unregister() { ++nUnregistered_; }
     static std::uint32_t unregistered() { return nUnregistered_; }
-    /// Which of two sets of "VantleInterface2" is served; the second marks its calls with "new ".
-    static void serveNewVersion() { iVersion_ = 1; }
+    /// From now on "ReferenceTransform" is another procedure, which calls itself "ReferenceTransformAnew".
+    static void serveNewVersion() { bNewVersion_ = true; }
     static int atoms() { return nAtoms_; }
     static void setMethod(void* pMethod) { methodResult_ = pMethod; }
     static void refuseCount() { bCountRefused_ = true; }
@@ -65,6 +65,10 @@ public:
         aAsked_.push_back(sName + "/" + pProcName);
         if (aMissing_.count(sName) != 0) {
             return nullptr;
+        }
+        if (bNewVersion_ && sName == "VantleInterface2/ReferenceTransform") {
+            return of<VantleReferenceTransformProc>(
+                [](auto* p) { return record("ReferenceTransformAnew", p); });
         }
         auto const found = procedures().find(sName + "/" + pProcName);
         return found != procedures().end() ? found->second : nullptr;
@@ -88,7 +92,7 @@ private:
     template <typename... Arguments>
     static VantleResult record(char const* pSelector, Arguments... arguments) {
         std::ostringstream text;
-        text << (iVersion_ != 0 ? "new " : "") << pSelector;
+        text << pSelector;
         (say(text, arguments), ...);
         aCalls_.push_back(text.str());
         auto const found = aResults_.find(pSelector);
@@ -271,7 +275,7 @@ private:
     static inline std::map<std::string, VantleResult> aResults_;
     static inline FakeError error_;
     static inline std::uint32_t nUnregistered_ = 0;
-    static inline int iVersion_ = 0;
+    static inline bool bNewVersion_ = false;
     static inline int nAtoms_ = 0;
     static inline void* methodResult_ = nullptr;
     static inline bool bCountRefused_ = false;
