@@ -17,6 +17,7 @@ target_compile_options(orvo_compiler INTERFACE
     "-ffile-prefix-map=${PROJECT_SOURCE_DIR}/="
     "-ffile-prefix-map=${PROJECT_BINARY_DIR}/layers/core/="
     "-ffile-prefix-map=${PROJECT_BINARY_DIR}/layers/ogl/="
+    "-ffile-prefix-map=${PROJECT_BINARY_DIR}/layers/colour_engine/="
     "-ffile-prefix-map=${PROJECT_BINARY_DIR}/layers/data_flow/="
     "-ffile-prefix-map=${PROJECT_BINARY_DIR}/layers/image_runtime/="
     "-ffile-prefix-map=${PROJECT_BINARY_DIR}/layers/image_flow/="

@@ -38,6 +38,7 @@
 #include "orvo/core/spaces/PositionInPixelSpace.h"
 #include "orvo/core/spaces/PositionInWorldSpace.h"
 #include "orvo/core/spaces/Spaces.h"
+#include "orvo/core/utility/InstructionSet.h"
 #include "orvo/core/utility/Integers.h"
 #include "orvo/core/utility/SaturatingCast.h"
 #include "orvo/core/utility/ScopedPtr.h"

@@ -4,12 +4,12 @@
 
 namespace ORVO {
 
-/// The entry point through which the colour engine's interfaces are looked up: interface, operation and
-/// version by name; null for what the engine does not have.
-using QuorGetAddressProc = void* (*)(char const* pInterface, char const* pOperation, char const* pVersion);
+/// The entry point through which the colour engine's procedures are looked up: interface, selector and
+/// procedure by name; null for what the engine does not have.
+using QuorGetAddressProc = void* (*)(char const* interfaceName, char const* selector, char const* procName);
 
-/// The installed entry point of the colour engine, null where there is none ("engine absent").
-/// Threads: any.
+/// The entry point of the colour engine: the one of the embedded engine, unless the host installed its own or
+/// null, which means that there is no engine. Threads: any.
 ORVO_API QuorGetAddressProc GetQuorGetAddressProc();
 
 namespace Core {
@@ -25,16 +25,17 @@ public:
     /// Starts the library. Throws InternalException "!isInitialized()" if it is started already.
     static void initialize();
 
-    /// Stops the library: gives held image storage back to the system and takes back the colour engine's
-    /// entry point. Blocks and objects that are still alive stay valid. Throws InternalException
-    /// "isInitialized()" if it is not started.
+    /// Stops the library: gives held image storage back to the system and forgets the entry point that the
+    /// host installed for a colour engine. Blocks and objects that are still alive stay valid. Throws
+    /// InternalException "isInitialized()" if it is not started.
     static void terminate();
 
     /// Whether the library is started.
     static bool isInitialized() noexcept;
 
-    /// Installs the entry point that GetQuorGetAddressProc hands out from now until terminate(); null means
-    /// that there is no engine. To be called before ImageFlow::Library::initialize. Threads: any.
+    /// Installs the entry point that GetQuorGetAddressProc hands out from now until terminate(): the host's
+    /// own engine, or null to work without one. ImageFlow::Library::initialize binds what is installed then;
+    /// what is installed later waits for its next start. Threads: any.
     static void setQuorGetAddressProc(QuorGetAddressProc pProc) noexcept;
 };
 

@@ -7,11 +7,15 @@
 #include "orvo/data_flow/DataFlowLibrary.h"
 #include "orvo/data_flow/librarian/NodeLibrarian.h"
 #include "orvo/data_flow/librarian/NodeMetaData.h"
+#include "orvo/image_flow/colour/QuorClient.h"
+#include "orvo/image_flow/colour/ScopedQuorInitializer.h"
 #include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
+#include "orvo/image_flow/filters/VantleFilterCPU.h"
+#include "orvo/image_flow/filters/VantleFilterGPU.h"
 #include "orvo/image_flow/sources/ImageCPUInput.h"
 #include "orvo/image_flow/sources/ImageGPUInput.h"
 #include "orvo/image_flow/sources/ImageGPUOutput.h"
@@ -36,6 +40,7 @@ using DataFlow::NodeTargetType;
 constexpr std::uint32_t iNodeVersion = 1;
 
 bool bInitialized = false;
+ScopedQuorInitializer oColourEngine;
 
 /// A node type that runs on the CPU alone.
 template <typename CPUNode>
@@ -66,6 +71,8 @@ constexpr NodeType aNodeTypes[] = {
     {"CPU2GPU", "CPU2GPU", createOnAny<CPU2GPU>},
     {"ImageGPUInput", "ImageGPUInput", createOnGPU<ImageGPUInput>},
     {"ImageGPUOutput", "ImageGPUOutput", createOnGPU<ImageGPUOutput>},
+    {"VantleFilterGPU", "VantleTransformGPU2", createOnGPU<VantleFilterGPU>},
+    {"VantleFilterCPU", "VantleTransformCPU2", createOnCPU<VantleFilterCPU>},
     {"FastBilateralFilter", "NRVN Fast Bilateral", createOnCPU<FastBilateralFilterCPUNode>},
     {"RGBToLABCPU", "NRVN ORVO RGB2LAB", createOnCPU<RGBToLABCPU>},
     {"LABToRGBCPU", "NRVN ORVO LAB2RGB", createOnCPU<LABToRGBCPU>},
@@ -105,6 +112,18 @@ void checkLowerLayers() {
     ORVO_CHECK(OGL::Library::isInitialized());
 }
 
+/// A host may do without an engine: the binding stays closed then, and who asks for a transform is told so.
+void openColourEngine() {
+    QuorGetAddressProc const pProc = GetQuorGetAddressProc();
+    if (pProc != QuorClient::addressProc()) {
+        // Left open by a start that failed later, before the host chose another engine.
+        oColourEngine.terminate();
+    }
+    if (pProc != nullptr) {
+        oColourEngine.initialize(pProc);
+    }
+}
+
 /// Throws where the driver of the first context lacks what the nodes of the GPU need.
 void checkDriver() {
     OGL::ScopedContextWrapper const wrapper;
@@ -127,6 +146,7 @@ void checkDriver() {
 void Library::initialize(bool checkGPU) {
     ORVO_CHECK(!bInitialized, "ImageFlow already initialized");
     checkLowerLayers();
+    openColourEngine();
     // A driver is there to be checked only where the runtime was given a context.
     if (!cpuOnlyMode() && checkGPU) {
         checkDriver();
@@ -141,6 +161,7 @@ void Library::terminate() {
     ORVO_CHECK(bInitialized, "ImageFlow is not initialized!");
     checkLowerLayers();
     NodeLibrarian::Instance()->clearAll();
+    oColourEngine.terminate();
     bInitialized = false;
 }
 

@@ -14,23 +14,26 @@ class ORVO_API Library {
 public:
     Library() = delete;
 
-    /// Registers the node types of the layer with the `DataFlow::NodeLibrarian`. `checkGPU` asks for the
+    /// Opens the binding to the colour engine that `GetQuorGetAddressProc()` hands out, unless that is null,
+    /// and registers the node types of the layer with the `DataFlow::NodeLibrarian`. `checkGPU` asks for the
     /// check of the OpenGL driver, which takes place only where the image runtime was given a context. After
-    /// a failure the library is not initialized and may be started again.
+    /// a failure the library is not initialized and may be started again; the binding may be open then, and
+    /// is kept for the next start with the same engine.
     ///
     /// Throws "ImageFlow already initialized", "Core::Library::isInitialized()",
     /// "DataFlow::Library::isInitialized()", "OGL::Library::isInitialized()" or
-    /// "ImageRuntime::Library::isInitialized()", and `ParameterException` "!bDuplicate" where a node type of
-    /// the same identity is registered already; the catalogue is then as it was. Where memory runs out
+    /// "ImageRuntime::Library::isInitialized()", "nResult != 0" where the engine lacks what the binding
+    /// needs, and `ParameterException` "!bDuplicate" where a node type of the same identity is registered
+    /// already; the catalogue is then as it was. Where memory runs out
     /// (`std::bad_alloc`) the catalogue is emptied, also of the types of others.
     /// The driver of the runtime's first context fails the check with `ResourceException` "Minimum OpenGL
     /// Version (1.5) not supported." (versions 1.0 to 1.4), "Framebuffer Object Extension not supported." or
     /// "Non power of two textures not supported.", or with `OGL::ExceptionOGL` where that context cannot be
     /// made current.
     static void initialize(bool checkGPU);
-    /// Removes every node type from the librarian, also those that others registered. Throws "ImageFlow is
-    /// not initialized!", "Core::Library::isInitialized()", "DataFlow::Library::isInitialized()" or
-    /// "OGL::Library::isInitialized()".
+    /// Removes every node type from the librarian, also those that others registered, and closes the binding
+    /// to the colour engine. Throws "ImageFlow is not initialized!", "Core::Library::isInitialized()",
+    /// "DataFlow::Library::isInitialized()" or "OGL::Library::isInitialized()".
     static void terminate();
     /// Whether `initialize` has succeeded and `terminate` has not since.
     static bool isInitialized();

@@ -27,7 +27,10 @@ TEST(CoreLibrary, RefusesASecondStartAndASecondStop) {
 }
 
 TEST(CoreLibrary, HandsOutTheInstalledEntryPointOfTheColourEngineUntilItStops) {
-    EXPECT_EQ(nullptr, GetQuorGetAddressProc());
+    QuorGetAddressProc const pEmbedded = GetQuorGetAddressProc();
+    ASSERT_NE(nullptr, pEmbedded);
+    EXPECT_NE(nullptr, pEmbedded("VantleInterface2", "ProfileFromCode", "Vantle_ProfileFromCodeProc2"));
+    EXPECT_EQ(nullptr, pEmbedded("VantleInterface3", "ProfileFromCode", "Vantle_ProfileFromCodeProc2"));
     {
         Core::AutoInitializer const core;
         Core::Library::setQuorGetAddressProc(engineAddress);
@@ -36,7 +39,7 @@ TEST(CoreLibrary, HandsOutTheInstalledEntryPointOfTheColourEngineUntilItStops) {
         EXPECT_EQ(nullptr, GetQuorGetAddressProc());
         Core::Library::setQuorGetAddressProc(engineAddress);
     }
-    EXPECT_EQ(nullptr, GetQuorGetAddressProc());
+    EXPECT_EQ(pEmbedded, GetQuorGetAddressProc());
 }
 
 TEST(CoreLibrary, GivesHeldImageStorageBackWhenItStops) {

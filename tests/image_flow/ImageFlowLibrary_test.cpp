@@ -12,6 +12,8 @@
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
+#include "orvo/image_flow/filters/VantleFilterCPU.h"
+#include "orvo/image_flow/filters/VantleFilterGPU.h"
 #include "orvo/image_flow/sources/ImageCPUInput.h"
 #include "orvo/image_flow/sources/ImageGPUInput.h"
 #include "orvo/image_flow/sources/ImageGPUOutput.h"
@@ -115,6 +117,8 @@ Row const aRows[] = {
     {"CPU2GPU", "CPU2GPU", &typeid(CPU2GPU), &typeid(CPU2GPU)},
     {"ImageGPUInput", "ImageGPUInput", nullptr, &typeid(ImageGPUInput)},
     {"ImageGPUOutput", "ImageGPUOutput", nullptr, &typeid(ImageGPUOutput)},
+    {"VantleFilterGPU", "VantleTransformGPU2", nullptr, &typeid(VantleFilterGPU)},
+    {"VantleFilterCPU", "VantleTransformCPU2", &typeid(VantleFilterCPU), nullptr},
     {"FastBilateralFilter", "NRVN Fast Bilateral", &typeid(FastBilateralFilterCPUNode), nullptr},
     {"RGBToLABCPU", "NRVN ORVO RGB2LAB", &typeid(RGBToLABCPU), nullptr},
     {"LABToRGBCPU", "NRVN ORVO LAB2RGB", &typeid(LABToRGBCPU), nullptr},

@@ -1,4 +1,4 @@
-#include "orvo/image_runtime/kernels/InstructionSet.h"
+#include "orvo/core/utility/InstructionSet.h"
 
 #include "orvo/core/Check.h"
 
@@ -6,7 +6,7 @@
 #include <cpuid.h>
 #include <ostream>
 
-namespace ORVO::ImageRuntime {
+namespace ORVO::Core {
 
 namespace {
 
@@ -66,4 +66,4 @@ std::ostream& operator<<(std::ostream& stream, InstructionSet eInstructionSet) {
     return stream << "unknown";
 }
 
-} // namespace ORVO::ImageRuntime
+} // namespace ORVO::Core

@@ -1,0 +1,76 @@
+#include "orvo/image_flow/colour/QuorTable.h"
+
+#include "orvo/colour_engine/QuorProcedures.h"
+#include "orvo/image_flow/colour/CQuorError.h"
+#include "orvo/image_flow/colour/QuorClient.h"
+#include "orvo/image_flow/colour/QuorInterfaces.h"
+
+namespace ORVO::ImageFlow {
+
+namespace {
+
+[[noreturn]] void throwMissingProcedure() {
+    auto* const pNewError = freshProcedure<QuorNewErrorProc>(quorErrorInterface(), QUOR_ERROR_NEW_ERROR);
+    auto* const pRelease = freshProcedure<QuorErrorReleaseProc>(quorErrorInterface(), QUOR_ERROR_RELEASE);
+    QuorError* pError = nullptr;
+    if (pNewError == nullptr || pRelease == nullptr || pNewError(&pError, "", "Quor") != 0) {
+        throw Quor_T_MT::CQuorError("Missing Interface");
+    }
+    Quor_T_MT::CQuorError const error(pError);
+    pRelease(pError);
+    throw error;
+}
+
+} // namespace
+
+bool QuorTable::tryLoad() noexcept {
+    // Read first: an interface that goes while the table is filled is noticed at the next use.
+    std::uint32_t const iCount = QuorClient::unregisterCount();
+    for (std::size_t iRow = nRows_; iRow-- > 0;) {
+        QuorRow const& row = pRows_[iRow];
+        void* const pProcedure = QuorClient::resolve(pInterface_, row.pSelector, row.pProcName);
+        if (pProcedure == nullptr) {
+            return false;
+        }
+        pSlots_[row.slot].store(pProcedure, std::memory_order_release);
+    }
+    iLoadCount_.store(iCount, std::memory_order_release);
+    iGeneration_.store(QuorClient::generation(), std::memory_order_release);
+    return true;
+}
+
+int QuorTable::load() {
+    if (tryLoad()) {
+        return 1;
+    }
+    if (QuorClient::isStrict()) {
+        throwMissingProcedure();
+    }
+    return 0;
+}
+
+bool QuorTable::refresh() noexcept {
+    if (!QuorClient::isLive()) {
+        return false;
+    }
+    if (iGeneration_.load(std::memory_order_acquire) == QuorClient::generation() &&
+        iLoadCount_.load(std::memory_order_acquire) == QuorClient::unregisterCount()) {
+        return true;
+    }
+    if (tryLoad()) {
+        return true;
+    }
+    iGeneration_.store(0, std::memory_order_release);
+    pSlots_[0].store(nullptr, std::memory_order_release);
+    return false;
+}
+
+void QuorTable::clear() noexcept {
+    for (std::size_t iRow = 0; iRow < nRows_; ++iRow) {
+        pSlots_[pRows_[iRow].slot].store(nullptr, std::memory_order_release);
+    }
+    iLoadCount_.store(0, std::memory_order_release);
+    iGeneration_.store(0, std::memory_order_release);
+}
+
+} // namespace ORVO::ImageFlow

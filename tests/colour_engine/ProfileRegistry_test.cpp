@@ -1,0 +1,121 @@
+#include "orvo/colour_engine/ProfileRegistry.h"
+
+#include "orvo/colour_engine/ProfileCodes.h"
+#include "tests/colour_engine/support/Engine.h"
+#include "tests/colour_engine/support/ICCProfiles.h"
+#include "tests/support/Expect.h"
+
+#include <array>
+
+namespace {
+
+using namespace ORVO;
+using namespace ORVO::ColourEngine;
+using Test::Bytes;
+using Test::bytesOf;
+using Test::Engine;
+using Test::NothingLeft;
+
+constexpr std::uint32_t iCode = profileCode("Cam1");
+
+struct ProfileRegistryTest : testing::Test {
+    ~ProfileRegistryTest() override { unregisterProfile(iCode); }
+};
+
+/// One pixel of a grey through a transform.
+std::uint8_t transformed(Engine const& engine, VantleTransform* pTransform, std::uint8_t grey) {
+    std::array<std::uint8_t, 3> aPixel = {grey, grey, grey};
+    auto const spec = ORVO::Test::packedRGB8(aPixel.data(), 1);
+    EXPECT_EQ(0u, engine.ApplyGeneral(pTransform, &spec, &spec, 1, 1, nullptr));
+    EXPECT_EQ(aPixel[0], aPixel[1]);
+    EXPECT_EQ(aPixel[0], aPixel[2]);
+    return aPixel[1];
+}
+
+TEST_F(ProfileRegistryTest, MakesAProfileKnownUnderItsCode) {
+    NothingLeft const nothingLeft;
+    Engine const engine;
+    EXPECT_FALSE(isKnownProfile(iCode));
+    EXPECT_FALSE(unregisterProfile(iCode));
+    Bytes aBytes = bytesOf(ORVO::Test::gammaProfile(2.0));
+    registerProfile(iCode, aBytes.data(), aBytes.size());
+    aBytes.assign(aBytes.size(), 0); // copied
+    EXPECT_TRUE(isKnownProfile(iCode));
+    VantleTransform* const pTransform = engine.transform(iCode, PROFILE_LINEAR_SRGB);
+    // (100/255)^2 * 255 = 39.2, (200/255)^2 * 255 = 156.9
+    EXPECT_EQ(39, transformed(engine, pTransform, 100));
+    EXPECT_EQ(157, transformed(engine, pTransform, 200));
+    EXPECT_EQ(0u, engine.UnReferenceTransform(pTransform));
+    EXPECT_TRUE(unregisterProfile(iCode));
+    VantleProfile* pProfile = nullptr;
+    EXPECT_EQ("Unknown profile code", engine.failureText(engine.ProfileFromCode(&pProfile, iCode)));
+}
+
+TEST_F(ProfileRegistryTest, AnotherProfileUnderTheSameCodeIsAnotherTransform) {
+    NothingLeft const nothingLeft;
+    Engine const engine;
+    Bytes const aSquare = bytesOf(ORVO::Test::gammaProfile(2.0));
+    Bytes const aLinear = bytesOf(ORVO::Test::gammaProfile(1.0));
+    registerProfile(iCode, aSquare.data(), aSquare.size());
+    VantleTransform* const pFirst = engine.transform(iCode, PROFILE_LINEAR_SRGB);
+    registerProfile(iCode, aSquare.data(), aSquare.size());
+    VantleTransform* const pSame = engine.transform(iCode, PROFILE_LINEAR_SRGB);
+    EXPECT_EQ(pFirst, pSame) << "the same bytes change nothing";
+    registerProfile(iCode, aLinear.data(), aLinear.size());
+    VantleTransform* const pOther = engine.transform(iCode, PROFILE_LINEAR_SRGB);
+    EXPECT_NE(pFirst, pOther);
+    EXPECT_EQ(100, transformed(engine, pOther, 100));
+    EXPECT_EQ(39, transformed(engine, pFirst, 100)) << "a transform keeps its profile";
+    for (VantleTransform* const pTransform : {pFirst, pSame, pOther}) {
+        EXPECT_EQ(0u, engine.UnReferenceTransform(pTransform));
+    }
+}
+
+TEST_F(ProfileRegistryTest, ATableProfileWorksInTheDirectionThatItHas) {
+    NothingLeft const nothingLeft;
+    Engine const engine;
+    Bytes const aBytes = ORVO::Test::tableSourceProfile();
+    registerProfile(iCode, aBytes.data(), aBytes.size());
+    VantleTransform* const pTransform = engine.transform(iCode, PROFILE_LINEAR_SRGB);
+    EXPECT_NEAR(39, transformed(engine, pTransform, 100), 1);
+    EXPECT_NEAR(157, transformed(engine, pTransform, 200), 1);
+    EXPECT_EQ(0u, engine.UnReferenceTransform(pTransform));
+    VantleProfile* const pProfile = engine.profile(iCode);
+    VantleProfile* const pSRGB = engine.profile(PROFILE_SRGB);
+    VantleTransform* pRaw = nullptr;
+    EXPECT_EQ("No transform between the profiles",
+              engine.failureText(engine.MakeColorTransform(&pRaw, pSRGB, pProfile, 0, 0)));
+    EXPECT_EQ(nullptr, pRaw);
+    EXPECT_EQ(0u, engine.UnReferenceProfile(pProfile));
+    EXPECT_EQ(0u, engine.UnReferenceProfile(pSRGB));
+}
+
+TEST_F(ProfileRegistryTest, RefusesWhatIsNoProfileOfColoursAndKeepsTheOldOne) {
+    Bytes const aGood = bytesOf(ORVO::Test::gammaProfile(2.0));
+    registerProfile(iCode, aGood.data(), aGood.size());
+    auto const refuse = [](Bytes const& aBytes, char const* pText) {
+        ORVO_EXPECT_PARAMETER(registerProfile(iCode, aBytes.data(), aBytes.size()), pText);
+        EXPECT_TRUE(isKnownProfile(iCode));
+    };
+    refuse(Bytes(200, 'x'), "Not an ICC profile");
+    refuse(Bytes(1, 0), "Not an ICC profile");
+    refuse(Bytes(aGood.begin(), aGood.begin() + 100), "Not an ICC profile");
+    refuse(bytesOf(cmsCreateLab4Profile(nullptr)), "Profile is neither RGB nor grey");
+    refuse(bytesOf(cmsCreateInkLimitingDeviceLink(cmsSigCmykData, 200)), "Profile is neither RGB nor grey");
+    cmsToneCurve* const pCurve = cmsBuildGamma(nullptr, 1.0);
+    cmsToneCurve* const aCurves[3] = {pCurve, pCurve, pCurve};
+    refuse(bytesOf(cmsCreateLinearizationDeviceLink(cmsSigRgbData, aCurves)), "Profile describes no colours");
+    cmsFreeToneCurve(pCurve);
+    cmsHPROFILE const pNoCurves = ORVO::Test::gammaProfile(1.0);
+    cmsWriteTag(pNoCurves, cmsSigRedTRCTag, nullptr);
+    refuse(bytesOf(pNoCurves), "Profile describes no colours");
+    ORVO_EXPECT_PARAMETER(registerProfile(iCode, nullptr, 3), "Enforce pBytes != NULL");
+    for (BuiltInProfile const& profile : BUILT_IN_PROFILES) {
+        ORVO_EXPECT_PARAMETER(registerProfile(profile.code, aGood.data(), aGood.size()),
+                              "Profile code is built in");
+        EXPECT_TRUE(isKnownProfile(profile.code));
+        EXPECT_FALSE(unregisterProfile(profile.code));
+    }
+}
+
+} // namespace

@@ -1,0 +1,130 @@
+#include "orvo/colour_engine/internal/ShaderDescription.h"
+
+#include "orvo/colour_engine/internal/ResolvedTransform.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <numeric>
+
+namespace ORVO::ColourEngine::Internal {
+namespace {
+
+using Record = _t_Vantle_ShaderParameterData;
+
+ChannelCurve power(double exponent) {
+    return ChannelCurve([=](double x) { return std::pow(x, exponent); });
+}
+
+constexpr std::array<double, 9> aMatrix{0.5, 0.25, 0.125, -0.5, 1.5, 0.0625, 0.75, -0.25, 2.0};
+
+/// The exponents of the input curves and of the output curves.
+ResolvedTransform shaper(std::array<double, 3> const& in, std::array<double, 3> const& out) {
+    return ResolvedTransform(MatrixShaper{
+        {power(in[0]), power(in[1]), power(in[2])}, aMatrix, {power(out[0]), power(out[1]), power(out[2])}});
+}
+
+/// Tables as the engine's interface numbers them: 1D, luminance of 32-bit floats, nearest, clamped to edge.
+void expectCurve(ShaderDescription::Parameter const& parameter, char const* pName) {
+    EXPECT_EQ(pName, parameter.sName_);
+    Record const& record = parameter.record_;
+    EXPECT_EQ(Record::KIND_TEXTURE_1D, record.kind);
+    EXPECT_EQ(0x0DE0U, record.target);
+    EXPECT_EQ(0, record.level);
+    EXPECT_EQ(0x8818U, record.internalFormat);
+    EXPECT_EQ(4096U, record.width);
+    EXPECT_EQ(1U, record.height);
+    EXPECT_EQ(1U, record.depth);
+    EXPECT_EQ(0, record.border);
+    EXPECT_EQ(0x1909U, record.format);
+    EXPECT_EQ(0x1406U, record.type);
+    EXPECT_EQ(0x2600U, record.minFilter);
+    EXPECT_EQ(0x2600U, record.magFilter);
+    EXPECT_EQ(0x812FU, record.wrapS);
+    EXPECT_EQ(4096U, parameter.aData_.size());
+}
+
+TEST(ShaderDescription, GivesEveryCurveATable) {
+    ShaderDescription const description(shaper({1.5, 2.0, 2.5}, {0.5, 0.75, 1.25}));
+    auto const& aParameters = description.parameters();
+    ASSERT_EQ(7U, aParameters.size());
+    for (std::size_t i : {0U, 1U, 2U}) {
+        expectCurve(aParameters[i], std::array{"orvoInput0", "orvoInput1", "orvoInput2"}[i]);
+        expectCurve(aParameters[4 + i], std::array{"orvoOutput0", "orvoOutput1", "orvoOutput2"}[i]);
+    }
+    // Inputs over the value, outputs over its square root.
+    for (std::size_t n : {0U, 1U, 1000U, 4095U}) {
+        double const x = double(n) / 4095.0;
+        EXPECT_FLOAT_EQ(float(std::pow(x, 1.5)), aParameters[0].aData_[n]) << n;
+        EXPECT_FLOAT_EQ(float(std::pow(x, 2.5)), aParameters[2].aData_[n]) << n;
+        EXPECT_FLOAT_EQ(float(x), aParameters[4].aData_[n]) << n;
+        EXPECT_FLOAT_EQ(float(std::pow(x, 2.5)), aParameters[6].aData_[n]) << n;
+    }
+}
+
+TEST(ShaderDescription, UploadsTheMatrixByColumns) {
+    ShaderDescription const description(shaper({2, 2, 2}, {0.5, 0.5, 0.5}));
+    auto const& parameter = description.parameters().at(1);
+    EXPECT_EQ("orvoMatrix", parameter.sName_);
+    EXPECT_EQ(Record::KIND_MATRIX_3X3, parameter.record_.kind);
+    EXPECT_EQ((std::vector<float>{0.5F, -0.5F, 0.75F, 0.25F, 1.5F, -0.25F, 0.125F, 0.0625F, 2.0F}),
+              parameter.aData_);
+}
+
+TEST(ShaderDescription, SharesTablesBetweenEqualCurves) {
+    ShaderDescription const one(shaper({2, 2, 2}, {0.5, 0.5, 0.5}));
+    ASSERT_EQ(3U, one.parameters().size());
+    EXPECT_EQ("orvoOutput0", one.parameters()[2].sName_);
+    EXPECT_EQ(std::string::npos, one.code().find("orvoInput1"));
+    ShaderDescription const two(shaper({2, 1.8, 2}, {0.5, 0.5, 0.4}));
+    ASSERT_EQ(5U, two.parameters().size());
+    EXPECT_NE(std::string::npos, two.code().find("orvoCurve(orvoInput0, color.r), orvoCurve(orvoInput1, "
+                                                 "color.g), orvoCurve(orvoInput0, color.b)"));
+    EXPECT_NE(std::string::npos, two.code().find("orvoCurve(orvoOutput0, root.r), orvoCurve(orvoOutput0, "
+                                                 "root.g), orvoCurve(orvoOutput2, root.b)"));
+}
+
+TEST(ShaderDescription, MakesACubeOfOneTexture) {
+    ColourCube cube;
+    cube.aValues_.resize(std::size_t(33) * 33 * 33 * 3);
+    std::iota(cube.aValues_.begin(), cube.aValues_.end(), 0.0F);
+    ShaderDescription const description{ResolvedTransform(cube)};
+    ASSERT_EQ(1U, description.parameters().size());
+    auto const& parameter = description.parameters().front();
+    EXPECT_EQ("orvoCube", parameter.sName_);
+    EXPECT_EQ(cube.aValues_, parameter.aData_);
+    Record const& record = parameter.record_;
+    EXPECT_EQ(Record::KIND_TEXTURE_3D, record.kind);
+    EXPECT_EQ(0x806FU, record.target);
+    EXPECT_EQ(0, record.level);
+    EXPECT_EQ(0x8054U, record.internalFormat);
+    EXPECT_EQ(33U, record.width);
+    EXPECT_EQ(33U, record.height);
+    EXPECT_EQ(33U, record.depth);
+    EXPECT_EQ(0x1907U, record.format);
+    EXPECT_EQ(0x1406U, record.type);
+    EXPECT_EQ(0x2601U, record.minFilter);
+    EXPECT_EQ(0x2601U, record.magFilter);
+    for (std::uint32_t const wrap : {record.wrapR, record.wrapS, record.wrapT})
+        EXPECT_EQ(0x812FU, wrap);
+    EXPECT_NE(std::string::npos, description.code().find("color.rgb * (32.0 / 33.0) + 0.5 / 33.0"));
+}
+
+TEST(ShaderDescription, StaysWithinTheInterfacesLengths) {
+    ColourCube cube;
+    cube.aValues_.resize(std::size_t(33) * 33 * 33 * 3);
+    for (ResolvedTransform const& transform :
+         {ResolvedTransform(cube), shaper({1.5, 2.0, 2.5}, {0.5, 0.75, 1.25})}) {
+        ShaderDescription const description(transform);
+        EXPECT_LT(description.code().size(), 8192U);
+        EXPECT_LT(description.entryPoint().size(), 1024U);
+        EXPECT_NE(std::string::npos,
+                  description.code().find("void " + description.entryPoint() + "(inout vec4 color)"));
+        for (auto const& parameter : description.parameters())
+            EXPECT_NE(std::string::npos, description.code().find(" " + parameter.sName_ + ";\n"))
+                << parameter.sName_;
+    }
+}
+
+} // namespace
+} // namespace ORVO::ColourEngine::Internal

@@ -1,0 +1,47 @@
+/// ICC profiles as bytes, made with the colour library itself.
+#pragma once
+
+#include <gtest/gtest.h>
+#include <lcms2.h>
+
+#include <vector>
+
+namespace ORVO::Test {
+
+using Bytes = std::vector<unsigned char>;
+
+/// The bytes of a profile, which is closed.
+inline Bytes bytesOf(cmsHPROFILE pProfile) {
+    cmsUInt32Number size = 0;
+    EXPECT_TRUE(cmsSaveProfileToMem(pProfile, nullptr, &size));
+    Bytes aBytes(size);
+    EXPECT_TRUE(cmsSaveProfileToMem(pProfile, aBytes.data(), &size));
+    cmsCloseProfile(pProfile);
+    return aBytes;
+}
+
+/// RGB of curves and a matrix, D65, with the primaries of sRGB and a gamma.
+inline cmsHPROFILE gammaProfile(double gamma) {
+    cmsCIExyY const white = {0.3127, 0.3290, 1.0};
+    cmsCIExyYTRIPLE const primaries = {{0.64, 0.33, 1.0}, {0.30, 0.60, 1.0}, {0.15, 0.06, 1.0}};
+    cmsToneCurve* const pCurve = cmsBuildGamma(nullptr, gamma);
+    cmsToneCurve* const aCurves[3] = {pCurve, pCurve, pCurve};
+    cmsHPROFILE const pProfile = cmsCreateRGBProfile(&white, &primaries, aCurves);
+    cmsFreeToneCurve(pCurve);
+    return pProfile;
+}
+
+/// RGB with tables alone: what sRGB means, in Lab. It is a source and no destination.
+inline Bytes tableSourceProfile() {
+    cmsHPROFILE const pRGB = gammaProfile(2.0);
+    cmsHPROFILE const pLab = cmsCreateLab4Profile(nullptr);
+    cmsHTRANSFORM const pTransform =
+        cmsCreateTransform(pRGB, TYPE_RGB_16, pLab, TYPE_Lab_16, INTENT_PERCEPTUAL, cmsFLAGS_NOOPTIMIZE);
+    cmsHPROFILE const pLink = cmsTransform2DeviceLink(pTransform, 4.3, cmsFLAGS_GUESSDEVICECLASS);
+    cmsDeleteTransform(pTransform);
+    cmsCloseProfile(pLab);
+    cmsCloseProfile(pRGB);
+    return bytesOf(pLink);
+}
+
+} // namespace ORVO::Test

@@ -1,0 +1,220 @@
+// Transforms of the embedded engine on the GPU against the same on the CPU: a dense lattice over the RGB
+// cube, random colours, and the grey axis.
+#include "orvo/image_flow/filters/VantleFilterGPU.h"
+
+#include "tests/image_flow/support/ShaderRoad.h"
+
+#include "orvo/colour_engine/ProfileCodes.h"
+#include "orvo/colour_engine/VantlePackingSpec.h"
+#include "orvo/colour_engine/internal/ResolvedTransform.h"
+#include "orvo/colour_engine/internal/ShaderDescription.h"
+#include "orvo/image_flow/colour/CVantle.h"
+#include "tests/support/RecordingEngine.h"
+
+namespace {
+
+using namespace ORVO;
+using namespace ORVO::Test;
+using namespace ORVO::ColourEngine;
+
+/// A transform of the engine's, with the perceptual intent.
+class EngineTransform {
+public:
+    EngineTransform(std::uint32_t source, std::uint32_t destination) {
+        VantleProfile* pSource = nullptr;
+        VantleProfile* pDestination = nullptr;
+        VantleTransform* pRaw = nullptr;
+        EXPECT_EQ(0U, CVantle::ProfileFromCode(&pSource, source));
+        EXPECT_EQ(0U, CVantle::ProfileFromCode(&pDestination, destination));
+        EXPECT_EQ(0U, CVantle::MakeColorTransform(&pRaw, pSource, pDestination, VANTLE_INTENT_PERCEPTUAL, 0));
+        EXPECT_EQ(0U, CVantle::OptimizeTransform(&pTransform_, pRaw, 0));
+        CVantle::UnReferenceTransform(pRaw);
+        CVantle::UnReferenceProfile(pSource);
+        CVantle::UnReferenceProfile(pDestination);
+    }
+    ~EngineTransform() { CVantle::UnReferenceTransform(pTransform_); }
+    EngineTransform(EngineTransform const&) = delete;
+    EngineTransform& operator=(EngineTransform const&) = delete;
+
+    VantleTransform* get() const { return pTransform_; }
+
+private:
+    VantleTransform* pTransform_ = nullptr;
+};
+
+constexpr int nWidth = 128;
+constexpr int nHeight = 64;
+constexpr std::size_t nLatticeEdge = 17;
+
+/// Colours in integers from 0 to white: the lattice, the grey axis, and random ones.
+template <typename T>
+std::vector<T> colours(unsigned white) {
+    std::vector<T> aValues;
+    std::mt19937 random(41);
+    for (std::size_t i = 0; i < std::size_t(nWidth) * nHeight; ++i) {
+        std::size_t const iGrey = i - nLatticeEdge * nLatticeEdge * nLatticeEdge;
+        for (std::size_t c = 0; c < 3; ++c) {
+            std::size_t const aIndex[] = {i % nLatticeEdge, i / nLatticeEdge % nLatticeEdge,
+                                          i / nLatticeEdge / nLatticeEdge};
+            unsigned value = 0;
+            if (i < nLatticeEdge * nLatticeEdge * nLatticeEdge)
+                value = static_cast<unsigned>(aIndex[c] * white / (nLatticeEdge - 1));
+            else if (iGrey < 512)
+                value = static_cast<unsigned>(iGrey * white / 511);
+            else
+                value = random() % (white + 1);
+            aValues.push_back(static_cast<T>(value));
+        }
+    }
+    return aValues;
+}
+
+template <typename T>
+std::vector<T> onCPU(std::vector<T> const& aColours, EngineTransform const& transform) {
+    std::vector<T> aResult(aColours.size());
+    auto const specOf = [](std::vector<T> const& aPixels) {
+        _t_Vantle_PackingSpec spec{};
+        spec.space = _t_Vantle_PackingSpec::SPACE_RGB;
+        spec.channels = 3;
+        spec.bytesPerChannel = sizeof(T);
+        for (std::size_t c = 0; c < 3; ++c) {
+            spec.planes[c].base = const_cast<T*>(aPixels.data() + c);
+            spec.planes[c].columnBytes = 3 * sizeof(T);
+            spec.planes[c].rowBytes = static_cast<std::int32_t>(nWidth * 3 * sizeof(T));
+        }
+        return spec;
+    };
+    _t_Vantle_PackingSpec const source = specOf(aColours);
+    _t_Vantle_PackingSpec const destination = specOf(aResult);
+    EXPECT_EQ(0U, CVantle::ApplyGeneral(transform.get(), &source, &destination, nHeight, nWidth, nullptr));
+    return aResult;
+}
+
+template <typename T>
+Texels pictureOf(std::vector<T> const& aColours, double white) {
+    return Texels(pixels(0, 0, nWidth, nHeight)).fill([&](int x, int y) {
+        std::size_t const i = 3 * (std::size_t(y) * nWidth + std::size_t(x));
+        return Pixel{aColours[i] / white, aColours[i + 1] / white, aColours[i + 2] / white, 0.75};
+    });
+}
+
+class VantleTransformsTest : public ShaderFlowTest {
+protected:
+    VantleTransformsTest() { RecordingEngine::install(); }
+
+    /// One filter, to whose changing transforms the colours are shown.
+    struct Road {
+        Road(OGL::Context const& context, Texels const& picture, ImageGPU::tePixelFormat format,
+             ImageFilter::teOutputPrecisionHint hint)
+            : upInput_(textureOf(picture, format)), oRoad_(context, oFilter_) {
+            oFilter_.outputPrecisionHintParameter().setValue(hint);
+            oRoad_.setInput(0, *upInput_);
+        }
+        Texels run(VantleTransform* pTransform) {
+            oFilter_.transform()->setValue(pTransform);
+            return Texels(*oRoad_.run(world(0, 0, nWidth, nHeight)));
+        }
+
+        ImageGPUPtr upInput_;
+        VantleFilterGPU oFilter_;
+        ShaderRoad oRoad_;
+    };
+
+    /// The largest difference of the colours, and the largest one between channels of a grey.
+    struct Errors {
+        double dLargest_ = 0;
+        double dMean_ = 0;
+        double dGrey_ = 0;
+    };
+    template <typename Expected>
+    static Errors errorsOf(Texels const& actual, Texels const& input, Expected const& expected) {
+        Errors errors;
+        for (int y = 0; y < nHeight; ++y)
+            for (int x = 0; x < nWidth; ++x) {
+                Pixel const a = actual.at(x, y);
+                Pixel const e = expected(x, y);
+                for (std::size_t c = 0; c < 3; ++c) {
+                    errors.dLargest_ = std::max(errors.dLargest_, std::abs(a[c] - e[c]));
+                    errors.dMean_ += std::abs(a[c] - e[c]) / (3.0 * nWidth * nHeight);
+                }
+                EXPECT_NEAR(0.75, a[3], 0.5 / 255.0);
+                Pixel const i = input.at(x, y);
+                if (i[0] == i[1] && i[1] == i[2])
+                    errors.dGrey_ = std::max({errors.dGrey_, std::abs(a[0] - a[1]), std::abs(a[1] - a[2])});
+            }
+        return errors;
+    }
+};
+
+constexpr std::pair<std::uint32_t, std::uint32_t> aPairs[] = {
+    {PROFILE_WIDE_GAMUT, PROFILE_SRGB},  {PROFILE_SRGB, PROFILE_WIDE_GAMUT},
+    {PROFILE_SRGB, PROFILE_DISPLAY_P3},  {PROFILE_DISPLAY_P3, PROFILE_BT_2020},
+    {PROFILE_BT_2020, PROFILE_SRGB},     {PROFILE_LINEAR_SRGB, PROFILE_SRGB},
+    {PROFILE_SRGB, PROFILE_LINEAR_SRGB}, {PROFILE_WIDE_GAMUT, PROFILE_LINEAR_SRGB},
+    {PROFILE_GRAY, PROFILE_SRGB},        {PROFILE_SRGB, PROFILE_GRAY},
+    {PROFILE_SRGB, PROFILE_SRGB}};
+
+TEST_F(VantleTransformsTest, BytesAreWithinOneOfTheCPU) {
+    auto const aColours = colours<std::uint8_t>(255);
+    Texels const input = pictureOf(aColours, 255.0);
+    Road road(frameContext(), input, ImageGPU::PIXEL_FORMAT_RGBA8, ImageFilter::OUTPUT_PRECISION_8_BIT_INT);
+    for (auto const& [source, destination] : aPairs) {
+        EngineTransform const transform(source, destination);
+        Texels const expected = pictureOf(onCPU(aColours, transform), 255.0);
+        Errors const errors =
+            errorsOf(road.run(transform.get()), input, [&](int x, int y) { return expected.at(x, y); });
+        EXPECT_LE(errors.dLargest_ * 255.0, 1.0 + 1e-3) << std::hex << source << " " << destination;
+        EXPECT_LE(errors.dGrey_ * 255.0, 1.0 + 1e-3) << std::hex << source << " " << destination;
+    }
+}
+
+TEST_F(VantleTransformsTest, FloatsAreWithinAThousandthOfTheCPU) {
+    auto const aColours = colours<std::uint16_t>(32768);
+    Texels const input = pictureOf(aColours, 32768.0);
+    Road road(frameContext(), input, ImageGPU::PIXEL_FORMAT_RGBA32F,
+              ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT);
+    for (auto const& [source, destination] : aPairs) {
+        EngineTransform const transform(source, destination);
+        Texels const expected = pictureOf(onCPU(aColours, transform), 32768.0);
+        Errors const errors =
+            errorsOf(road.run(transform.get()), input, [&](int x, int y) { return expected.at(x, y); });
+        EXPECT_LE(errors.dLargest_, 1e-3) << std::hex << source << " " << destination;
+        EXPECT_LE(errors.dGrey_, 1e-3) << std::hex << source << " " << destination;
+    }
+}
+
+/// A cube that bends all colours, with the greys grey.
+Internal::ColourCube bentCube() {
+    constexpr std::size_t n = Internal::ColourCube::nEdge_;
+    Internal::ColourCube cube;
+    for (std::size_t i = 0; i < n * n * n; ++i) {
+        double const r = double(i % n) / (n - 1);
+        double const g = double(i / n % n) / (n - 1);
+        double const b = double(i / n / n) / (n - 1);
+        for (double const value :
+             {0.7 * r * r + 0.3 * g * b, std::sqrt(g) * 0.5 + 0.5 * b * b * g, r * g * b})
+            cube.aValues_.push_back(float(value));
+    }
+    return cube;
+}
+
+TEST_F(VantleTransformsTest, CubesAreInterpolated) {
+    Internal::ResolvedTransform const resolved(bentCube());
+    Internal::ShaderDescription const description(resolved);
+    RecordingEngine::shader() = {description.entryPoint(), description.code(), {}};
+    for (auto const& parameter : description.parameters())
+        RecordingEngine::shader().aTables_.push_back({parameter.sName_, parameter.record_, parameter.aData_});
+    auto const aColours = colours<std::uint16_t>(32768);
+    Texels const input = pictureOf(aColours, 32768.0);
+    Road road(frameContext(), input, ImageGPU::PIXEL_FORMAT_RGBA32F,
+              ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT);
+    Errors const errors = errorsOf(road.run(RecordingEngine::ownTransform()), input, [&](int x, int y) {
+        Pixel const c = input.at(x, y);
+        auto const e = resolved.evaluate({c[0], c[1], c[2]});
+        return Pixel{e[0], e[1], e[2], c[3]};
+    });
+    EXPECT_LE(errors.dLargest_, 1e-3);
+    EXPECT_LE(errors.dMean_, 2e-4);
+}
+
+} // namespace
