@@ -9,6 +9,7 @@
 #include "orvo/data_flow/librarian/NodeMetaData.h"
 #include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
+#include "orvo/image_flow/filters/FastBilateralFilterGPU.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
@@ -49,6 +50,15 @@ Node* createOnGPU(NodeTargetType target) {
     return target == DataFlow::NODE_TARGET_GPU ? ORVO_NEW GPUNode() : nullptr;
 }
 
+/// A node type with one class for the GPU and another for every other target.
+template <typename CPUNode, typename GPUNode>
+Node* createForTarget(NodeTargetType target) {
+    if (target == DataFlow::NODE_TARGET_GPU) {
+        return ORVO_NEW GPUNode();
+    }
+    return ORVO_NEW CPUNode();
+}
+
 /// A node type with one class for every target.
 template <typename AnyNode>
 Node* createOnAny(NodeTargetType /*target*/) {
@@ -66,7 +76,8 @@ constexpr NodeType aNodeTypes[] = {
     {"CPU2GPU", "CPU2GPU", createOnAny<CPU2GPU>},
     {"ImageGPUInput", "ImageGPUInput", createOnGPU<ImageGPUInput>},
     {"ImageGPUOutput", "ImageGPUOutput", createOnGPU<ImageGPUOutput>},
-    {"FastBilateralFilter", "NRVN Fast Bilateral", createOnCPU<FastBilateralFilterCPUNode>},
+    {"FastBilateralFilter", "NRVN Fast Bilateral",
+     createForTarget<FastBilateralFilterCPUNode, FastBilateralFilterGPU>},
     {"RGBToLABCPU", "NRVN ORVO RGB2LAB", createOnCPU<RGBToLABCPU>},
     {"LABToRGBCPU", "NRVN ORVO LAB2RGB", createOnCPU<LABToRGBCPU>},
     {"ImageCPUInput", "ImageCPUInput", createOnAny<ImageCPUInput>},
