@@ -11,6 +11,8 @@
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
 #include "orvo/image_flow/filters/FastBilateralFilterGPU.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
+#include "orvo/image_flow/filters/MirelCheckerBoardGPU.h"
+#include "orvo/image_flow/filters/MirelGamutTestCompositeGPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
 #include "orvo/image_flow/sources/ImageCPUInput.h"
@@ -81,7 +83,9 @@ constexpr NodeType aNodeTypes[] = {
     {"RGBToLABCPU", "NRVN ORVO RGB2LAB", createOnCPU<RGBToLABCPU>},
     {"LABToRGBCPU", "NRVN ORVO LAB2RGB", createOnCPU<LABToRGBCPU>},
     {"ImageCPUInput", "ImageCPUInput", createOnAny<ImageCPUInput>},
+    {"MirelCheckerBoardGPU", "NRVN ORVO CheckerBoard GPU", createOnGPU<MirelCheckerBoardGPU>},
     {"SimpleBilateralCPU", "NRVN Simple Bilateral CPU", createOnCPU<SimpleBilateralFilterCPU>},
+    {"MirelGamutComposite", "Mirel Gamut Test Result Composite", createOnGPU<MirelGamutTestCompositeGPU>},
 };
 
 bool isRegistered(NodeLibrarian const& librarian, NodeType const& type) {
