@@ -128,6 +128,7 @@ void FastBilateralFilterGPU::probeFloatTargets() {
         throw;
     }
     restore();
+    ORVO_OGL_THROW_ON_ERROR("The driver refuses a texture of floats to draw to");
 }
 
 void FastBilateralFilterGPU::compilePrograms() {
