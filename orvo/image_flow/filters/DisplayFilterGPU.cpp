@@ -1,6 +1,7 @@
 #include "orvo/image_flow/filters/DisplayFilterGPU.h"
 
 #include "orvo/core/Check.h"
+#include "orvo/image_flow/filters/bilateral/GPUPrograms.h"
 #include "orvo/image_runtime/ShaderManagerOGL.h"
 #include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/Program.h"
@@ -9,16 +10,6 @@
 
 namespace ORVO {
 
-namespace {
-
-constexpr char const* pPassThroughVertexSource = R"(void main() {
-    gl_TexCoord[0] = gl_MultiTexCoord0;
-    gl_Position = ftransform();
-}
-)";
-
-} // namespace
-
 DisplayFilterGPU::DisplayFilterGPU(char const* name)
     : SimpleFilterGPU(name), bRunInHardware_(true), pProgramOfPass_(nullptr) {}
 
@@ -26,9 +17,12 @@ DisplayFilterGPU::~DisplayFilterGPU() = default;
 
 bool DisplayFilterGPU::willRunInHardware() { return bRunInHardware_; }
 
-void DisplayFilterGPU::compile(ShaderProgramProxyOGL& oProgram, char const* pFragmentSource) {
-    oProgram.add(VertexShaderSourceOGL(pPassThroughVertexSource));
+void DisplayFilterGPU::addSources(ShaderProgramProxyOGL& oProgram, char const* pFragmentSource) {
+    oProgram.add(VertexShaderSourceOGL(ImageFlow::bilateral::passThroughVertexProgram()));
     oProgram.add(FragmentShaderSourceOGL(pFragmentSource));
+}
+
+void DisplayFilterGPU::link(ShaderProgramProxyOGL& oProgram) {
     ShaderManagerOGL* const pManager = ShaderManagerOGL::Instance();
     ORVO_ENFORCE(pManager);
     pManager->RegisterShaderProgram(&oProgram);

@@ -39,9 +39,10 @@ protected:
     /// Unlocks the programs, too.
     void abandonPass() noexcept override;
 
-    /// Adds the vertex program that passes on coordinates, and a fragment program, to a proxy, and links
-    /// them. Throws OGL::ExceptionOGL, and what ShaderManagerOGL::Instance() throws.
-    static void compile(ShaderProgramProxyOGL& oProgram, char const* pFragmentSource);
+    /// Gives a proxy its sources: the vertex program that passes on coordinates, and a fragment program.
+    static void addSources(ShaderProgramProxyOGL& oProgram, char const* pFragmentSource);
+    /// Links a program. Throws OGL::ExceptionOGL, and what ShaderManagerOGL::Instance() throws.
+    static void link(ShaderProgramProxyOGL& oProgram);
     /// The image of image input 0. Throws "Enforce pImage != NULL" if it holds none.
     ImageGPU const& inputImage() const;
     /// Binds an image to the unit, nearest and clamped to its edge, unless it is bound already. Answers the

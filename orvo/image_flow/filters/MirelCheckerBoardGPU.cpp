@@ -81,6 +81,9 @@ MirelCheckerBoardGPU::MirelCheckerBoardGPU(ScopedPtr<DataFlow::Parameter<float4>
     registerParameter(apColorB_.get());
     registerParameter(apCheckerSize_.get());
     registerParameter(&oCompositeGamma_);
+    // All sources first: a program that cannot be linked now may be when a context is there.
+    addSources(oProgram_, pCheckerSource);
+    addSources(oGammaProgram_, pCheckerGammaSource);
     try {
         compilePrograms();
     } catch (...) {
@@ -91,8 +94,8 @@ MirelCheckerBoardGPU::MirelCheckerBoardGPU(ScopedPtr<DataFlow::Parameter<float4>
 MirelCheckerBoardGPU::~MirelCheckerBoardGPU() = default;
 
 void MirelCheckerBoardGPU::compilePrograms() {
-    compile(oProgram_, pCheckerSource);
-    compile(oGammaProgram_, pCheckerGammaSource);
+    link(oProgram_);
+    link(oGammaProgram_);
 }
 
 DataFlow::Parameter<float4>& MirelCheckerBoardGPU::colorA() const { return *apColorA_; }

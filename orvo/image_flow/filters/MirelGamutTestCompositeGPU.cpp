@@ -40,6 +40,7 @@ MirelGamutTestCompositeGPU::MirelGamutTestCompositeGPU()
     addImageInput(&oGamutTestResult_);
     registerParameter(&oColor_);
     registerParameter(&oOpacity_);
+    addSources(oProgram_, pGamutSource);
     try {
         compilePrograms();
     } catch (...) {
@@ -49,7 +50,7 @@ MirelGamutTestCompositeGPU::MirelGamutTestCompositeGPU()
 
 MirelGamutTestCompositeGPU::~MirelGamutTestCompositeGPU() = default;
 
-void MirelGamutTestCompositeGPU::compilePrograms() { compile(oProgram_, pGamutSource); }
+void MirelGamutTestCompositeGPU::compilePrograms() { link(oProgram_); }
 
 DataFlow::IntervalParameter<float4>& MirelGamutTestCompositeGPU::color() { return oColor_; }
 

@@ -45,6 +45,7 @@ MirelToneMappingGPU::MirelToneMappingGPU()
     registerParameter(&oExposure_);
     registerParameter(&oGamma_);
     registerParameter(&oLuminanceFactor_);
+    addSources(oProgram_, pToneMappingSource);
     try {
         compilePrograms();
     } catch (...) {
@@ -54,7 +55,7 @@ MirelToneMappingGPU::MirelToneMappingGPU()
 
 MirelToneMappingGPU::~MirelToneMappingGPU() = default;
 
-void MirelToneMappingGPU::compilePrograms() { compile(oProgram_, pToneMappingSource); }
+void MirelToneMappingGPU::compilePrograms() { link(oProgram_); }
 
 DataFlow::Parameter<bool>& MirelToneMappingGPU::exposureGammaOrHDRCompression() {
     return oExposureGammaOrHDRCompression_;
