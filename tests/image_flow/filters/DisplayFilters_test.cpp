@@ -393,6 +393,36 @@ TEST_F(DisplayFiltersTest, AThousandFramesOfChangingSizesTakeNothingMore) {
     }
 }
 
+TEST_F(DisplayFiltersTest, PixelsOutsideTheirRegionHaveNoInfluence) {
+    auto const region = pixels(-1, 2, 4, 3);
+    Texels const inside(region);
+    Texels const clean = randomTexels(pixels(-3, 0, 9, 8), 17);
+    double const none = std::numeric_limits<double>::quiet_NaN();
+    Texels const poisoned = Texels(clean.region()).fill([&](int x, int y) {
+        return inside.contains(x, y) ? clean.at(x, y) : Pixel{none, none, none, none};
+    });
+    ImageGPUPtr const upClean = textureOf(clean, ImageGPU::PIXEL_FORMAT_RGBA16F);
+    ImageGPUPtr const upPoisoned = textureOf(poisoned, ImageGPU::PIXEL_FORMAT_RGBA16F);
+    for (DisplayFilterRow const& row : aDisplayFilters) {
+        std::vector<Texels> aResults;
+        for (ImageGPU* pImage : {upClean.get(), upPoisoned.get()}) {
+            std::unique_ptr<DisplayFilterGPU> const upFilter = row.pMake_();
+            ShaderRoad road(frameContext(), *upFilter);
+            for (std::size_t i = 0; i < upFilter->numberOfImageInputs(); ++i)
+                road.setInput(i, *pImage);
+            aResults.emplace_back(*road.run(pixelToWorldSpace(region, PixelExtentInWorldSpace())));
+        }
+        // Negative colours have no power: what is no number must be none in both.
+        for (int y = inside.top(); y < inside.top() + inside.height(); ++y)
+            for (int x = inside.left(); x < inside.left() + inside.width(); ++x)
+                for (std::size_t c = 0; c < 4; ++c) {
+                    double const a = aResults[0].at(x, y)[c];
+                    double const b = aResults[1].at(x, y)[c];
+                    EXPECT_TRUE(a == b || (std::isnan(a) && std::isnan(b))) << row.pName_ << a << " " << b;
+                }
+    }
+}
+
 TEST_F(DisplayFiltersTest, ProgramsThatWereDiscardedAreLinkedAgain) {
     for (DisplayFilterRow const& row : aDisplayFilters) {
         DisplayFilterRoad road(frameContext(), row);
