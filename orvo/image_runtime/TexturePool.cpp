@@ -126,8 +126,18 @@ TextureT* TexturePool::get(TextureFreeList<TextureT>& oFreeList,
         nFreeListBytes_ -= countedBytes(*pTexture);
         return pTexture;
     }
-    OGL::ScopedContextWrapper const restore;
-    return make();
+    OGL::NativeContext const before = OGL::NativeContext::current();
+    TextureT* pTexture = nullptr;
+    {
+        OGL::ScopedContextWrapper const restore;
+        pTexture = make();
+    }
+    if (!OGL::NativeContext::current().isSameContext(before)) {
+        // A pass that went on in the pool's context would leave its state and its programs there.
+        put(oFreeList, pTexture);
+        ORVO_OGL_FAIL("The current context could not be made current again", 0);
+    }
+    return pTexture;
 }
 
 OGL::Texture1D* TexturePool::getTexture1DFromPool(unsigned width, Texture::InternalFormat format,
