@@ -189,6 +189,8 @@ void FastBilateralFilterGPU::internalProcess() {
     try {
         GLStateStack states;
         enableUnits(states);
+        // A frame that failed may have left a program behind, if the driver took its context away.
+        glUseProgram(0);
         readParameters();
         setUpOutput(input);
         setUpQuad(input);

@@ -53,7 +53,7 @@ vec3 xyzToRGB(vec3 xyz) {
 }
 )";
 
-constexpr char const* pLuminance = R"(
+constexpr char const* pLuminanceOfColour = R"(
 float luminanceOf(vec3 c) {
     return dot(c, vec3(0.39, 0.50, 0.11));
 }
@@ -110,7 +110,7 @@ void main() {
 std::string scatterVertexProgram(bool bLab) {
     std::string sSource = "uniform vec3 sigmaValues;\nuniform vec3 gridSizes;\n";
     sSource += pPadding;
-    sSource += bLab ? pToLab : pLuminance;
+    sSource += bLab ? pToLab : pLuminanceOfColour;
     sSource += bLab ? R"(
 vec4 valueOf(vec3 c) {
     vec3 lab = xyzToLAB(rgbToXYZ(c));
@@ -178,7 +178,7 @@ uniform sampler2D quotient_grid_texture;
         sSource += pToLab;
         sSource += pFromLab;
     } else {
-        sSource += pLuminance;
+        sSource += pLuminanceOfColour;
     }
     sSource += bLab ? R"(
 float intensityOf(vec3 c) {
