@@ -5,6 +5,7 @@
 #include "orvo/core/exceptions/SharedException.h"
 #include "orvo/core/memory/AllocationFailure.h"
 #include "orvo/core/memory/MemoryStatistics.h"
+#include "orvo/image_flow/filters/BufferCPU.h"
 #include "tests/image_flow/support/Compounds.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
@@ -209,6 +210,38 @@ TEST_F(CompoundFilterBaseTest, RunsWithRegionsThatStandAlready) {
         }(),
         "Output region can't be infinite.");
     filter.disconnect();
+}
+
+TEST_F(CompoundFilterBaseTest, ABufferGivesTheSameImageWhileItIsAnEmitter) {
+    ImageCPUInput source;
+    TestFilter filter;
+    BufferCPU buffer;
+    ImageCPUOutput sink;
+    auto const upImage = floatImage(pixels(0, 0, 2, 1), [](int x, int) { return float(x); });
+    source.setImageCPUWithNoOwnership(upImage.get());
+    feed(filter, 0, source);
+    feed(buffer, 0, filter);
+    feed(sink, 0, buffer);
+    BareCompound compound;
+    for (Node* pNode : std::initializer_list<Node*>{&source, &filter, &buffer, &sink})
+        compound.addNode(pNode);
+    compound.plantMasterTree(sink);
+    EXPECT_EQ((std::vector<Node*>{&source, &buffer}), compound.aEmitters_);
+    auto const result = [&](float offset) {
+        filter.oOffset_.setValue(offset);
+        compound.internalProcess(world(0, 0, 2, 1));
+        return *pixelAt(*sink.getImageCPU(), 1, 0);
+    };
+    compound.aEmitters_.pop_back();
+    EXPECT_EQ(11.0f, result(10));
+    compound.aEmitters_.push_back(&buffer);
+    EXPECT_EQ(11.0f, result(20));
+    EXPECT_EQ(11.0f, result(30));
+    EXPECT_EQ(1, filter.nRuns_);
+    compound.aEmitters_.pop_back();
+    EXPECT_EQ(41.0f, result(40));
+    filter.disconnect();
+    buffer.disconnect();
 }
 
 /// source -> compound that ends in `inner()` -> filter that adds 100 -> sink.
