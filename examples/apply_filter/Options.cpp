@@ -1,7 +1,5 @@
 #include "apply_filter/Options.h"
 
-#include <charconv>
-
 namespace example {
 
 char const usageText[] = R"(Usage: apply_filter --filter NAME [options] INPUT OUTPUT
@@ -23,15 +21,6 @@ Runs one filter over a picture (PNG, JPEG, TIFF or EXR, 1 to 4 channels).
 
 namespace {
 
-template <typename Number>
-Number positive(std::string const& option, std::string const& text) {
-    Number value = 0;
-    auto const [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
-    if (error != std::errc() || end != text.data() + text.size() || value < 1)
-        throw UsageError(option + " needs a whole number of 1 or more, not \"" + text + "\"");
-    return value;
-}
-
 Depth depthNamed(std::string const& text) {
     if (text == "8")
         return Depth::uint8;
@@ -40,21 +29,6 @@ Depth depthNamed(std::string const& text) {
     if (text == "32f")
         return Depth::float32;
     throw UsageError("--precision is 8, 16 or 32f, not \"" + text + "\"");
-}
-
-Target targetNamed(std::string const& text) {
-    if (text == "cpu")
-        return Target::cpu;
-    if (text == "gl")
-        return Target::gl;
-    throw UsageError("--target is cpu or gl, not \"" + text + "\"");
-}
-
-std::pair<std::string, std::string> assignment(std::string const& text) {
-    auto const equals = text.find('=');
-    if (equals == std::string::npos || equals == 0)
-        throw UsageError("--set needs NAME=VALUE, not \"" + text + "\"");
-    return {text.substr(0, equals), text.substr(equals + 1)};
 }
 
 void applyOption(Options& options, std::string const& option, std::string const& value) {

@@ -1,20 +1,14 @@
 #pragma once
 
+#include "common/CommandLine.h"
 #include "common/Picture.h"
 
 #include <optional>
-#include <stdexcept>
 #include <string>
 #include <utility>
 #include <vector>
 
 namespace example {
-
-/// Where frames are computed.
-enum class Target {
-    cpu,
-    gl, ///< OpenGL, in a context without a window
-};
 
 /// What the command line asks for.
 struct Options {
@@ -29,11 +23,6 @@ struct Options {
     bool help = false;
     std::string input;
     std::string output;
-};
-
-class UsageError : public std::runtime_error {
-public:
-    using std::runtime_error::runtime_error;
 };
 
 /// Throws UsageError with one line for a person.

@@ -66,6 +66,15 @@ Picture::Picture(std::size_t pictureWidth, std::size_t pictureHeight, std::size_
       depth(pictureDepth),
       pixels(pictureWidth * pictureHeight * channelCount * bytesPerChannel(pictureDepth)) {}
 
+void Picture::resize(std::size_t pictureWidth, std::size_t pictureHeight, std::size_t channelCount,
+                     Depth pictureDepth) {
+    width = pictureWidth;
+    height = pictureHeight;
+    channels = channelCount;
+    depth = pictureDepth;
+    pixels.resize(pictureWidth * pictureHeight * channelCount * bytesPerChannel(pictureDepth));
+}
+
 std::size_t Picture::rowBytes() const { return width * channels * bytesPerChannel(depth); }
 
 Picture widenedToColour(Picture const& picture) {

@@ -26,6 +26,9 @@ struct Picture {
     Picture() = default;
     Picture(std::size_t width, std::size_t height, std::size_t channels, Depth depth);
 
+    /// Makes it another picture, with any pixels, in the same memory where that is large enough.
+    void resize(std::size_t width, std::size_t height, std::size_t channels, Depth depth);
+
     [[nodiscard]] bool hasAlpha() const { return channels == 2 || channels == 4; }
     [[nodiscard]] std::size_t rowBytes() const;
 };

@@ -1,7 +1,5 @@
 // Reading and writing of picture files, all through OpenImageIO.
-#include "common/Picture.h"
-
-#include <OpenImageIO/imageio.h>
+#include "common/PictureIO.h"
 
 #include <algorithm>
 #include <cmath>
@@ -13,13 +11,33 @@
 
 namespace example {
 
-namespace {
-
 namespace fs = std::filesystem;
+
+namespace {
 
 constexpr float white15_1 = 32768.0F;
 
-// OpenImageIO's own messages may have several lines: the first one says it.
+fs::path temporaryBeside(std::string const& path) {
+    fs::path const target(path);
+    std::string name(1, '.');
+    name += target.stem().string();
+    name += '.';
+    name += std::to_string(::getpid());
+    name += target.extension().string();
+    return target.parent_path() / name;
+}
+
+std::vector<float> withoutAlpha(std::vector<float> const& pixels, std::size_t channels) {
+    std::vector<float> result;
+    result.reserve(pixels.size() / channels * (channels - 1));
+    for (std::size_t pixel = 0; pixel < pixels.size(); pixel += channels)
+        result.insert(result.end(), pixels.begin() + static_cast<std::ptrdiff_t>(pixel),
+                      pixels.begin() + static_cast<std::ptrdiff_t>(pixel + channels - 1));
+    return result;
+}
+
+} // namespace
+
 std::string firstLine(std::string const& text) { return text.substr(0, text.find('\n')); }
 
 std::unique_ptr<OIIO::ImageInput> openForReading(std::string const& path) {
@@ -39,7 +57,6 @@ std::unique_ptr<OIIO::ImageInput> openForReading(std::string const& path) {
     return input;
 }
 
-// Divides the colour by alpha, or multiplies with it.
 void changeAlpha(std::vector<float>& pixels, std::size_t channels, bool divide) {
     for (std::size_t pixel = 0; pixel + channels <= pixels.size(); pixel += channels) {
         float const alpha = pixels[pixel + channels - 1];
@@ -91,7 +108,6 @@ std::string extensionOf(std::string const& path) {
     return extension;
 }
 
-// What the file's channels are stored as: the picture's depth where the format knows it.
 OIIO::TypeDesc fileType(std::string const& extension, Depth depth) {
     if (extension == ".jpg" || extension == ".jpeg" || (depth == Depth::uint8 && extension != ".exr"))
         return OIIO::TypeDesc::UINT8;
@@ -108,50 +124,32 @@ std::unique_ptr<OIIO::ImageOutput> outputFor(std::string const& path) {
     return output;
 }
 
-fs::path temporaryBeside(std::string const& path) {
-    fs::path const target(path);
-    std::string name(1, '.');
-    name += target.stem().string();
-    name += '.';
-    name += std::to_string(::getpid());
-    name += target.extension().string();
-    return target.parent_path() / name;
+TemporaryFile::TemporaryFile(std::string const& target) : target_(target), path_(temporaryBeside(target)) {}
+
+TemporaryFile::~TemporaryFile() {
+    std::error_code ignored;
+    fs::remove(path_, ignored);
 }
 
-// Removes the temporary file unless it was renamed.
-class TemporaryFile {
-public:
-    explicit TemporaryFile(fs::path path) : path_(std::move(path)) {}
-    TemporaryFile(TemporaryFile const&) = delete;
-    TemporaryFile& operator=(TemporaryFile const&) = delete;
-    ~TemporaryFile() {
-        std::error_code ignored;
-        fs::remove(path_, ignored);
-    }
-
-    [[nodiscard]] fs::path const& path() const { return path_; }
-
-private:
-    fs::path path_;
-};
-
-std::vector<float> withoutAlpha(std::vector<float> const& pixels, std::size_t channels) {
-    std::vector<float> result;
-    result.reserve(pixels.size() / channels * (channels - 1));
-    for (std::size_t pixel = 0; pixel < pixels.size(); pixel += channels)
-        result.insert(result.end(), pixels.begin() + static_cast<std::ptrdiff_t>(pixel),
-                      pixels.begin() + static_cast<std::ptrdiff_t>(pixel + channels - 1));
-    return result;
+void TemporaryFile::takePlace() {
+    std::error_code failure;
+    fs::rename(path_, target_, failure);
+    if (failure)
+        throw PictureError("Cannot write " + target_ + ": " + failure.message());
 }
 
-} // namespace
+bool hasAssociatedAlpha(OIIO::ImageSpec const& spec) {
+    bool const hasAlpha = spec.nchannels == 2 || spec.nchannels == 4;
+    return hasAlpha && spec.get_int_attribute("oiio:UnassociatedAlpha") == 0;
+}
 
-Depth depthOfFile(std::string const& path) {
-    OIIO::TypeDesc const type = openForReading(path)->spec().format;
+Depth depthOf(OIIO::TypeDesc type) {
     if (type.is_floating_point())
         return Depth::float32;
     return type.size() == 1 ? Depth::uint8 : Depth::uint15_1;
 }
+
+Depth depthOfFile(std::string const& path) { return depthOf(openForReading(path)->spec().format); }
 
 Picture readPicture(std::string const& path, Depth depth) {
     auto const input = openForReading(path);
@@ -161,7 +159,7 @@ Picture readPicture(std::string const& path, Depth depth) {
     std::vector<float> values(picture.width * picture.height * picture.channels);
     if (!input->read_image(0, 0, 0, spec.nchannels, OIIO::TypeDesc::FLOAT, values.data()))
         throw PictureError("Cannot read " + path + ": " + firstLine(input->geterror()));
-    if (picture.hasAlpha() && spec.get_int_attribute("oiio:UnassociatedAlpha") == 0)
+    if (hasAssociatedAlpha(spec))
         changeAlpha(values, picture.channels, true);
     floatsToPicture(values, picture);
     return picture;
@@ -199,14 +197,11 @@ void writePicture(std::string const& path, Picture const& picture) {
     if (spec.alpha_channel >= 0 && extension != ".exr")
         spec["oiio:UnassociatedAlpha"] = 1;
 
-    TemporaryFile const temporary(temporaryBeside(path));
-    if (!output->open(temporary.path().string(), spec) ||
-        !output->write_image(OIIO::TypeDesc::FLOAT, values.data()) || !output->close())
+    TemporaryFile temporary(path);
+    if (!output->open(temporary.path(), spec) || !output->write_image(OIIO::TypeDesc::FLOAT, values.data()) ||
+        !output->close())
         throw PictureError("Cannot write " + path + ": " + firstLine(output->geterror()));
-    std::error_code failure;
-    fs::rename(temporary.path(), path, failure);
-    if (failure)
-        throw PictureError("Cannot write " + path + ": " + failure.message());
+    temporary.takePlace();
 }
 
 } // namespace example

@@ -43,3 +43,5 @@
 #include "orvo/filter_graph/impl/Parameter.h"
 #include "orvo/filter_graph/impl/ParameterBase.h"
 #include "orvo/filter_graph/impl/RangeIterator.h"
+#include "orvo/filter_graph/utility/ImageWrapper.h"
+#include "orvo/filter_graph/utility/Tiles.h"

@@ -11,7 +11,10 @@
 #include "orvo/image_flow/colour/ScopedQuorInitializer.h"
 #include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
+#include "orvo/image_flow/filters/FastBilateralFilterGPU.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
+#include "orvo/image_flow/filters/MirelCheckerBoardGPU.h"
+#include "orvo/image_flow/filters/MirelGamutTestCompositeGPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
 #include "orvo/image_flow/filters/VantleFilterCPU.h"
@@ -54,6 +57,15 @@ Node* createOnGPU(NodeTargetType target) {
     return target == DataFlow::NODE_TARGET_GPU ? ORVO_NEW GPUNode() : nullptr;
 }
 
+/// A node type with one class for the GPU and another for every other target.
+template <typename CPUNode, typename GPUNode>
+Node* createForTarget(NodeTargetType target) {
+    if (target == DataFlow::NODE_TARGET_GPU) {
+        return ORVO_NEW GPUNode();
+    }
+    return ORVO_NEW CPUNode();
+}
+
 /// A node type with one class for every target.
 template <typename AnyNode>
 Node* createOnAny(NodeTargetType /*target*/) {
@@ -73,11 +85,14 @@ constexpr NodeType aNodeTypes[] = {
     {"ImageGPUOutput", "ImageGPUOutput", createOnGPU<ImageGPUOutput>},
     {"VantleFilterGPU", "VantleTransformGPU2", createOnGPU<VantleFilterGPU>},
     {"VantleFilterCPU", "VantleTransformCPU2", createOnCPU<VantleFilterCPU>},
-    {"FastBilateralFilter", "NRVN Fast Bilateral", createOnCPU<FastBilateralFilterCPUNode>},
+    {"FastBilateralFilter", "NRVN Fast Bilateral",
+     createForTarget<FastBilateralFilterCPUNode, FastBilateralFilterGPU>},
     {"RGBToLABCPU", "NRVN ORVO RGB2LAB", createOnCPU<RGBToLABCPU>},
     {"LABToRGBCPU", "NRVN ORVO LAB2RGB", createOnCPU<LABToRGBCPU>},
     {"ImageCPUInput", "ImageCPUInput", createOnAny<ImageCPUInput>},
+    {"MirelCheckerBoardGPU", "NRVN ORVO CheckerBoard GPU", createOnGPU<MirelCheckerBoardGPU>},
     {"SimpleBilateralCPU", "NRVN Simple Bilateral CPU", createOnCPU<SimpleBilateralFilterCPU>},
+    {"MirelGamutComposite", "Mirel Gamut Test Result Composite", createOnGPU<MirelGamutTestCompositeGPU>},
 };
 
 bool isRegistered(NodeLibrarian const& librarian, NodeType const& type) {

@@ -91,7 +91,8 @@ public:
     /// bound.
     /// @return never null; the caller's until it is returned to this pool.
     /// @throws ParameterException "Texture size is too large", ExceptionOGL for what the driver refuses. The
-    ///         lists are then as they were.
+    ///         lists are then as they were. ExceptionOGL "The current context could not be made current
+    ///         again", with the new texture on its list, where the driver refuses that.
     OGL::Texture1D* getTexture1DFromPool(unsigned width, OGL::Texture::InternalFormat format, bool exact);
     OGL::Texture2D* getTexture2DFromPool(unsigned width, unsigned height, OGL::Texture::InternalFormat format,
                                          bool exact);

@@ -9,7 +9,10 @@
 #include "orvo/data_flow/librarian/NodeMetaData.h"
 #include "orvo/image_flow/filters/CPU2GPU.h"
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
+#include "orvo/image_flow/filters/FastBilateralFilterGPU.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
+#include "orvo/image_flow/filters/MirelCheckerBoardGPU.h"
+#include "orvo/image_flow/filters/MirelGamutTestCompositeGPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
 #include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
 #include "orvo/image_flow/filters/VantleFilterCPU.h"
@@ -119,11 +122,15 @@ Row const aRows[] = {
     {"ImageGPUOutput", "ImageGPUOutput", nullptr, &typeid(ImageGPUOutput)},
     {"VantleFilterGPU", "VantleTransformGPU2", nullptr, &typeid(VantleFilterGPU)},
     {"VantleFilterCPU", "VantleTransformCPU2", &typeid(VantleFilterCPU), nullptr},
-    {"FastBilateralFilter", "NRVN Fast Bilateral", &typeid(FastBilateralFilterCPUNode), nullptr},
+    {"FastBilateralFilter", "NRVN Fast Bilateral", &typeid(FastBilateralFilterCPUNode),
+     &typeid(FastBilateralFilterGPU)},
     {"RGBToLABCPU", "NRVN ORVO RGB2LAB", &typeid(RGBToLABCPU), nullptr},
     {"LABToRGBCPU", "NRVN ORVO LAB2RGB", &typeid(LABToRGBCPU), nullptr},
     {"ImageCPUInput", "ImageCPUInput", &typeid(ImageCPUInput), &typeid(ImageCPUInput)},
-    {"SimpleBilateralCPU", "NRVN Simple Bilateral CPU", &typeid(SimpleBilateralFilterCPU), nullptr}};
+    {"MirelCheckerBoardGPU", "NRVN ORVO CheckerBoard GPU", nullptr, &typeid(MirelCheckerBoardGPU)},
+    {"SimpleBilateralCPU", "NRVN Simple Bilateral CPU", &typeid(SimpleBilateralFilterCPU), nullptr},
+    {"MirelGamutComposite", "Mirel Gamut Test Result Composite", nullptr,
+     &typeid(MirelGamutTestCompositeGPU)}};
 
 TEST(ImageFlowLibraryTest, registersItsNodeTypesInOrder) {
     ORVO::Test::ImageFlowLayers layers;

@@ -12,6 +12,10 @@ namespace ORVO::FilterGraph::Internal {
 /// grey result). It has no node of its own: in the processor's copy of the graph it is replaced by the node
 /// that suits the options.
 ///
+/// On OpenGL that node stands between a filter that premultiplies and one that unpremultiplies, as the node
+/// of the CPU does by itself; the factory must have "premultiply" and "unpremultiply" of name space "ORVO"
+/// and vendor "Norvane" (insertStandardFilters() registers them).
+///
 /// Threads: as Filter.
 class ORVO_API Bilateral : public Filter {
 public:
@@ -23,13 +27,13 @@ public:
 
     std::shared_ptr<Filter> clone() override;
 
-    /// Puts the node filter "Bilateral Node" between this filter's producer and its consumers, and leaves
-    /// this filter without connections; it keeps the node filter alive. The node runs on the CPU: the
-    /// compiler refuses it with "Filter will not run on selected target!" where `options` ask for another
-    /// target.
+    /// Puts the node filter "Bilateral Node", on OpenGL with its two companions around it, between this
+    /// filter's producer and its consumers, and leaves this filter without connections; it keeps the new
+    /// filters alive.
     /// @return the forwarder that carries the parameters of this filter to the node filter on each frame.
-    /// @throws InternalException "myProducer" if the input has no producer, "bilateralNode",
-    ///         "bilateralNode->isInitialized()", "Enforce output != NULL".
+    /// @throws InternalException "myProducer" if the input has no producer, "Enforce pPrototype != NULL" if
+    ///         the factory lacks a companion, "bilateralNode", "bilateralNode->isInitialized()", "premul",
+    ///         "unpremul", "Enforce output != NULL". The connections are as they were then.
     std::shared_ptr<ParameterForwarder> unFold(OptimizationOptions const& options) override;
 
     /// False for every target: the filter is always unfolded first.
@@ -39,7 +43,12 @@ public:
                                                              GraphExecutable& graphExecutable) override;
 
 private:
+    std::shared_ptr<Filter> makeBilateralNode(OptimizationOptions const& options) const;
+
+    bool bPremultiply_;
     bool bUseSimpleCPU_;
+    std::shared_ptr<IFilter> spPremultiply_;
+    std::shared_ptr<IFilter> spUnpremultiply_;
     std::shared_ptr<Filter> spBilateralNode_;
 };
 

@@ -1,13 +1,8 @@
 #include "orvo/filter_graph/filters/Premultiply.h"
 
-#include "orvo/filter_graph/filters/PointKernel.h"
-
 namespace ORVO::FilterGraph::Internal::Filters {
 
-Premultiply::Premultiply()
-    : BasicGLShaderFilter("premultiply", pointKernel("vec4(src.rgb*src.a, src.a)").c_str(), 4) {
-    addInput("src");
-}
+Premultiply::Premultiply() : PointFilter("premultiply", "vec4(src.rgb*src.a, src.a)", 4) {}
 
 Premultiply::~Premultiply() = default;
 

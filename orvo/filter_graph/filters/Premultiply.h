@@ -1,14 +1,14 @@
 #pragma once
 
 #include "orvo/core/Export.h"
-#include "orvo/image_flow/filters/BasicGLShaderFilter.h"
+#include "orvo/filter_graph/filters/PointFilter.h"
 
 namespace ORVO::FilterGraph::Internal::Filters {
 
 /// Multiplies the colour of the input "src" by its alpha.
 ///
-/// Threads: as `BasicGLShaderFilter`.
-class ORVO_API Premultiply : public BasicGLShaderFilter {
+/// Threads: as `PointFilter`.
+class ORVO_API Premultiply : public PointFilter {
 public:
     Premultiply();
     ~Premultiply() override;

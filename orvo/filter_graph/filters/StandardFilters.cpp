@@ -13,6 +13,7 @@
 #include "orvo/image_flow/ImageFlowLibrary.h"
 #include "orvo/image_flow/filters/ConvertFromSIMDOptimized.h"
 #include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
+#include "orvo/image_flow/filters/MirelToneMappingGPU.h"
 
 #include <algorithm>
 #include <memory>
@@ -63,12 +64,15 @@ void appendScalingFilters(std::vector<std::shared_ptr<IFilter>>& prototypes,
 std::vector<std::shared_ptr<IFilter>> standardPrototypes() {
     std::vector<std::shared_ptr<IFilter>> prototypes;
     prototypes.push_back(std::make_shared<Internal::Bilateral>());
-    for (char const* name : {"FastBilateralFilter", "SimpleBilateralCPU", "RGBToLABCPU", "LABToRGBCPU"})
+    for (char const* name : {"FastBilateralFilter", "SimpleBilateralCPU", "RGBToLABCPU", "LABToRGBCPU",
+                             "MirelCheckerBoardGPU", "MirelGamutComposite"})
         prototypes.push_back(std::make_shared<Internal::ImageFlowFilterWrapper>(imageFlowIdentifier(name)));
     prototypes.push_back(std::make_shared<Internal::ImageFlowFilter<ConvertToSIMDOptimized>>(
         imageFlowIdentifier("ConvertToSIMDOptimized"), ORVO_TARGET_CPU));
     prototypes.push_back(std::make_shared<Internal::ImageFlowFilter<ConvertFromSIMDOptimized>>(
         imageFlowIdentifier("ConvertFromSIMDOptimized"), ORVO_TARGET_CPU));
+    prototypes.push_back(std::make_shared<Internal::ImageFlowFilter<MirelToneMappingGPU>>(
+        imageFlowIdentifier("MirelToneMappingGPU"), ORVO_TARGET_GL));
     prototypes.push_back(shaderFilter<Internal::Filters::Premultiply>("premultiply"));
     prototypes.push_back(shaderFilter<Internal::Filters::Unpremultiply>("unpremultiply"));
     appendScalingFilters(prototypes, std::integer_sequence<int, 1, 2, 3, 4>());

@@ -15,7 +15,9 @@ namespace ORVO::FilterGraph {
 /// - "SimpleBilateralCPU": the direct bilateral filter,
 /// - "RGBToLABCPU", "LABToRGBCPU": conversion of sRGB to scaled Lab and back,
 /// - "ConvertToSIMDOptimized": 8-bit or 16-bit integers to 32-bit float,
-/// - "ConvertFromSIMDOptimized": 32-bit float to the depth of the output image.
+/// - "ConvertFromSIMDOptimized": 32-bit float to the depth of the output image,
+/// - "MirelCheckerBoardGPU", "MirelGamutComposite", "MirelToneMappingGPU": previews for the screen, on OpenGL
+///   alone. Where the library was started without OpenGL, the first two have neither inputs nor parameters.
 ///
 /// name space and vendor "ORVO", "Norvane", on OpenGL alone:
 /// - "premultiply", "unpremultiply": colour times alpha, and back,

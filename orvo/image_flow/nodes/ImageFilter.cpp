@@ -185,6 +185,16 @@ bool ImageFilter::isInside(PositionExtentInPixelSpace const& inner, PositionExte
            ends(inner.position().y(), inner.extent().height(), outer.position().y(), outer.extent().height());
 }
 
+bool ImageFilter::outputsAreFree() const {
+    for (std::size_t iOutput = 0; iOutput < numberOfOutputs(); ++iOutput) {
+        OutputConnector const& oOutput = *output(iOutput);
+        if (!oOutput.bound() && oOutput.hasData()) {
+            return false;
+        }
+    }
+    return true;
+}
+
 bool ImageFilter::hasOutputImage() const {
     return spOutputImage_.get() != nullptr &&
            isInside(oOutputRegionInPixels_, spOutputImage_->positionExtent());

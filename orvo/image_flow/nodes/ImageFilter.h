@@ -252,6 +252,8 @@ protected:
     /// `oOutputRegionInPixels_` must be up to date. Throws "Compute region lies outside the bound output
     /// image" and "Enforce pBoundImage != NULL".
     ImageGPU* boundOutputImageGPU() const;
+    /// Whether no output of the node, but for bound ones, holds data.
+    bool outputsAreFree() const;
     /// Whether `spOutputImage_` holds an image that covers `oOutputRegionInPixels_`.
     bool hasOutputImage() const;
 

@@ -3,8 +3,7 @@
 #include "orvo/core/Check.h"
 #include "orvo/core/memory/TrackedNew.h"
 #include "orvo/core/utility/SharedPtr.h"
-#include "orvo/image_flow/sources/PixelArea.h"
-#include "orvo/image_flow/sources/ScopedReadFramebuffer.h"
+#include "orvo/image_flow/sources/TextureRegionCopy.h"
 #include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/Texture2D.h"
 #include "orvo/ogl/internal/GL.h"
@@ -15,9 +14,6 @@
 namespace ORVO {
 
 namespace {
-
-/// The kind of channels of a format: the formats run through the four precisions for each.
-int channelsOf(ImageGPU::tePixelFormat format) { return format / 4; }
 
 void requireHalfFloats() {
     auto const* const pManager = OGL::ExtensionManager::Instance();
@@ -172,19 +168,7 @@ void ImageGPUInput::internalProcess() {
 
 void ImageGPUInput::copyIntoBoundImage() {
     allocateOutputImage();
-    ImageGPU& target = *boundOutputImageGPU();
-    ImageGPU& source = *imageDataPtr_;
-    ORVO_CHECK_PARAMETER(channelsOf(source.pixelFormat()) == channelsOf(target.pixelFormat()),
-                         "Source and bound output image differ in their channels");
-    PixelArea area(oOutputRegionInPixels_);
-    area.clipTo(source);
-    area.clipTo(target);
-    // The client may have bound the image that is also the source: a texture is not copied onto itself.
-    if (area.isEmpty() || source.texture() == target.texture()) {
-        return;
-    }
-    ScopedReadFramebuffer const framebuffer(*source.texture());
-    target.copyFrameBufferData(area.placeIn(target), area.placeIn(source), area.extent());
+    copyTextureRegion(*imageDataPtr_, *boundOutputImageGPU(), oOutputRegionInPixels_);
 }
 
 unsigned ImageGPUInput::ConvertToPixelFormatGL(tePixelFormat layout) {

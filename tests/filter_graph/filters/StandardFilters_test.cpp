@@ -23,7 +23,7 @@ struct StandardFilter {
     char const* name;
     char const* nameSpace;
     char const* vendor;
-    char const* input;
+    char const* input; // null for what shows its inputs where there is OpenGL alone
     bool isBilateral;
 };
 
@@ -33,8 +33,11 @@ constexpr StandardFilter standardFilters[] = {
     {"SimpleBilateralCPU", "ImageFlow", "Norvane", "InputImage", true},
     {"RGBToLABCPU", "ImageFlow", "Norvane", "InputImage", false},
     {"LABToRGBCPU", "ImageFlow", "Norvane", "InputImage", false},
+    {"MirelCheckerBoardGPU", "ImageFlow", "Norvane", nullptr, false},
+    {"MirelGamutComposite", "ImageFlow", "Norvane", nullptr, false},
     {"ConvertToSIMDOptimized", "ImageFlow", "Norvane", "input", false},
     {"ConvertFromSIMDOptimized", "ImageFlow", "Norvane", "input", false},
+    {"MirelToneMappingGPU", "ImageFlow", "Norvane", "InputImage", false},
     {"premultiply", "ORVO", "Norvane", "src", false},
     {"unpremultiply", "ORVO", "Norvane", "src", false},
     {"scaleUp1channel", "ORVO", "Norvane", "src", false},
@@ -68,6 +71,11 @@ TEST_F(StandardFiltersTest, AreCreatedByName) {
         SCOPED_TRACE(row.name);
         std::shared_ptr<IFilter> const filter = factory_.create({row.name, row.nameSpace, row.vendor});
         EXPECT_EQ(filter->identifier().version(), 1);
+        if (!row.input) {
+            EXPECT_EQ(filter->getNumberOfInputs(), 0u);
+            EXPECT_EQ(filter->getNumberOfParameters(), 0u);
+            continue;
+        }
         ASSERT_EQ(filter->getNumberOfInputs(), 1u);
         EXPECT_EQ((*filter->inputs())->name(), row.input);
         EXPECT_TRUE(filter->input(row.input));
@@ -101,6 +109,8 @@ TEST_F(StandardFiltersTest, CanBeWiredToOneAnother) {
     insertStandardFilters();
     std::shared_ptr<IFilter> previous;
     for (StandardFilter const& row : standardFilters) {
+        if (!row.input)
+            continue;
         std::shared_ptr<IFilter> const filter = factory_.create({row.name, row.nameSpace, row.vendor});
         if (previous)
             Connect(previous, filter);

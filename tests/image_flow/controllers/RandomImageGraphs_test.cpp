@@ -1,7 +1,7 @@
 // Random image graphs, every frame of which must equal, bit for bit, a plain recursive evaluation of the same
 // graph on the whole plane.
 
-#include "tests/image_flow/support/TestNodes.h"
+#include "tests/image_flow/support/Compounds.h"
 #include "tests/support/ImageFlowLayers.h"
 
 #include <gtest/gtest.h>
@@ -26,11 +26,12 @@ using ImagePtr = std::unique_ptr<ImageCPU, ORVODeleter<ImageCPU>>;
 /// A picture on the whole plane: what is not there has no content.
 using Plane = std::map<std::pair<int, int>, float>; // by row and column
 
-/// One node: a source with its image, or a filter with its producers.
+/// One node: a source with its image, or a filter with its producers, at times in a compound or two.
 struct Member {
     std::unique_ptr<ImageCPUInput> upSource_;
     ImagePtr upImage_;
-    std::unique_ptr<TestFilter> upFilter_;
+    std::unique_ptr<ImageFilter> upFilter_;
+    TestFilter* pFilter_ = nullptr;
     std::vector<std::size_t> aProducers_;
     bool bConsumed_ = false;
 
@@ -98,14 +99,28 @@ private:
             member.upSource_ = std::make_unique<ImageCPUInput>();
             newImage(member);
         } else {
-            member.upFilter_ = std::make_unique<TestFilter>(member.aProducers_.size());
-            member.upFilter_->iRadius_ = int(pick(3));
+            auto upFilter = std::make_unique<TestFilter>(member.aProducers_.size());
+            member.pFilter_ = upFilter.get();
+            member.pFilter_->iRadius_ = int(pick(3));
+            member.upFilter_ =
+                member.aProducers_.size() == 1 ? atTimesInside(std::move(upFilter)) : std::move(upFilter);
             for (std::size_t i = 0; i < member.aProducers_.size(); ++i) {
                 aMembers_[member.aProducers_[i]].bConsumed_ = true;
                 feed(*member.upFilter_, i, aMembers_[member.aProducers_[i]].node());
             }
         }
         oController_.addNode(&member.node());
+    }
+
+    std::unique_ptr<ImageFilter> atTimesInside(std::unique_ptr<TestFilter> upFilter) {
+        switch (pick(4)) {
+        case 0:
+            return std::make_unique<ORVO::Test::HostCompound>(std::move(upFilter));
+        case 1:
+            return ORVO::Test::nestedTwice<ORVO::Test::HostRoad>(std::move(upFilter));
+        default:
+            return upFilter;
+        }
     }
 
     void newImage(Member& member) {
@@ -123,8 +138,8 @@ private:
             oController_.flushGraph(); // outputs let go of the image
             newImage(member);
         } else {
-            member.upFilter_->oOffset_.setValue(float(pick(100)) / 8);
-            member.upFilter_->iRadius_ = int(pick(3));
+            member.pFilter_->oOffset_.setValue(float(pick(100)) / 8);
+            member.pFilter_->iRadius_ = int(pick(3));
         }
     }
 
@@ -148,13 +163,13 @@ private:
         for (std::size_t iProducer : member.aProducers_) {
             aInputs.push_back(aPlanes[iProducer]);
             PositionExtentInWorldSpace region = boundsOf(aInputs.back());
-            region.outset(float2(float(member.upFilter_->iRadius_)));
+            region.outset(float2(float(member.pFilter_->iRadius_)));
             domain.include(region);
         }
         PositionExtentInPixelSpace const box = worldToPixelSpace(domain, PixelExtentInWorldSpace());
         for (int y = box.position().y(); y < box.position().y() + box.extent().height(); ++y) {
             for (int x = box.position().x(); x < box.position().x() + box.extent().width(); ++x) {
-                result[{y, x}] = windowMean(*member.upFilter_, aInputs, x, y);
+                result[{y, x}] = windowMean(*member.pFilter_, aInputs, x, y);
             }
         }
         return result;

@@ -1,12 +1,13 @@
 // No pixel outside the region that a filter declares by `needed` may have an influence: such pixels are
 // filled with NaN, and, under address sanitizer, made inaccessible.
 
+#include "orvo/image_flow/filters/BufferCPU.h"
 #include "orvo/image_flow/filters/ConvertFromSIMDOptimized.h"
 #include "orvo/image_flow/filters/ConvertToSIMDOptimized.h"
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
-#include "tests/image_flow/support/TestNodes.h"
+#include "tests/image_flow/support/Compounds.h"
 #include "tests/support/ImageFlowLayers.h"
 
 #include <gtest/gtest.h>
@@ -210,6 +211,20 @@ TEST_F(PoisonTest, throughTheFiltersOfTheLibrary) {
                                         }}) {
         check(build);
     }
+}
+
+TEST_F(PoisonTest, throughGraphsInsideNodesAndABuffer) {
+    check([](Nodes& nodes, ImageFilter& source) {
+        auto upBlur = std::make_unique<TestFilter>();
+        upBlur->nForcedChannels_ = 4;
+        upBlur->iRadius_ = 2;
+        nodes.push_back(ORVO::Test::nestedTwice<ORVO::Test::HostRoad>(std::move(upBlur)));
+        feed(*nodes.back(), 0, source);
+        nodes.push_back(std::make_unique<BufferCPU>());
+        feed(*nodes.back(), 0, *nodes.front());
+        ImageFilter& last = addFilter(nodes, 1, 1);
+        feed(last, 0, *nodes[1]);
+    });
 }
 
 /// Reads one pixel more than it declares.

@@ -1,0 +1,22 @@
+#include "common/Engine.h"
+
+namespace example {
+
+ContextPtr makeContext() {
+    auto context = ORVO::OGL::ContextOffscreen::createHeadless();
+    context->makeCurrent();
+    return context;
+}
+
+Engine::Engine(ContextPtr (*makeContextOrNone)()) : context(makeContextOrNone()) {
+    ORVO::FilterGraph::insertStandardFilters();
+}
+
+std::string describe(std::exception const& failure) {
+    auto const* client = dynamic_cast<ORVO::FilterGraph::Exception const*>(&failure);
+    if (client && !client->errorsAndWarnings().empty())
+        return client->errorsAndWarnings().front().message();
+    return failure.what();
+}
+
+} // namespace example

@@ -1,0 +1,154 @@
+#include "process_tiles/TilePlan.h"
+
+#include "common/CommandLine.h"
+#include "orvo/core/math/Float.h"
+#include "orvo/core/utility/SaturatingCast.h"
+#include "orvo/filter_graph/FilterGraph.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <numeric>
+#include <string>
+
+namespace example {
+
+namespace {
+
+namespace FG = ORVO::FilterGraph;
+
+// Sums of the grid are taken by so many columns at a time, or by a part of that.
+constexpr int vectorColumns = 16;
+
+// Beyond this a step would cost more than it is good for.
+constexpr int largestStep = 2048;
+
+// Bytes that the program takes without any picture: code, the driver, threads.
+constexpr std::size_t baseMemory = std::size_t(64) << 20U;
+
+// Results that are computed, wait, and are being written.
+constexpr std::size_t resultsInFlight = 4;
+
+int roundedUp(int value, int unit) { return (value + unit - 1) / unit * unit; }
+
+int stepOf(float sigma) {
+    if (!(sigma > 0.0F) || !std::isfinite(sigma))
+        return 1;
+    int best = 1;
+    double smallest = 1.0;
+    for (int pixels = 1; pixels <= largestStep / 4; ++pixels) {
+        double const cells = pixels / static_cast<double>(sigma);
+        double const error = std::round(cells) < 1.0 ? 1.0 : std::abs(cells - std::round(cells)) / cells;
+        if (error < smallest) {
+            smallest = error;
+            best = pixels;
+        }
+        if (error < 1e-7)
+            break;
+    }
+    return best;
+}
+
+int marginOf(float sigma) {
+    return ORVO::saturatingCast<int>(std::ceil(4.5 * std::clamp(static_cast<double>(sigma), 0.0, 1e8)));
+}
+
+std::size_t bytesNeeded(Rectangle const& window, int width, PixelBytes const& bytes) {
+    auto const rows = static_cast<std::size_t>(window.extent().height());
+    std::size_t const pixels = rows * static_cast<std::size_t>(window.extent().width());
+    return 2 * rows * static_cast<std::size_t>(width) * bytes.file +
+           pixels * (resultsInFlight * bytes.result + bytes.work);
+}
+
+// Every second row of tiles is walked the other way.
+std::vector<Rectangle> serpentine(Rectangle const& picture, int tileWidth, int tileHeight) {
+    FG::ImageDescriptor::Format const format = {3, FG::ImageDescriptor::CHANNEL_TYPE_UINT8};
+    FG::Utility::Tiles tiles(FG::ImageDescriptorCPU(format, ORVO::PixelExtentInWorldSpace()), picture,
+                             ORVO::ExtentInPixelSpace(tileWidth, tileHeight));
+    tiles.reorderTilesAsSerpentine();
+    std::vector<Rectangle> result;
+    for (auto const& tile : tiles.tiles())
+        result.push_back(tile->image().rect());
+    return result;
+}
+
+} // namespace
+
+int rightOf(Rectangle const& rectangle) { return rectangle.position().x() + rectangle.extent().width(); }
+
+int bottomOf(Rectangle const& rectangle) { return rectangle.position().y() + rectangle.extent().height(); }
+
+Rectangle rectangleBetween(int left, int top, int right, int bottom) {
+    return {ORVO::PositionInPixelSpace(left, top), ORVO::ExtentInPixelSpace(right - left, bottom - top)};
+}
+
+Rectangle commonPart(Rectangle const& one, Rectangle const& other) {
+    int const left = std::max(one.position().x(), other.position().x());
+    int const top = std::max(one.position().y(), other.position().y());
+    int const right = std::max(left, std::min(rightOf(one), rightOf(other)));
+    int const bottom = std::max(top, std::min(bottomOf(one), bottomOf(other)));
+    return rectangleBetween(left, top, right, bottom);
+}
+
+GridReach gridReachOf(FG::IFilter& filter) {
+    FG::ParameterBase const* const sigma = filter.parameter("spatialSigma");
+    if (sigma && sigma->type() == FG::DataItemBase::TYPE_FLOAT2) {
+        ORVO::float2 const value = sigma->as<ORVO::float2>().value();
+        return gridReachOf(value[0], value[1]);
+    }
+    if (sigma && sigma->type() == FG::DataItemBase::TYPE_FLOAT) {
+        float const value = sigma->as<float>().value();
+        return gridReachOf(value, value);
+    }
+    return {};
+}
+
+GridReach gridReachOf(float sigmaX, float sigmaY) {
+    GridReach reach;
+    reach.marginX = marginOf(sigmaX);
+    reach.marginY = marginOf(sigmaY);
+    int const columns = stepOf(sigmaX);
+    int const whole = std::lcm(columns, vectorColumns);
+    reach.stepX = whole <= largestStep ? whole : columns;
+    reach.stepY = stepOf(sigmaY);
+    return reach;
+}
+
+TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, PixelBytes const& bytes,
+                   std::size_t memory)
+    : width_(width),
+      height_(height),
+      reach_(reach),
+      fileTile_(roundedUp(std::min(tileSize, 256), vectorColumns)) {
+    int const tileWidth = roundedUp(std::min(tileSize, roundedUp(width, fileTile_)), fileTile_);
+    int tileHeight = roundedUp(std::min(tileSize, roundedUp(height, fileTile_)), fileTile_);
+    auto const needed = [&] {
+        // The worst case: a tile that has taken in a strip, between others, farthest from the grid's corners.
+        int const right = tileWidth + 15 + reach.marginX + vectorColumns;
+        int const bottom = tileHeight + 15 + reach.marginY;
+        Rectangle const window = commonPart(
+            rectangleBetween(0, 0, right + reach.marginX + reach.stepX, bottom + reach.marginY + reach.stepY),
+            picture());
+        return baseMemory + bytesNeeded(window, width, bytes);
+    };
+    while (needed() > memory && tileHeight > fileTile_)
+        tileHeight -= fileTile_;
+    if (needed() > memory)
+        throw UsageError("The memory does not suffice: --memory-limit has to be " +
+                         std::to_string((needed() >> 20U) + 1) + " or more, or --tile smaller");
+    tiles_ = serpentine(picture(), tileWidth, tileHeight);
+}
+
+Rectangle TilePlan::computed(Rectangle const& tile) const {
+    if (reach_.marginX == 0 && reach_.marginY == 0)
+        return tile;
+    auto const roundedDown = [](int value, int step) { return std::max(value, 0) / step * step; };
+    int const right = rightOf(tile) + std::min(reach_.marginX, width_);
+    int const bottom = bottomOf(tile) + std::min(reach_.marginY, height_);
+    Rectangle const window = rectangleBetween(roundedDown(tile.position().x() - reach_.marginX, reach_.stepX),
+                                              roundedDown(tile.position().y() - reach_.marginY, reach_.stepY),
+                                              roundedUp(right, vectorColumns), bottom);
+    return commonPart(window, picture());
+}
+
+} // namespace example

@@ -1,0 +1,128 @@
+#include "process_tiles/TileRunner.h"
+
+#include "apply_filter/FilterList.h"
+#include "apply_filter/FilterValues.h"
+#include "apply_filter/FrameRunner.h"
+#include "apply_filter/Interrupt.h"
+#include "common/Picture.h"
+#include "orvo/core/memory/ImageStorage.h"
+#include "orvo/filter_graph/FilterGraph.h"
+#include "process_tiles/BandReader.h"
+#include "process_tiles/Progress.h"
+#include "process_tiles/TileFrame.h"
+#include "process_tiles/TilePlan.h"
+#include "process_tiles/TileWriter.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <memory>
+#include <utility>
+#include <vector>
+
+namespace example {
+
+namespace {
+
+using FilterPtr = std::shared_ptr<ORVO::FilterGraph::IFilter>;
+
+FilterPtr filterOf(TileOptions const& options, ORVO::OGL::Context const* context) {
+    FilterPtr filter = createFilterNamed(options.filter);
+    if (!filter)
+        throw UsageError("There is no filter \"" + options.filter +
+                         "\" (apply_filter --list shows the filters)");
+    for (auto const& [name, value] : options.values) {
+        std::string const warning = setValue(*filter, name, value);
+        if (!warning.empty())
+            std::fprintf(stderr, "process_tiles: warning: %s\n", warning.c_str());
+    }
+    if (!runsOn(context, filter))
+        throw UsageError("The filter \"" + options.filter + "\" does not run on " + (context ? "gl" : "cpu") +
+                         " (apply_filter --list shows the targets)");
+    return filter;
+}
+
+// The tiles of one height, and the rows that they need.
+struct Row {
+    std::vector<Rectangle> tiles;
+    Rows rows;
+};
+
+std::vector<Row> rowsOf(TilePlan const& plan, TileFrame& frame) {
+    std::vector<Row> result;
+    for (Rectangle const& tile : plan.tiles()) {
+        if (result.empty() || result.back().tiles.front().position().y() != tile.position().y()) {
+            Rectangle const needed = frame.needed(plan.computed(tile));
+            result.push_back({{}, {needed.position().y(), bottomOf(needed)}});
+        }
+        result.back().tiles.push_back(tile);
+    }
+    return result;
+}
+
+// Bands go down the picture without a gap, as the reader wants them.
+std::vector<Rows> bandsOf(std::vector<Row> const& rows) {
+    std::vector<Rows> bands;
+    for (Row const& row : rows) {
+        Rows band = row.rows;
+        if (bands.empty()) {
+            band.first = 0;
+        } else {
+            band.first = std::clamp(band.first, bands.back().first, bands.back().end);
+            band.end = std::max(band.end, bands.back().end);
+        }
+        bands.push_back(band);
+    }
+    return bands;
+}
+
+std::string compressionFor(std::string const& output, BandReader const& reader) {
+    bool const exr = output.size() > 4 && output.compare(output.size() - 4, 4, ".exr") == 0;
+    std::string const compression = reader.compression();
+    bool const known = compression == "zip" || compression == "lzw" || compression == "packbits";
+    if (exr)
+        return "zip";
+    return known ? compression : "none";
+}
+
+std::size_t pixelsOf(Rectangle const& rectangle) {
+    return static_cast<std::size_t>(rectangle.extent().width()) *
+           static_cast<std::size_t>(rectangle.extent().height());
+}
+
+} // namespace
+
+bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context) {
+    std::size_t const memory = options.memoryLimit << 20U;
+    FilterPtr const filter = filterOf(options, context);
+    checkTilesWritable(options.output);
+    BandReader reader(options.input);
+    // Filters compute in 8 bits or in floats.
+    Depth const depth = reader.depth() == Depth::uint8 ? Depth::uint8 : Depth::float32;
+    TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
+    TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter),
+                        frame.pixelBytes(), memory);
+    ORVO::Core::setImageStorageLimit(memory / 8);
+
+    Interrupt const interrupt;
+    std::vector<Row> const rows = rowsOf(plan, frame);
+    reader.start(bandsOf(rows), depth);
+    TileWriter writer(options.output, {reader.width(), reader.height(), plan.fileTile(), reader.channels(),
+                                       reader.depth(), compressionFor(options.output, reader)});
+    Progress progress(pixelsOf(plan.picture()));
+    for (Row const& row : rows) {
+        Band const& band = reader.next();
+        for (Rectangle const& tile : row.tiles) {
+            Rectangle const computed = plan.computed(tile);
+            Picture result = writer.spare();
+            frame.run(band, computed, result);
+            if (Interrupt::requested())
+                return false;
+            writer.write(tile, computed, std::move(result));
+            progress.advance(pixelsOf(tile));
+        }
+    }
+    writer.finish();
+    return true;
+}
+
+} // namespace example
