@@ -13,12 +13,15 @@
 #include "orvo/image_runtime/images/ImageGPU.h"
 #include "orvo/ogl/Context.h"
 #include "orvo/ogl/ExceptionOGL.h"
+#include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/Framebuffer.h"
+#include "orvo/ogl/Program.h"
 #include "orvo/ogl/ScopedContextWrapper.h"
 #include "orvo/ogl/TextureState.h"
 #include "orvo/ogl/TextureUnit.h"
 #include "orvo/ogl/internal/GL.h"
 
+#include <array>
 #include <cstddef>
 #include <deque>
 #include <memory>
@@ -115,36 +118,65 @@ void sweepErrors() {
     }
 }
 
-/// What the preparation of a frame changes in its context, which is current, put back at the end of a scope.
+/// What a frame changes in its context, which is current, put back at the end of a scope: texture units,
+/// matrices, viewport, program and framebuffers. A host may have named a context in which it draws itself.
 class FrameState {
 public:
     explicit FrameState(OGL::Context const& context)
-        : context_(context), nUnit_(OGL::TextureState::activeTextureUnit()) {
-        OGL::TextureState::setActiveTextureUnit(0);
-        bEnabled2D_ = glIsEnabled(GL_TEXTURE_2D) == GL_TRUE;
-        OGL::TextureState::setActiveTextureUnit(nUnit_);
+        : context_(context),
+          bPrograms_(OGL::Program::isSupported()),
+          bSeparate_(OGL::ExtensionManager::Instance()->isSupported(OGL::EXTENSION_ARB_FRAMEBUFFER_OBJECT)) {
+        glPushAttrib(nAttributes_);
+        glGetDoublev(GL_PROJECTION_MATRIX, aProjection_.data());
+        glGetDoublev(GL_MODELVIEW_MATRIX, aModelview_.data());
+        glGetIntegerv(GL_FRAMEBUFFER_BINDING, &nDraw_);
+        if (bSeparate_) {
+            glGetIntegerv(GL_READ_FRAMEBUFFER_BINDING, &nRead_);
+        }
+        if (bPrograms_) {
+            glGetIntegerv(GL_CURRENT_PROGRAM, &nProgram_);
+        }
     }
     ~FrameState() {
         try {
             // A failed frame may have left another one current.
             context_.makeCurrent();
-            OGL::TextureUnit const& unit = OGL::TextureUnit::Unit(0);
-            if (bEnabled2D_) {
-                unit.enable2D();
-            } else {
-                unit.disable2D();
-            }
-            OGL::TextureState::setActiveTextureUnit(nUnit_);
         } catch (...) { // The context went away during the frame, and its state with it.
+            return;
         }
+        if (bPrograms_) {
+            glUseProgram(static_cast<GLuint>(nProgram_));
+        }
+        bindFramebuffer(bSeparate_ ? GL_DRAW_FRAMEBUFFER : GL_FRAMEBUFFER, nDraw_);
+        if (bSeparate_) {
+            bindFramebuffer(GL_READ_FRAMEBUFFER, nRead_);
+        }
+        glMatrixMode(GL_PROJECTION);
+        glLoadMatrixd(aProjection_.data());
+        glMatrixMode(GL_MODELVIEW);
+        glLoadMatrixd(aModelview_.data());
+        glPopAttrib();
     }
     FrameState(FrameState const&) = delete;
     FrameState& operator=(FrameState const&) = delete;
 
 private:
+    /// Bindings, enables and active unit; the matrix mode; the viewport.
+    static constexpr GLbitfield nAttributes_ =
+        GL_TEXTURE_BIT | GL_ENABLE_BIT | GL_TRANSFORM_BIT | GL_VIEWPORT_BIT;
+
+    static void bindFramebuffer(GLenum target, GLint nName) noexcept {
+        OGL::ExtensionManager::Instance()->table()->glBindFramebuffer(target, static_cast<GLuint>(nName));
+    }
+
     OGL::Context const& context_;
-    unsigned nUnit_;
-    bool bEnabled2D_;
+    bool bPrograms_;
+    bool bSeparate_;
+    std::array<GLdouble, 16> aProjection_{};
+    std::array<GLdouble, 16> aModelview_{};
+    GLint nDraw_ = 0;
+    GLint nRead_ = 0;
+    GLint nProgram_ = 0;
 };
 
 } // namespace

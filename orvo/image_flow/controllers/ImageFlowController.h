@@ -24,8 +24,9 @@ class Visitor;
 ///
 /// Graphs with nodes of the GPU run in an OpenGL context, which `setContextGPU` names: it is current on the
 /// thread of a frame for the length of the frame, with texture unit 0 active and its 2D texturing enabled.
-/// Afterwards what was current before is current again, and unit and enable are as they were. Without a
-/// context a frame makes no OpenGL call.
+/// Afterwards what was current before is current again, and in the frame's context texture units, matrices,
+/// viewport, program and framebuffer bindings are as they were. Without a context a frame makes no OpenGL
+/// call.
 ///
 /// All walks keep their stack on the heap and are linear in nodes and connections, so graphs may be of any
 /// depth. Failures are `InternalException`s with the stated texts.
