@@ -130,9 +130,9 @@ TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, 
     // The worst case: a tile that has taken in a strip, between others, farthest from the grid's corners.
     // What the frame reads beyond what it computes is less than half the margin.
     auto const window = [&] {
-        int const width = tileWidth + 15 + 2 * reach.marginX + reach.stepX + vectorColumns;
-        int const height = tileHeight + 15 + 2 * reach.marginY + reach.stepY + reach.marginY;
-        return commonPart(rectangleBetween(0, 0, width, height), picture());
+        int const right = tileWidth + 15 + 2 * reach.marginX + reach.stepX + vectorColumns;
+        int const bottom = tileHeight + 15 + 3 * reach.marginY + reach.stepY;
+        return commonPart(rectangleBetween(0, 0, right, bottom), picture());
     };
     auto const needed = [&] { return baseMemory + bytesNeeded(window(), width, bytes); };
     while (needed() > memory && tileHeight > fileTile_)
