@@ -260,11 +260,10 @@ TEST_F(ImageWrapperTest, SaysTheInternalFormat) {
         Texture::InternalFormat eFormat;
     };
     for (Row const& row :
-         {Row{1, 0, Texture::INTERNAL_FORMAT_LUMINANCE8},
-          Row{2, 0, Texture::INTERNAL_FORMAT_LUMINANCE8_ALPHA8}, Row{3, 0, Texture::INTERNAL_FORMAT_RGB8},
-          Row{4, 0, Texture::INTERNAL_FORMAT_RGBA8}, Row{3, 2, Texture::INTERNAL_FORMAT_RGB16},
-          Row{4, 3, Texture::INTERNAL_FORMAT_RGBA16}, Row{4, 4, Texture::INTERNAL_FORMAT_RGBA16F},
-          Row{3, 6, Texture::INTERNAL_FORMAT_RGB32F}}) {
+         {Row{1, 0, Texture::INTERNAL_FORMAT_LUMINANCE}, Row{2, 0, Texture::INTERNAL_FORMAT_LUMINANCE_ALPHA},
+          Row{3, 0, Texture::INTERNAL_FORMAT_RGB8}, Row{4, 0, Texture::INTERNAL_FORMAT_RGBA8},
+          Row{3, 2, Texture::INTERNAL_FORMAT_RGB16}, Row{4, 3, Texture::INTERNAL_FORMAT_RGBA16},
+          Row{4, 4, Texture::INTERNAL_FORMAT_RGBA16F}, Row{3, 6, Texture::INTERNAL_FORMAT_RGB32F}}) {
         ImageWrapper const wrapper(formatOf(row.nChannel, row.type), oPixel_, ORVO_TARGET_GL, oRect_);
         EXPECT_EQ(wrapper.textureInternalFormatToUse(), row.eFormat) << row.nChannel << ' ' << row.type;
     }
@@ -274,6 +273,9 @@ TEST_F(ImageWrapperTest, SaysTheInternalFormat) {
     ORVO_EXPECT_INTERNAL(
         ImageWrapper(formatOf(5, 0), oPixel_, ORVO_TARGET_GL, oRect_).textureInternalFormatToUse(),
         "Not implemented: pixelFormat in ImageGPU::mapDescriptorToImageGPU()");
+    ORVO_EXPECT_PARAMETER(
+        ImageWrapper(formatOf(2, 2), oPixel_, ORVO_TARGET_GL, oRect_).textureInternalFormatToUse(),
+        "invalid pixel format");
 }
 
 } // namespace
