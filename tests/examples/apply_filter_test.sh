@@ -80,7 +80,10 @@ grep -A1 '^FastBilateralFilter' "$scratch/stdout" | grep -q 'runs on cpu, gl' ||
 for line in 'FastBilateralBlur  (Motion Loft, Norvane Works, version 1)' \
     'spatialSigma  float2  default 10,10  from 0.1,0.1 to 100,100' 'rangeSigma  float  default 0.15' \
     'colorize  bool  default false' 'input src' 'RGBToLABCPU' 'SimpleBilateralCPU' \
-    'premultiply  (ORVO, Norvane, version 1)' 'runs on cpu' 'runs on gl'; do
+    'premultiply  (ORVO, Norvane, version 1)' 'runs on cpu' 'runs on gl' \
+    'MirelCheckerBoardGPU  (ImageFlow, Norvane, version 1)' 'checkerSize  float2  default 16,16' \
+    'MirelGamutComposite  (ImageFlow, Norvane, version 1)' 'input GamutTestResultInputImage' \
+    'MirelToneMappingGPU  (ImageFlow, Norvane, version 1)' 'exposure  float  default 0  from -20 to 20'; do
     grep -qF "$line" "$scratch/stdout" || fail "no \"$line\" in the list"
 done
 accepted --help
