@@ -49,6 +49,7 @@ TEST_F(ConstTeeJointGPUTest, BothConsumersShareTheTexture) {
     ImageGPUInput source;
     feed(tee, 0, source);
     source.setImageGPUWithNoOwnership(upImage.get());
+    NodeScope const scope(tee);
     ImageFlowController controller;
     plant(controller, {&source, &tee, &left, &right, &end}, end);
     controller.setContextGPU(frameContext());
@@ -72,6 +73,7 @@ TEST_F(ConstTeeJointGPUTest, AnUnconnectedOutputFailsTheRegions) {
     ImageGPUInput source;
     feed(tee, 0, source);
     DataFlow::Connect(*left.imageInput(0), *tee.imageOutput());
+    NodeScope const scope(tee);
     ImageFlowController controller;
     plant(controller, {&source, &tee, &left}, left);
     ORVO_EXPECT_INTERNAL(controller.computeRegions(world(0, 0, 4, 3)),
@@ -90,6 +92,7 @@ TEST_F(ConstTeeJointGPUTest, AConsumerThatWantsAnImageOfItsOwnFails) {
     DataFlow::Connect(*sink.imageInput(0), *tee.imageOutput());
     DataFlow::Connect(*right.imageInput(0), *tee.clonedImageOutput(0));
     feed(end, 0, right);
+    NodeScope const scope(tee);
     ImageFlowController controller;
     plant(controller, {&source, &tee, &sink, &right, &end}, sink);
     controller.setContextGPU(frameContext());
