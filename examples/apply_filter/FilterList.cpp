@@ -26,8 +26,9 @@ void listParameter(std::ostream& stream, FG::ParameterBase const& parameter) {
     stream << '\n';
 }
 
-std::string targetsOf(std::shared_ptr<FG::IFilter> const& filter, ORVO::OGL::Context const* context) {
-    bool const cpu = runsOn(nullptr, filter);
+std::string targetsOf(std::shared_ptr<FG::IFilter> const& filter, ORVO::OGL::Context const* context,
+                      std::set<std::string> const& onCPU) {
+    bool const cpu = onCPU.count(filter->identifier().name()) != 0 || runsOn(nullptr, filter);
     bool const gl = context && runsOn(context, filter);
     if (cpu || gl)
         return cpu && gl ? "runs on cpu, gl" : cpu ? "runs on cpu" : "runs on gl";
@@ -35,11 +36,12 @@ std::string targetsOf(std::shared_ptr<FG::IFilter> const& filter, ORVO::OGL::Con
 }
 
 void listFilter(std::ostream& stream, std::shared_ptr<FG::IFilter> const& prototype,
-                ORVO::OGL::Context const* context) {
+                ORVO::OGL::Context const* context, std::set<std::string> const& onCPU) {
     FG::IFilter const& filter = *prototype;
     auto const& identifier = filter.identifier();
     stream << identifier.name() << "  (" << identifier.nameSpace() << ", " << identifier.vendor()
-           << ", version " << identifier.version() << ")\n    " << targetsOf(prototype, context) << '\n';
+           << ", version " << identifier.version() << ")\n    " << targetsOf(prototype, context, onCPU)
+           << '\n';
     for (auto input = filter.inputs(); input.isValid(); ++input) {
         stream << "    input " << input->name();
         if (input->nChannel() > 0)
@@ -60,10 +62,20 @@ std::shared_ptr<FG::IFilter> createFilterNamed(std::string const& name) {
     return {};
 }
 
-void listFilters(std::ostream& stream, ORVO::OGL::Context const* context) {
+std::set<std::string> filtersOnCPU() {
+    std::set<std::string> names;
     FG::FilterFactory& factory = *FG::FilterFactory::Instance();
     for (auto prototype = factory.prototypes(); prototype.isValid(); ++prototype)
-        listFilter(stream, factory.create(prototype->identifier()), context);
+        if (runsOn(nullptr, factory.create(prototype->identifier())))
+            names.insert(prototype->identifier().name());
+    return names;
+}
+
+void listFilters(std::ostream& stream, ORVO::OGL::Context const* context,
+                 std::set<std::string> const& onCPU) {
+    FG::FilterFactory& factory = *FG::FilterFactory::Instance();
+    for (auto prototype = factory.prototypes(); prototype.isValid(); ++prototype)
+        listFilter(stream, factory.create(prototype->identifier()), context, onCPU);
 }
 
 } // namespace example

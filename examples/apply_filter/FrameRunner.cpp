@@ -53,7 +53,9 @@ struct Graph {
         if (chain.empty()) {
             FG::Connect(input, output);
         } else {
-            FG::Connect(input, chain.front());
+            // A filter with several inputs gets the picture on each.
+            for (FG::Input* const pInput : chain.front()->inputs())
+                FG::Connect(input, pInput);
             for (std::size_t i = 1; i < chain.size(); ++i)
                 FG::Connect(chain[i - 1], chain[i]);
             FG::Connect(chain.back(), output);

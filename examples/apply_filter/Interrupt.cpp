@@ -12,14 +12,12 @@ extern "C" void noteInterrupt(int /*signal*/) { interrupted = 1; }
 
 } // namespace
 
-Interrupt::Interrupt() {
-    std::signal(SIGINT, noteInterrupt);
-    std::signal(SIGTERM, noteInterrupt);
-}
+Interrupt::Interrupt()
+    : onInterrupt_(std::signal(SIGINT, noteInterrupt)), onTerminate_(std::signal(SIGTERM, noteInterrupt)) {}
 
 Interrupt::~Interrupt() {
-    std::signal(SIGINT, SIG_DFL);
-    std::signal(SIGTERM, SIG_DFL);
+    std::signal(SIGINT, onInterrupt_);
+    std::signal(SIGTERM, onTerminate_);
 }
 
 bool Interrupt::requested() { return interrupted != 0; }

@@ -2,7 +2,8 @@
 
 namespace example {
 
-/// While one lives, Ctrl-C and a polite kill are noted instead of ending the program.
+/// While one lives, Ctrl-C and a polite kill are noted instead of ending the program. One may live inside the
+/// life of another.
 class Interrupt {
 public:
     Interrupt();
@@ -11,6 +12,12 @@ public:
     ~Interrupt();
 
     [[nodiscard]] static bool requested();
+
+private:
+    using Handler = void (*)(int);
+
+    Handler onInterrupt_;
+    Handler onTerminate_;
 };
 
 } // namespace example

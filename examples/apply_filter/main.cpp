@@ -3,12 +3,14 @@
 #include "apply_filter/FilterValues.h"
 #include "apply_filter/FrameRunner.h"
 #include "apply_filter/Options.h"
+#include "common/Engine.h"
 #include "common/Picture.h"
-#include "orvo/orvo.h"
 
 #include <cstdio>
 #include <iostream>
 #include <memory>
+#include <set>
+#include <string>
 #include <utility>
 
 namespace {
@@ -17,37 +19,16 @@ constexpr int exitFailure = 1;
 constexpr int exitUsage = 2;
 constexpr int exitInterrupted = 130;
 
-using ContextPtr = std::unique_ptr<ORVO::OGL::ContextOffscreen>;
+example::ContextPtr noContext() { return {}; }
 
-// What is needed of OpenGL. The list of filters does without where there is none.
-ContextPtr contextFor(example::Options const& options) {
-    if (options.target == example::Target::cpu && !options.list)
-        return {};
+// The list of filters does without OpenGL where there is none.
+example::ContextPtr contextIfThereIsOne() {
     try {
-        auto context = ORVO::OGL::ContextOffscreen::createHeadless();
-        context->makeCurrent();
-        return context;
+        return example::makeContext();
     } catch (ORVO::OGL::ExceptionOGL const&) {
-        if (options.list)
-            return {};
-        throw;
+        return {};
     }
 }
-
-// The layers of the engine, up for the life of one of these, with a context where there is one.
-struct Engine {
-    ORVO::Core::AutoInitializer core;
-    ORVO::OGL::AutoInitializer ogl;
-    ContextPtr const context;
-    ORVO::ImageRuntime::AutoInitializer runtime{context.get(), ORVO::VideoMemory::Configuration()};
-    ORVO::DataFlow::AutoInitializer dataFlow;
-    ORVO::ImageFlow::AutoInitializer imageFlow{context != nullptr};
-    ORVO::FilterGraph::AutoInitializer filterGraph{ORVO::FilterGraph::Library::InitializationOptions()};
-
-    explicit Engine(example::Options const& options) : context(contextFor(options)) {
-        ORVO::FilterGraph::insertStandardFilters();
-    }
-};
 
 // A filter that has no code for the target fails like any other; the user is told so in words.
 bool runFramesOfFilter(std::shared_ptr<ORVO::FilterGraph::IFilter> const& filter,
@@ -90,27 +71,29 @@ int applyFilter(example::Options const& options, ORVO::OGL::Context const* conte
     return 0;
 }
 
+void listAll() {
+    std::set<std::string> onCPU;
+    {
+        example::Engine const withoutContext(noContext);
+        onCPU = example::filtersOnCPU();
+    }
+    example::Engine const engine(contextIfThereIsOne);
+    example::listFilters(std::cout, engine.context.get(), onCPU);
+}
+
 int run(example::Options const& options) {
     if (options.help) {
         std::fputs(example::usageText, stdout);
         return 0;
     }
-    Engine const engine(options);
     if (options.list) {
-        example::listFilters(std::cout, engine.context.get());
+        listAll();
         return 0;
     }
+    example::Engine const engine(options.target == example::Target::gl ? example::makeContext : noContext);
     if (options.threads > 0)
         ORVO::FilterGraph::setNumberOfThreads(options.threads);
     return applyFilter(options, engine.context.get());
-}
-
-// What a failure of the engine says to a person.
-std::string describe(std::exception const& failure) {
-    auto const* client = dynamic_cast<ORVO::FilterGraph::Exception const*>(&failure);
-    if (client && !client->errorsAndWarnings().empty())
-        return client->errorsAndWarnings().front().message();
-    return failure.what();
 }
 
 } // namespace
@@ -125,7 +108,7 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "apply_filter: %s\n", failure.what());
         return exitUsage;
     } catch (std::exception const& failure) {
-        std::fprintf(stderr, "apply_filter: %s\n", describe(failure).c_str());
+        std::fprintf(stderr, "apply_filter: %s\n", example::describe(failure).c_str());
         return exitFailure;
     }
 }

@@ -48,9 +48,10 @@ std::string Progress::line(std::size_t done, std::size_t total, double seconds) 
     auto const marks = static_cast<std::size_t>(share * static_cast<double>(barLength));
     char percent[16];
     std::snprintf(percent, sizeof percent, "%3d %%", static_cast<int>(share * 100.0));
-    std::string text = "[" + std::string(marks, '#') + std::string(barLength - marks, '.') + "] " + percent;
+    std::string text(1, '[');
+    text.append(marks, '#').append(barLength - marks, '.').append("] ").append(percent);
     if (done > 0)
-        text += ", " + timeText(seconds * (1.0 - share) / share) + " left";
+        text.append(", ").append(timeText(seconds * (1.0 - share) / share)).append(" left");
     return text;
 }
 

@@ -23,8 +23,8 @@ constexpr int vectorColumns = 16;
 // Beyond this a step would cost more than it is good for.
 constexpr int largestStep = 2048;
 
-// Bytes that the program takes without any picture: code, the driver, threads.
-constexpr std::size_t baseMemory = std::size_t(64) << 20U;
+// Bytes that the program takes for a picture of a few pixels: the libraries that it is linked to, threads.
+constexpr std::size_t baseMemory = std::size_t(140) << 20U;
 
 // Results that are computed, wait, and are being written.
 constexpr std::size_t resultsInFlight = 4;
@@ -53,11 +53,16 @@ int marginOf(float sigma) {
     return ORVO::saturatingCast<int>(std::ceil(4.5 * std::clamp(static_cast<double>(sigma), 0.0, 1e8)));
 }
 
+std::size_t areaOf(Rectangle const& rectangle) {
+    return static_cast<std::size_t>(rectangle.extent().width()) *
+           static_cast<std::size_t>(rectangle.extent().height());
+}
+
+// The frame is counted one and a half times, for what is kept from one for the next.
 std::size_t bytesNeeded(Rectangle const& window, int width, PixelBytes const& bytes) {
     auto const rows = static_cast<std::size_t>(window.extent().height());
-    std::size_t const pixels = rows * static_cast<std::size_t>(window.extent().width());
     return 2 * rows * static_cast<std::size_t>(width) * bytes.file +
-           pixels * (resultsInFlight * bytes.result + bytes.work);
+           areaOf(window) * (resultsInFlight * bytes.result + bytes.work + bytes.work / 2);
 }
 
 // Every second row of tiles is walked the other way.
@@ -122,21 +127,21 @@ TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, 
       fileTile_(roundedUp(std::min(tileSize, 256), vectorColumns)) {
     int const tileWidth = roundedUp(std::min(tileSize, roundedUp(width, fileTile_)), fileTile_);
     int tileHeight = roundedUp(std::min(tileSize, roundedUp(height, fileTile_)), fileTile_);
-    auto const needed = [&] {
-        // The worst case: a tile that has taken in a strip, between others, farthest from the grid's corners.
-        int const right = tileWidth + 15 + reach.marginX + vectorColumns;
-        int const bottom = tileHeight + 15 + reach.marginY;
-        Rectangle const window = commonPart(
-            rectangleBetween(0, 0, right + reach.marginX + reach.stepX, bottom + reach.marginY + reach.stepY),
-            picture());
-        return baseMemory + bytesNeeded(window, width, bytes);
+    // The worst case: a tile that has taken in a strip, between others, farthest from the grid's corners.
+    // What the frame reads beyond what it computes is less than half the margin.
+    auto const window = [&] {
+        int const right = tileWidth + 15 + 2 * reach.marginX + reach.stepX + vectorColumns;
+        int const bottom = tileHeight + 15 + 3 * reach.marginY + reach.stepY;
+        return commonPart(rectangleBetween(0, 0, right, bottom), picture());
     };
+    auto const needed = [&] { return baseMemory + bytesNeeded(window(), width, bytes); };
     while (needed() > memory && tileHeight > fileTile_)
         tileHeight -= fileTile_;
     if (needed() > memory)
         throw UsageError("The memory does not suffice: --memory-limit has to be " +
                          std::to_string((needed() >> 20U) + 1) + " or more, or --tile smaller");
     tiles_ = serpentine(picture(), tileWidth, tileHeight);
+    frameMemory_ = areaOf(window()) * bytes.work;
 }
 
 Rectangle TilePlan::computed(Rectangle const& tile) const {

@@ -66,6 +66,9 @@ public:
     /// around.
     [[nodiscard]] std::vector<Rectangle> const& tiles() const { return tiles_; }
 
+    /// Bytes that the frame of a tile takes at most.
+    [[nodiscard]] std::size_t frameMemory() const { return frameMemory_; }
+
     /// What is computed for a tile.
     [[nodiscard]] Rectangle computed(Rectangle const& tile) const;
 
@@ -75,6 +78,7 @@ private:
     GridReach reach_;
     int fileTile_;
     std::vector<Rectangle> tiles_;
+    std::size_t frameMemory_ = 0;
 };
 
 } // namespace example

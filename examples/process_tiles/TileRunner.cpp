@@ -35,7 +35,7 @@ FilterPtr filterOf(TileOptions const& options, ORVO::OGL::Context const* context
         if (!warning.empty())
             std::fprintf(stderr, "process_tiles: warning: %s\n", warning.c_str());
     }
-    if (!runsOn(context, filter))
+    if (!runsOn(context, filter) && !Interrupt::requested())
         throw UsageError("The filter \"" + options.filter + "\" does not run on " + (context ? "gl" : "cpu") +
                          " (apply_filter --list shows the targets)");
     return filter;
@@ -92,6 +92,7 @@ std::size_t pixelsOf(Rectangle const& rectangle) {
 } // namespace
 
 bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context) {
+    Interrupt const interrupt;
     std::size_t const memory = options.memoryLimit << 20U;
     FilterPtr const filter = filterOf(options, context);
     checkTilesWritable(options.output);
@@ -101,9 +102,8 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
     TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter),
                         frame.pixelBytes(), memory);
-    ORVO::Core::setImageStorageLimit(memory / 8);
+    ORVO::Core::setImageStorageLimit(plan.frameMemory());
 
-    Interrupt const interrupt;
     std::vector<Row> const rows = rowsOf(plan, frame);
     reader.start(bandsOf(rows), depth);
     TileWriter writer(options.output, {reader.width(), reader.height(), plan.fileTile(), reader.channels(),
@@ -112,15 +112,17 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     for (Row const& row : rows) {
         Band const& band = reader.next();
         for (Rectangle const& tile : row.tiles) {
+            if (Interrupt::requested())
+                return false;
             Rectangle const computed = plan.computed(tile);
             Picture result = writer.spare();
             frame.run(band, computed, result);
-            if (Interrupt::requested())
-                return false;
             writer.write(tile, computed, std::move(result));
             progress.advance(pixelsOf(tile));
         }
     }
+    if (Interrupt::requested())
+        return false;
     writer.finish();
     return true;
 }

@@ -68,11 +68,22 @@ done
 accepted --target gl --filter scaleDown4channel "$photograph" "$scratch/gl_dark.png"
 cmp -s "$scratch/gl.png" "$scratch/gl_dark.png" && fail "scaleDown4channel changes nothing"
 
+# The bilateral blur runs on both targets, and looks alike.
+for filter in FastBilateralBlur FastBilateralFilter; do
+    accepted --target gl --filter $filter --set spatialSigma=4,4 --set colorize=true "$photograph" "$scratch/gl_blur.png"
+    cmp -s "$photograph" "$scratch/gl_blur.png" && fail "$filter changes nothing on gl"
+done
+
 accepted --list
+grep -A1 '^FastBilateralBlur' "$scratch/stdout" | grep -q 'runs on cpu, gl' || fail "targets of FastBilateralBlur"
+grep -A1 '^FastBilateralFilter' "$scratch/stdout" | grep -q 'runs on cpu, gl' || fail "targets of FastBilateralFilter"
 for line in 'FastBilateralBlur  (Motion Loft, Norvane Works, version 1)' \
     'spatialSigma  float2  default 10,10  from 0.1,0.1 to 100,100' 'rangeSigma  float  default 0.15' \
     'colorize  bool  default false' 'input src' 'RGBToLABCPU' 'SimpleBilateralCPU' \
-    'premultiply  (ORVO, Norvane, version 1)' 'runs on cpu' 'runs on gl'; do
+    'premultiply  (ORVO, Norvane, version 1)' 'runs on cpu' 'runs on gl' \
+    'MirelCheckerBoardGPU  (ImageFlow, Norvane, version 1)' 'checkerSize  float2  default 16,16' \
+    'MirelGamutComposite  (ImageFlow, Norvane, version 1)' 'input GamutTestResultInputImage' \
+    'MirelToneMappingGPU  (ImageFlow, Norvane, version 1)' 'exposure  float  default 0  from -20 to 20'; do
     grep -qF "$line" "$scratch/stdout" || fail "no \"$line\" in the list"
 done
 accepted --help
@@ -80,7 +91,7 @@ grep -q '^Usage: apply_filter' "$scratch/stdout" || fail "no usage in --help"
 
 refused 2 'There is no filter "Nonsense"' --filter Nonsense "$photograph" "$scratch/out.png"
 refused 2 'has no parameter "sigma"' "${bilateral[@]}" --set sigma=1 "$photograph" "$scratch/out.png"
-refused 2 'The filter "FastBilateralBlur" does not run on gl (--list shows the targets)' "${bilateral[@]}" \
+refused 2 'The filter "SimpleBilateralCPU" does not run on gl (--list shows the targets)' --filter SimpleBilateralCPU \
     --target gl "$photograph" "$scratch/out.png"
 refused 2 'The filter "premultiply" does not run on cpu (--list shows the targets)' --filter premultiply \
     "$photograph" "$scratch/out.png"

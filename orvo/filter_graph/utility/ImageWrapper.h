@@ -98,7 +98,7 @@ public:
 
     /// Takes a texture of the image's size from the pool in place of what is there, or makes one where there
     /// is no pool. An image that had the old one has the new one.
-    /// @throws InternalException if no texture has the format, or no pool serves the current context;
+    /// @throws as `textureInternalFormatToUse`; InternalException if no pool serves the current context;
     /// ParameterException "Image size exceeds 4294967295 bytes", "Texture size is too large"; ExceptionOGL.
     /// Everything is then as it was.
     void allocateStorageGL();
@@ -149,7 +149,8 @@ public:
     OGL::Texture::Format textureFormatToUse() const;
 
     /// The internal format of the wrapper's textures.
-    /// @throws InternalException with a text that begins with "Not implemented: " if there is none.
+    /// @throws InternalException with a text that begins with "Not implemented: ", or ParameterException
+    /// "invalid pixel format", if there is none.
     OGL::Texture::InternalFormat textureInternalFormatToUse() const;
 
     /// Unsigned short for channel types 1 and 2, int for 5, float for 6, else unsigned byte: also for 3 and

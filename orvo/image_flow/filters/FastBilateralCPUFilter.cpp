@@ -249,11 +249,11 @@ void FastBilateralCPUFilter::layOutGrid(Call& call) const {
     for (std::size_t px = 0; px < nWidth; ++px) {
         call.aColumns[px] =
             static_cast<std::uint32_t>(cellAlong(px, fSigmaX_, fPaddingXY_, fGridOffset_, nGridWidth_));
-        float const place = static_cast<float>(px) / fSigmaX_ + fGridOffset_ + fPaddingXY_;
-        float const whole = std::floor(place);
-        call.aFractions[px] = place - whole;
+        GridPlace const place = placeAlong(px, fSigmaX_, fPaddingXY_, fGridOffset_);
+        call.aFractions[px] = place.fFraction;
         // The padding keeps the column right of it inside the grid.
-        call.aLevels[px] = static_cast<std::int32_t>(clampedCell(whole, nGridWidth_ - 1) * layout.nLevels);
+        call.aLevels[px] =
+            static_cast<std::int32_t>(clampedCell(place.fWhole, nGridWidth_ - 1) * layout.nLevels);
     }
     call.aEnds.assign(nWidth, static_cast<std::uint32_t>(nWidth));
     for (std::size_t px = nWidth - 1; px-- > 0;) {
@@ -328,13 +328,12 @@ void FastBilateralCPUFilter::blurGridAlongY(Call& call) const {
 
 void FastBilateralCPUFilter::sliceGridRow(Call const& call, std::size_t row, float* pBlended,
                                           float* const* apResults) const {
-    float const place = static_cast<float>(row) / fSigmaY_ + fGridOffset_ + fPaddingXY_;
-    float const whole = std::floor(place);
+    GridPlace const place = placeAlong(row, fSigmaY_, fPaddingXY_, fGridOffset_);
     SliceJob job = {};
     job.pLayout = &call.layout;
-    job.pUpper = call.pDivided + clampedCell(whole, nGridHeight_) * call.dividedPitch();
-    job.pLower = call.pDivided + clampedCell(whole + 1.0F, nGridHeight_) * call.dividedPitch();
-    job.fFraction = place - whole;
+    job.pUpper = call.pDivided + clampedCell(place.fWhole, nGridHeight_) * call.dividedPitch();
+    job.pLower = call.pDivided + clampedCell(place.fWhole + 1.0F, nGridHeight_) * call.dividedPitch();
+    job.fFraction = place.fFraction;
     job.pBlended = pBlended;
     job.nPixels = call.working.width();
     job.pLevels = call.aLevels.data();

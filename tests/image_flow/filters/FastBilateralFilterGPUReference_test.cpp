@@ -207,6 +207,58 @@ TEST_F(FastBilateralFilterGPUReferenceTest, LargeSigmasRoundAsTheDriversBlending
         2 * kHalfTolerance);
 }
 
+TEST_F(FastBilateralFilterGPUReferenceTest, RandomFramesInARowAreAsTheFormulasSay) {
+    BilateralRoad mixing(frameContext(), false);
+    BilateralRoad filtering(frameContext(), true);
+    std::mt19937 random(5);
+    auto const pick = [&](int low, int high) { return low + int(random() % unsigned(high - low + 1)); };
+    for (int frame = 0; frame < 60; ++frame) {
+        PositionExtentInPixelSpace const input =
+            pixels(pick(-30, 30), pick(-30, 30), pick(1, 24), pick(1, 24));
+        PixelExtentInWorldSpace const pixelExtent =
+            pick(0, 3) == 0 ? PixelExtentInWorldSpace(0.5F, 2.0F) : PixelExtentInWorldSpace();
+        ImageGPUPtr const upImage = textureOf(
+            scene(input, unsigned(frame), 0, 1, pick(0, 1) == 0, pixelExtent, 0.1 * pick(0, 10)),
+            pick(0, 1) == 0 ? ImageGPU::PIXEL_FORMAT_RGBA8 : ImageGPU::PIXEL_FORMAT_RGBA16F, pick(0, 1) == 0);
+        // Anywhere on the input and one pixel around it, which every sigma reaches.
+        int const left = pick(-1, input.extent().width() - 1);
+        int const top = pick(-1, input.extent().height() - 1);
+        PositionExtentInPixelSpace const region =
+            pixels(input.position().x() + left, input.position().y() + top,
+                   pick(1, input.extent().width() - left), pick(1, input.extent().height() - top));
+        Settings const s{0.1 * pick(10, 80), 0.1 * pick(10, 80), 0.01F * float(pick(6, 100)),
+                         pick(0, 1) == 0};
+        bool const bHalf = pick(0, 1) == 0;
+        BilateralRoad& road = pick(0, 1) == 0 ? mixing : filtering;
+        EXPECT_LE(largestDifference(Texels(road.run(*upImage, region, s, bHalf)),
+                                    filtered(Texels(*upImage), region, s, halfTowardZero), !bHalf),
+                  bHalf ? kHalfStep : kByteStep)
+            << "frame " << frame;
+    }
+}
+
+TEST_F(FastBilateralFilterGPUReferenceTest, PixelsOutsideTheRegionHaveNoInfluence) {
+    PositionExtentInPixelSpace const input = pixels(-4, 3, 30, 24);
+    PositionExtentInPixelSpace const region = pixels(3, 9, 12, 10);
+    Texels const clean = scene(input, 10);
+    Texels poisoned = clean;
+    double const nan = std::numeric_limits<double>::quiet_NaN();
+    poisoned.fill([&](int x, int y) {
+        return Texels(region).contains(x, y) ? clean.at(x, y) : Pixel{nan, nan, nan, nan};
+    });
+    ImageGPUPtr const upClean = textureOf(clean, ImageGPU::PIXEL_FORMAT_RGBA32F, false);
+    ImageGPUPtr const upPoisoned = textureOf(poisoned, ImageGPU::PIXEL_FORMAT_RGBA32F, false);
+    for (bool const bHardwareFilters : {false, true}) {
+        for (bool const bColorize : {false, true}) {
+            BilateralRoad road(frameContext(), bHardwareFilters);
+            Settings const s{3, 2, 0.15F, bColorize};
+            Texels const expected(road.run(*upClean, region, s, true));
+            EXPECT_EQ(0.0,
+                      largestDifference(Texels(road.run(*upPoisoned, region, s, true)), expected, false));
+        }
+    }
+}
+
 TEST_F(FastBilateralFilterGPUReferenceTest, ABoundImageGetsItsRegionAndNothingElse) {
     PositionExtentInPixelSpace const input = pixels(0, 0, 30, 24);
     ImageGPUPtr const upImage = textureOf(scene(input, 8), ImageGPU::PIXEL_FORMAT_RGBA32F, false);

@@ -6,6 +6,7 @@
 #include <random>
 
 #include "orvo/core/exceptions/SharedException.h"
+#include "orvo/core/memory/MemoryStatistics.h"
 #include "orvo/image_flow/filters/BufferGPU.h"
 #include "orvo/image_flow/filters/ConstTeeJointGPU.h"
 #include "orvo/ogl/ScopedContextWrapper.h"
@@ -105,6 +106,7 @@ public:
     ImageGPUOutput oSink_;
 };
 
+class TextureGraphsTest : public ShaderFlowTest {};
 class CompoundFilterGPUTest : public ShaderFlowTest, public testing::WithParamInterface<bool> {};
 
 TEST_P(CompoundFilterGPUTest, DoesWhatTheInnerGraphDoes) {
@@ -199,6 +201,22 @@ TEST_P(CompoundFilterGPUTest, CancellationCrossesTheLevels) {
             graph.expectRight();
         }
     }
+}
+
+TEST_F(TextureGraphsTest, AThousandFramesOfACompoundTakeNothingMore) {
+    TextureCompoundGraph graph(frameContext(), true);
+    auto const frames = [&](int nFrames) {
+        for (int i = 0; i < nFrames; ++i)
+            graph.run(pixels(-1, 3, 1 + i % 4, 1 + i % 3));
+    };
+    frames(24);
+    ObjectCounts const objects = GLHooks::objects();
+    std::size_t const nBytes = Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT);
+    std::uint64_t const nPrograms = GLHooks::calls("glCreateProgram");
+    frames(984);
+    EXPECT_EQ(objects, GLHooks::objects());
+    EXPECT_EQ(nBytes, Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT));
+    EXPECT_EQ(nPrograms, GLHooks::calls("glCreateProgram"));
 }
 
 INSTANTIATE_TEST_SUITE_P(, CompoundFilterGPUTest, testing::Bool(),
@@ -321,9 +339,7 @@ private:
     std::vector<std::size_t> aiRows_;
 };
 
-class RandomTextureGraphsTest : public ShaderFlowTest {};
-
-TEST_F(RandomTextureGraphsTest, EveryFrameGivesWhatTheFiltersGiveOneAfterTheOther) {
+TEST_F(TextureGraphsTest, EveryFrameGivesWhatTheFiltersGiveOneAfterTheOther) {
     ReferenceFilters aReferences;
     for (DisplayFilterRow const& row : aDisplayFilters)
         aReferences.push_back(row.pMake_());

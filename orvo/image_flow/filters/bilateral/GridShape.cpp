@@ -19,6 +19,19 @@ std::size_t cellsFrom(float inner, float padding, float offset) {
     return nInner + saturatingCast<std::size_t>(2.0F * padding + offset);
 }
 
+// pixel / sigma in whole cells and a rest in pixels, both exact: a quotient rounded to float would lose more
+// of its fraction the farther the pixel is from the edge.
+struct ExactCells {
+    double fWhole;
+    double fRest;
+};
+
+ExactCells exactCells(std::size_t pixel, float sigma) {
+    auto const fPixel = static_cast<double>(pixel);
+    double const fRest = std::fmod(fPixel, static_cast<double>(sigma));
+    return {(fPixel - fRest) / static_cast<double>(sigma), fRest};
+}
+
 } // namespace
 
 ValueRange valueRange(float lowest, float highest) {
@@ -47,7 +60,19 @@ std::size_t clampedCell(float cell, std::size_t count) {
 }
 
 std::size_t cellAlong(std::size_t pixel, float sigma, float padding, float offset, std::size_t count) {
-    return clampedCell(std::floor(static_cast<float>(pixel) / sigma + 0.5F) + offset + padding, count);
+    ExactCells const cells = exactCells(pixel, sigma);
+    bool const isNearerToNext = 2.0 * cells.fRest >= static_cast<double>(sigma);
+    double const nearest = cells.fWhole + (isNearerToNext ? 1.0 : 0.0);
+    return clampedCell(static_cast<float>(nearest) + offset + padding, count);
+}
+
+GridPlace placeAlong(std::size_t pixel, float sigma, float padding, float offset) {
+    ExactCells const cells = exactCells(pixel, sigma);
+    double const shift = static_cast<double>(offset + padding);
+    double const fraction = cells.fRest / static_cast<double>(sigma) + (shift - std::floor(shift));
+    double const carry = std::floor(fraction);
+    return {static_cast<float>(cells.fWhole + std::floor(shift) + carry),
+            static_cast<float>(fraction - carry)};
 }
 
 int radiusOf(float sigma) {

@@ -42,8 +42,20 @@ ORVO_API bool gridServesFor(std::size_t width, std::size_t height, std::size_t d
 ORVO_API std::size_t clampedCell(float cell, std::size_t count);
 
 /// The cell into which the pixel at an offset of `pixel` from the edge falls: the nearest one.
+///
+/// Worked out exactly, as `placeAlong` is, so that pixels a whole number of sigmas apart stand alike in their
+/// cells: a picture computed in parts whose edges lie that far apart has no seams.
 ORVO_API std::size_t cellAlong(std::size_t pixel, float sigma, float padding, float offset,
                                std::size_t count);
+
+/// Where a pixel stands between the cells.
+struct GridPlace {
+    float fWhole;    ///< the cell at it or before it
+    float fFraction; ///< how far it is from that cell towards the next, 0 to 1
+};
+
+/// The place of the pixel at an offset of `pixel` from the edge: pixel / sigma + offset + padding.
+ORVO_API GridPlace placeAlong(std::size_t pixel, float sigma, float padding, float offset);
 
 /// ceil(2.146 sigma), between 0 and kMaximalRadius: how far the direct filter reaches, in pixels.
 ORVO_API int radiusOf(float sigma);

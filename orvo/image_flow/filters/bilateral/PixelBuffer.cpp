@@ -6,7 +6,7 @@ namespace ORVO::ImageFlow::bilateral {
 
 namespace {
 
-long long pixelsOf(ExtentInPixelSpace const& extent) {
+long long pixelsIn(ExtentInPixelSpace const& extent) {
     return static_cast<long long>(extent.width()) * extent.height();
 }
 
@@ -15,12 +15,12 @@ long long pixelsOf(ExtentInPixelSpace const& extent) {
 PixelBuffer::PixelBuffer(ExtentInPixelSpace const& extent, unsigned nFloats, float const* pData,
                          OGL::Buffer::Usage usage)
     : oExtent_(extent),
-      oBuffer_(pixelsOf(extent) * nFloats * static_cast<long long>(sizeof(float)), OGL::Buffer::TYPE_ARRAY,
+      oBuffer_(pixelsIn(extent) * nFloats * static_cast<long long>(sizeof(float)), OGL::Buffer::TYPE_ARRAY,
                usage, pData) {}
 
 std::unique_ptr<PixelBuffer> PixelBuffer::ofPositions(ExtentInPixelSpace const& extent) {
     std::vector<float> aPositions;
-    aPositions.reserve(2 * static_cast<std::size_t>(pixelsOf(extent)));
+    aPositions.reserve(2 * static_cast<std::size_t>(pixelsIn(extent)));
     for (int y = 0; y < extent.height(); ++y) {
         for (int x = 0; x < extent.width(); ++x) {
             aPositions.push_back(static_cast<float>(x));

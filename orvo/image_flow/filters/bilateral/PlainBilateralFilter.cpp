@@ -372,9 +372,13 @@ void PlainBilateralFilter::sliceGrid(ImageCPU& grid, ImageCPU& working, Store co
         float const whole = floorOf(place);
         return Place{cellOf(whole, count), cellOf(whole + 1.0F, count), place - whole};
     };
+    auto const placeOfPixel = [this](std::size_t pixel, float sigma, std::size_t count) {
+        GridPlace const place = placeAlong(pixel, sigma, fPaddingXY_, fGridOffset_);
+        return Place{cellOf(place.fWhole, count), cellOf(place.fWhole + 1.0F, count), place.fFraction};
+    };
     std::vector<Place> aColumns(widthOf(working));
     for (std::size_t px = 0; px < aColumns.size(); ++px) {
-        aColumns[px] = placeOf(static_cast<float>(px) / fSigmaX_ + fGridOffset_ + fPaddingXY_, nGridWidth_);
+        aColumns[px] = placeOfPixel(px, fSigmaX_, nGridWidth_);
     }
     // Kept at hand: the compiler must assume that pixels are stored over the fields.
     float const valueMin = fValueMin_;
@@ -386,7 +390,7 @@ void PlainBilateralFilter::sliceGrid(ImageCPU& grid, ImageCPU& working, Store co
     std::size_t const nDepth = nGridDepth_;
     Pixel* pPixel = pixelsOf<Pixel>(working);
     for (std::size_t py = 0; py < heightOf(working); ++py) {
-        Place const y = placeOf(static_cast<float>(py) / fSigmaY_ + fGridOffset_ + fPaddingXY_, nGridHeight_);
+        Place const y = placeOfPixel(py, fSigmaY_, nGridHeight_);
         std::array<Pixel const*, 2> const apLayers = {pGrid + cellIndex(0, y.nFirst, 0),
                                                       pGrid + cellIndex(0, y.nSecond, 0)};
         for (Place const& x : aColumns) {

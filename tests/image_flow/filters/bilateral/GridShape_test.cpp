@@ -93,6 +93,32 @@ TEST(GridShape, PixelsFallIntoTheNearestCell) {
     EXPECT_EQ(4U, cellAlong(1000, kInfinity, 4.0F, 0.0F, 8));
 }
 
+TEST(GridShape, PlacesHaveAWholePartAndAFraction) {
+    EXPECT_EQ(4.0F, placeAlong(0, 10.0F, 4.0F, 0.0F).fWhole);
+    EXPECT_EQ(0.0F, placeAlong(0, 10.0F, 4.0F, 0.0F).fFraction);
+    EXPECT_EQ(7.0F, placeAlong(37, 10.0F, 4.0F, 0.0F).fWhole);
+    EXPECT_EQ(0.7F, placeAlong(37, 10.0F, 4.0F, 0.0F).fFraction);
+    EXPECT_EQ(5.0F, placeAlong(3, 4.0F, 4.0F, 0.5F).fWhole); // 0.75 + 4.5
+    EXPECT_EQ(0.25F, placeAlong(3, 4.0F, 4.0F, 0.5F).fFraction);
+    EXPECT_EQ(4.0F, placeAlong(1000, kInfinity, 4.0F, 0.0F).fWhole);
+}
+
+TEST(GridShape, PixelsWholeSigmasApartStandAlike) {
+    for (float const sigma : {10.0F, 2.5F, 33.0F, 99.5F}) {
+        // So many pixels are a whole number of these sigmas.
+        std::size_t const period = sigma == 2.5F ? 5 : sigma == 99.5F ? 199 : std::size_t(sigma);
+        float const cells = static_cast<float>(period) / sigma;
+        for (std::size_t pixel = 0; pixel < 100; ++pixel) {
+            GridPlace const near = placeAlong(pixel, sigma, 4.0F, 0.0F);
+            GridPlace const far = placeAlong(pixel + 250 * period, sigma, 4.0F, 0.0F);
+            ASSERT_EQ(near.fFraction, far.fFraction) << pixel << ' ' << sigma;
+            ASSERT_EQ(near.fWhole + 250.0F * cells, far.fWhole) << pixel << ' ' << sigma;
+            ASSERT_EQ(static_cast<float>(cellAlong(pixel, sigma, 4.0F, 0.0F, 100000)) + 250.0F * cells,
+                      static_cast<float>(cellAlong(pixel + 250 * period, sigma, 4.0F, 0.0F, 100000)));
+        }
+    }
+}
+
 TEST(GridShape, RadiusOfTheDirectFilterIsBounded) {
     EXPECT_EQ(22, radiusOf(10.0F));
     EXPECT_EQ(1, radiusOf(0.4659F));

@@ -1,0 +1,211 @@
+// Pictures through tiles: the same as in one piece, on both roads, from and into every kind of file.
+#include "process_tiles/TileRunner.h"
+
+#include "apply_filter/FilterList.h"
+#include "apply_filter/FilterValues.h"
+#include "apply_filter/FrameRunner.h"
+#include "common/Engine.h"
+#include "common/Picture.h"
+#include "common/PictureIO.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <random>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <unistd.h>
+
+namespace example {
+namespace {
+
+namespace fs = std::filesystem;
+
+// Slopes, edges and noise, which are the same on every run.
+Picture scene(std::size_t width, std::size_t height, std::size_t channels, Depth depth) {
+    Picture picture(width, height, channels, depth);
+    std::mt19937 random(7);
+    for (std::size_t i = 0; i < width * height * channels; ++i) {
+        std::size_t const x = i / channels % width;
+        std::size_t const y = i / channels / width;
+        double const slope = 0.5 + 0.3 * std::sin(0.05 * static_cast<double>(x + i % channels * 20)) *
+                                       std::cos(0.04 * static_cast<double>(y));
+        double const edge = (x / 37 + y / 29) % 2 == 0 ? 0.12 : -0.12;
+        double const noise = static_cast<double>(random() % 1000) / 1000.0 * 0.08 - 0.04;
+        double const value = std::clamp(slope + edge + noise, 0.0, 1.0);
+        if (depth == Depth::uint8)
+            picture.pixels[i] = static_cast<unsigned char>(std::lround(255.0 * value));
+        else
+            reinterpret_cast<float*>(picture.pixels.data())[i] = static_cast<float>(value);
+    }
+    return picture;
+}
+
+int largestDifference(Picture const& one, Picture const& other) {
+    if (one.pixels.size() != other.pixels.size())
+        return 256;
+    int largest = 0;
+    for (std::size_t i = 0; i < one.pixels.size(); ++i)
+        largest = std::max(largest, std::abs(int(one.pixels[i]) - int(other.pixels[i])));
+    return largest;
+}
+
+class ProcessTiles : public testing::Test {
+protected:
+    ProcessTiles() { fs::create_directories(folder_); }
+    ~ProcessTiles() override { fs::remove_all(folder_); }
+
+    std::string file(std::string const& name) const { return (folder_ / name).string(); }
+    ORVO::OGL::Context const* context() const { return engine_.context.get(); }
+
+    TileOptions options(std::string const& filter, std::string const& input, std::string const& output,
+                        std::vector<std::pair<std::string, std::string>> const& values = {}) const {
+        TileOptions result;
+        result.filter = filter;
+        result.values = values;
+        result.tile = 64;
+        result.input = input;
+        result.output = output;
+        return result;
+    }
+
+    Picture inOnePiece(TileOptions const& what, ORVO::OGL::Context const* where, Picture const& file) const {
+        auto const filter = createFilterNamed(what.filter);
+        for (auto const& [name, value] : what.values)
+            EXPECT_EQ(setValue(*filter, name, value), "");
+        Picture const source = widenedToColour(file);
+        Picture result(source.width, source.height, source.channels, source.depth);
+        EXPECT_TRUE(runFrames(filter, source, result, {where, 1, false}));
+        return file.channels < 3 ? reducedToGrey(result) : result;
+    }
+
+    // How far the picture through tiles is from that in one piece.
+    int difference(TileOptions what, ORVO::OGL::Context const* where, Picture const& picture) const {
+        what.input = file("in.tif");
+        what.output = file("out.tif");
+        writePicture(what.input, picture);
+        EXPECT_TRUE(processTiles(what, where));
+        return largestDifference(readPicture(what.output, picture.depth), inOnePiece(what, where, picture));
+    }
+
+private:
+    Engine engine_{makeContext};
+    fs::path folder_ = fs::temp_directory_path() / ("process_tiles_test." + std::to_string(::getpid()));
+};
+
+TEST_F(ProcessTiles, HasNoSeamsOnTheCPU) {
+    Picture const picture = scene(301, 219, 3, Depth::uint8);
+    for (char const* const sigma : {"4,4", "10,6", "2.5,3"})
+        for (char const* const colorize : {"false", "true"})
+            EXPECT_EQ(difference(options("FastBilateralBlur", "", "",
+                                         {{"spatialSigma", sigma}, {"colorize", colorize}}),
+                                 nullptr, picture),
+                      0)
+                << sigma << ' ' << colorize;
+}
+
+TEST_F(ProcessTiles, HasAlmostNoSeamsWhereCellsAreNoWholeNumberOfPixels) {
+    // The corners of the grids are up to a thousandth of a cell apart, and sums are taken in another order.
+    Picture const picture = scene(301, 219, 3, Depth::uint8);
+    for (char const* const sigma : {"7.3,3.1", "3.14159,2.71828"})
+        EXPECT_LE(
+            difference(options("FastBilateralBlur", "", "", {{"spatialSigma", sigma}}), nullptr, picture), 1)
+            << sigma;
+}
+
+TEST_F(ProcessTiles, HasNoSeamsOnOpenGLWhereSigmasAreExact) {
+    // With a power of two every place in the grid is exact; otherwise the shaders multiply by a rounded
+    // inverse, whose error depends on how far the tile's corner is, and 8-bit results differ by a step at
+    // most.
+    Picture const picture = scene(301, 219, 3, Depth::uint8);
+    EXPECT_EQ(difference(options("FastBilateralBlur", "", "", {{"spatialSigma", "4,2"}}), context(), picture),
+              0);
+    EXPECT_LE(
+        difference(options("FastBilateralBlur", "", "", {{"spatialSigma", "5,3"}, {"colorize", "true"}}),
+                   context(), picture),
+        2);
+}
+
+TEST_F(ProcessTiles, TakesEveryNumberOfChannels) {
+    for (std::size_t channels = 1; channels <= 4; ++channels) {
+        Picture const picture = scene(150, 90, channels, Depth::uint8);
+        EXPECT_EQ(
+            difference(options("FastBilateralBlur", "", "", {{"spatialSigma", "2,2"}}), nullptr, picture), 0)
+            << channels;
+        EXPECT_EQ(difference(options("scaleDown4channel", "", ""), context(), picture), 0) << channels;
+    }
+}
+
+TEST_F(ProcessTiles, KeepsTheDepthOfTheFile) {
+    // Ordinary values alone: the intensity axis is then the same for every tile.
+    Picture const picture = scene(150, 90, 3, Depth::float32);
+    TileOptions const what =
+        options("FastBilateralBlur", file("in.exr"), file("out.exr"), {{"spatialSigma", "4,4"}});
+    writePicture(what.input, picture);
+    ASSERT_TRUE(processTiles(what, nullptr));
+    EXPECT_EQ(depthOfFile(what.output), Depth::float32);
+    EXPECT_EQ(readPicture(what.output, Depth::float32).pixels, inOnePiece(what, nullptr, picture).pixels);
+
+    writePicture(file("in.tif"), Picture(40, 40, 3, Depth::uint15_1));
+    ASSERT_TRUE(processTiles(options("FastBilateralBlur", file("in.tif"), file("out.tif")), nullptr));
+    EXPECT_EQ(depthOfFile(file("out.tif")), Depth::uint15_1);
+}
+
+TEST_F(ProcessTiles, ReadsTiledFilesAndAssociatedAlpha) {
+    Picture const picture = scene(150, 133, 4, Depth::uint8);
+    writePicture(file("in.tif"), picture);
+    // What was written in tiles is read in tiles.
+    TileOptions what = options("RGBToLABCPU", file("in.tif"), file("tiled.tif"));
+    ASSERT_TRUE(processTiles(what, nullptr));
+    EXPECT_EQ(OIIO::ImageInput::open(what.output)->spec().tile_width, 64);
+    what.input = what.output;
+    what.output = file("again.tif");
+    ASSERT_TRUE(processTiles(what, nullptr));
+    Picture const once = readPicture(what.input, Depth::uint8);
+    EXPECT_EQ(readPicture(what.output, Depth::uint8).pixels, inOnePiece(what, nullptr, once).pixels);
+
+    // EXR holds colours with alpha multiplied in; the filter sees them without.
+    what = options("LABToRGBCPU", file("in.exr"), file("out.exr"));
+    Picture floats = scene(90, 70, 4, Depth::float32);
+    writePicture(what.input, floats);
+    floats = readPicture(what.input, Depth::float32);
+    ASSERT_TRUE(processTiles(what, nullptr));
+    Picture const result = readPicture(what.output, Depth::float32);
+    Picture const expected = inOnePiece(what, nullptr, floats);
+    auto const* const got = reinterpret_cast<float const*>(result.pixels.data());
+    auto const* const wanted = reinterpret_cast<float const*>(expected.pixels.data());
+    for (std::size_t i = 0; i < 4 * 90 * 70; ++i)
+        ASSERT_NEAR(got[i], wanted[i], 1e-5F * std::max(1.0F, std::abs(wanted[i]))) << i;
+}
+
+TEST_F(ProcessTiles, ComesToTheSameWithEverySizeOfTile) {
+    Picture const picture = scene(301, 219, 3, Depth::uint8);
+    for (int const size : {16, 100, 4096}) {
+        TileOptions what = options("FastBilateralBlur", "", "", {{"spatialSigma", "3,3"}});
+        what.tile = size;
+        EXPECT_EQ(difference(what, nullptr, picture), 0) << size;
+    }
+}
+
+TEST_F(ProcessTiles, LeavesNothingAfterAFailure) {
+    writePicture(file("in.tif"), scene(300, 300, 3, Depth::uint8));
+    fs::resize_file(file("in.tif"), fs::file_size(file("in.tif")) / 2);
+    std::ofstream(file("out.tif")) << "what was there";
+    EXPECT_THROW(static_cast<void>(
+                     processTiles(options("FastBilateralBlur", file("in.tif"), file("out.tif")), nullptr)),
+                 PictureError);
+    EXPECT_EQ(fs::file_size(file("out.tif")), 14U);
+    EXPECT_EQ(std::distance(fs::directory_iterator(fs::path(file("in.tif")).parent_path()),
+                            fs::directory_iterator()),
+              2);
+}
+
+} // namespace
+} // namespace example
