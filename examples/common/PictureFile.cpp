@@ -144,6 +144,15 @@ std::vector<float> withoutAlpha(std::vector<float> const& pixels, std::size_t ch
     return result;
 }
 
+// The ICC profile that stands in the file.
+std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec) {
+    auto const* attribute = spec.find_attribute("ICCProfile");
+    if (!attribute || attribute->type().basetype != OIIO::TypeDesc::UINT8)
+        return {};
+    auto const* bytes = static_cast<unsigned char const*>(attribute->data());
+    return {bytes, bytes + attribute->datasize()};
+}
+
 } // namespace
 
 Depth depthOfFile(std::string const& path) {
@@ -164,6 +173,7 @@ Picture readPicture(std::string const& path, Depth depth) {
     if (picture.hasAlpha() && spec.get_int_attribute("oiio:UnassociatedAlpha") == 0)
         changeAlpha(values, picture.channels, true);
     floatsToPicture(values, picture);
+    picture.profile = profileOf(spec);
     return picture;
 }
 
