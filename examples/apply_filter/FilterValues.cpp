@@ -1,9 +1,13 @@
 #include "apply_filter/FilterValues.h"
 
+#include "orvo/colour_engine/ProfileCodes.h"
 #include "orvo/filter_graph/FilterGraph.h"
 
+#include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <cstdint>
+#include <cstdio>
 #include <cstring>
 #include <sstream>
 #include <type_traits>
@@ -181,6 +185,40 @@ bool withType(FG::DataItemBase::teType type, Operation operation) {
     }
 }
 
+// Whether the parameter's number is the code of a colour space.
+bool isProfileCode(FG::ParameterBase const& parameter) {
+    std::string const suffix = "Profile";
+    std::string const& name = parameter.name();
+    return parameter.type() == FG::DataItemType<int>::value && name.size() > suffix.size() &&
+           name.compare(name.size() - suffix.size(), suffix.size(), suffix) == 0;
+}
+
+// Up to four characters, filled up with spaces, or a number. Four characters are always a code: "2020" is
+// one.
+bool parseProfileCode(std::string const& text, int& code) {
+    std::uint32_t number = 0;
+    bool const hexadecimal = text.size() > 2 && text[0] == '0' && (text[1] == 'x' || text[1] == 'X');
+    char const* const begin = text.data() + (hexadecimal ? 2 : 0);
+    char const* const last = text.data() + text.size();
+    auto const [end, error] = std::from_chars(begin, last, number, hexadecimal ? 16 : 10);
+    bool const isNumber = error == std::errc() && end == last && (hexadecimal || text.size() != 4);
+    if (!isNumber) {
+        if (text.empty() || text.size() > 4)
+            return false;
+        char characters[5] = "    ";
+        std::copy(text.begin(), text.end(), characters);
+        number = ORVO::ColourEngine::profileCode(characters);
+    }
+    code = static_cast<int>(number);
+    return true;
+}
+
+std::string profileCodeText(int code) {
+    char text[16];
+    std::snprintf(text, sizeof text, "0x%08x", static_cast<unsigned>(code));
+    return text;
+}
+
 template <typename T>
 bool isOutside(T const& value, FG::ParameterBase const& parameter) {
     if constexpr (!std::is_trivially_copyable_v<T>) {
@@ -214,6 +252,8 @@ std::string typeName(FG::ParameterBase const& parameter) {
 }
 
 std::string valueText(FG::ParameterBase const& parameter, std::string const& item) {
+    if (item.empty() && isProfileCode(parameter))
+        return profileCodeText(parameter.as<int>().value());
     std::string text;
     withType(parameter.type(), [&](auto const& sample) {
         using T = std::decay_t<decltype(sample)>;
@@ -230,6 +270,13 @@ std::string setValue(FG::IFilter& filter, std::string const& name, std::string c
     if (!parameter)
         throw ValueError("The filter \"" + filter.identifier().name() + "\" has no parameter \"" + name +
                          "\"");
+    if (int code = 0; isProfileCode(*parameter)) {
+        if (!parseProfileCode(text, code))
+            throw ValueError("The parameter \"" + name + "\" is a colour space, which \"" + text +
+                             "\" is not: four characters or a number");
+        parameter->as<int>().setValue(code);
+        return {};
+    }
     std::string warning;
     bool parsed = false;
     bool const known = withType(parameter->type(), [&](auto sample) {

@@ -24,9 +24,11 @@ public:
 [[nodiscard]] std::string valueText(ORVO::FilterGraph::ParameterBase const& parameter,
                                     std::string const& item = "");
 
-/// Sets the filter's parameter of that name from text. Bounds inform, they do not forbid: a value outside its
-/// interval is set, and the result is a line that says so, else empty. Throws ValueError for an unknown
-/// parameter and for text that is no value of its type, with the filter as it was.
+/// Sets the filter's parameter of that name from text. A colour space (a number whose name ends in "Profile")
+/// is given as its code of four characters, shorter ones meaning spaces behind, or as a number. Bounds
+/// inform, they do not forbid: a value outside its interval is set, and the result is a line that says so,
+/// else empty. Throws ValueError for an unknown parameter and for text that is no value of its type, with the
+/// filter as it was.
 [[nodiscard]] std::string setValue(ORVO::FilterGraph::IFilter& filter, std::string const& name,
                                    std::string const& text);
 

@@ -124,16 +124,27 @@ bool runOnGL(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, 
     return true;
 }
 
-// Filters on the CPU compute in 8-bit or float, in the precision of the image that the graph ends in: 16-bit
-// images go into a float graph through the engine's converter, and an empty graph brings the result back to
-// 16 bits.
-bool runSixteenBitsOnCPU(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, Picture& result,
-                         FrameSettings const& settings) {
+// Most filters on the CPU compute in 8-bit or float, in the precision of the image that the graph ends in:
+// 16-bit images go into a float graph through the engine's converter, and an empty graph brings the result
+// back to 16 bits.
+bool runSixteenBitsThroughFloat(std::shared_ptr<FG::IFilter> const& filter, Picture const& source,
+                                Picture& result, FrameSettings const& settings) {
     Picture floats(result.width, result.height, result.channels, Depth::float32);
     if (!runGraph(Graph(source, {createFilterNamed("ConvertToSIMDOptimized"), filter}, floats), floats.depth,
                   settings))
         return false;
     return runGraph(Graph(floats, {}, result), result.depth, FrameSettings());
+}
+
+// Found out by a frame of a few pixels.
+bool takesSixteenBits(std::shared_ptr<FG::IFilter> const& filter) {
+    Picture const source(4, 4, 4, Depth::uint15_1);
+    Picture result(4, 4, 4, Depth::uint15_1);
+    try {
+        return runGraph(Graph(source, {filter}, result), result.depth, FrameSettings());
+    } catch (std::exception const&) {
+        return false;
+    }
 }
 
 } // namespace
@@ -142,8 +153,8 @@ bool runFrames(std::shared_ptr<FG::IFilter> const& filter, Picture const& source
                FrameSettings const& settings) {
     if (settings.context)
         return runOnGL(filter, source, result, settings);
-    if (source.depth == Depth::uint15_1)
-        return runSixteenBitsOnCPU(filter, source, result, settings);
+    if (source.depth == Depth::uint15_1 && !takesSixteenBits(filter))
+        return runSixteenBitsThroughFloat(filter, source, result, settings);
     return runGraph(Graph(source, {filter}, result), source.depth, settings);
 }
 

@@ -11,6 +11,8 @@ Runs one filter over a picture (PNG, JPEG, TIFF or EXR, 1 to 4 channels).
   --filter NAME        the filter to run
   --target TARGET      cpu (the default), or gl: OpenGL in a context without a window
   --set NAME=VALUE     a parameter; vectors as numbers with commas: --set spatialSigma=10,10
+                       colour spaces as four characters or a number: --set srcProfile=sRGB. Where the file
+                       has an ICC profile, that is the source unless srcProfile is set
   --precision DEPTH    8, 16 or 32f: what the graph works with; that of the file by default. On gl 16 and 32f
                        both work in 16-bit floats
   --threads N          number of threads; all by default

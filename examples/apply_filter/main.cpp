@@ -1,4 +1,5 @@
 // apply_filter: one filter over a picture file. See Options.cpp for the command line.
+#include "apply_filter/FileProfile.h"
 #include "apply_filter/FilterList.h"
 #include "apply_filter/FilterValues.h"
 #include "apply_filter/FrameRunner.h"
@@ -37,7 +38,8 @@ bool runFramesOfFilter(std::shared_ptr<ORVO::FilterGraph::IFilter> const& filter
     try {
         return example::runFrames(filter, source, result, settings);
     } catch (std::exception const&) {
-        if (example::runsOn(settings.context, filter))
+        // Asked of another one of its kind: this one's values may be what failed.
+        if (example::runsOn(settings.context, example::createFilterNamed(filter->identifier().name())))
             throw;
         throw example::UsageError("The filter \"" + filter->identifier().name() + "\" does not run on " +
                                   (settings.context ? "gl" : "cpu") + " (--list shows the targets)");
@@ -61,6 +63,7 @@ int applyFilter(example::Options const& options, ORVO::OGL::Context const* conte
     }
     example::checkWritable(options.output);
     example::Picture const file = example::readPicture(options.input, depthFor(options));
+    example::useProfileOfFile(*filter, file, options.values);
     example::Picture const source = example::widenedToColour(file);
     example::Picture result(source.width, source.height, source.channels, source.depth);
     if (!runFramesOfFilter(filter, source, result, {context, options.repeat, options.async})) {

@@ -22,6 +22,8 @@ struct Picture {
     std::size_t channels = 0;
     Depth depth = Depth::uint8;
     std::vector<unsigned char> pixels;
+    std::vector<unsigned char>
+        profile; ///< the ICC profile that stands in the file; empty where there is none
 
     Picture() = default;
     Picture(std::size_t width, std::size_t height, std::size_t channels, Depth depth);

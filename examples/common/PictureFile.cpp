@@ -138,6 +138,19 @@ void TemporaryFile::takePlace() {
         throw PictureError("Cannot write " + target_ + ": " + failure.message());
 }
 
+namespace {
+
+// The ICC profile that stands in the file.
+std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec) {
+    auto const* attribute = spec.find_attribute("ICCProfile");
+    if (!attribute || attribute->type().basetype != OIIO::TypeDesc::UINT8)
+        return {};
+    auto const* bytes = static_cast<unsigned char const*>(attribute->data());
+    return {bytes, bytes + attribute->datasize()};
+}
+
+} // namespace
+
 bool hasAssociatedAlpha(OIIO::ImageSpec const& spec) {
     bool const hasAlpha = spec.nchannels == 2 || spec.nchannels == 4;
     return hasAlpha && spec.get_int_attribute("oiio:UnassociatedAlpha") == 0;
@@ -162,6 +175,7 @@ Picture readPicture(std::string const& path, Depth depth) {
     if (hasAssociatedAlpha(spec))
         changeAlpha(values, picture.channels, true);
     floatsToPicture(values, picture);
+    picture.profile = profileOf(spec);
     return picture;
 }
 

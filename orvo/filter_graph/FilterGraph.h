@@ -9,6 +9,7 @@
 /// (`Connect`), create a processor on the output adapter (`createProcessor`), and ask it for frames.
 
 #include "orvo/filter_graph/filters/Bilateral.h"
+#include "orvo/filter_graph/filters/ColorspaceTransformer.h"
 #include "orvo/filter_graph/filters/StandardFilters.h"
 #include "orvo/filter_graph/impl/Connect.h"
 #include "orvo/filter_graph/impl/CreateProcessor.h"

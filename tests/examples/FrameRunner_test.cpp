@@ -196,6 +196,8 @@ TEST_F(FrameRunner, TellsOnWhichTargetAFilterRuns) {
         EXPECT_TRUE(runsOn(nullptr, createFilterNamed(name))) << name;
         EXPECT_FALSE(runsOn(context(), createFilterNamed(name))) << name;
     }
+    EXPECT_TRUE(runsOn(nullptr, createFilterNamed("ColorspaceTransformer")));
+    EXPECT_TRUE(runsOn(context(), createFilterNamed("ColorspaceTransformer")));
     for (char const* name : {"premultiply", "unpremultiply", "scaleUp1channel", "scaleUp2channel",
                              "scaleUp3channel", "scaleUp4channel", "scaleDown1channel", "scaleDown2channel",
                              "scaleDown3channel", "scaleDown4channel"}) {

@@ -73,6 +73,23 @@ for filter in FastBilateralBlur FastBilateralFilter; do
     accepted --target gl --filter $filter --set spatialSigma=4,4 --set colorize=true "$photograph" "$scratch/gl_blur.png"
     cmp -s "$photograph" "$scratch/gl_blur.png" && fail "$filter changes nothing on gl"
 done
+# Colour there and back in 16 bits; codes as characters and as numbers.
+colour=(--filter ColorspaceTransformer --precision 16)
+for target in cpu gl; do
+    accepted "${colour[@]}" --target $target --set srcProfile=sRGB --set dstProfile=0x41533938 \
+        "$photograph" "$scratch/wide_$target.tif"
+    accepted "${colour[@]}" --target $target --set srcProfile=1095973176 --set dstProfile=sRGB \
+        "$scratch/wide_$target.tif" "$scratch/back_$target.tif"
+    [ -s "$scratch/back_$target.tif" ] || fail "no back_$target.tif"
+done
+accepted --filter ColorspaceTransformer --set srcProfile=sRGB --set dstProfile=P3 "$photograph" "$scratch/p3.png"
+cmp -s "$photograph" "$scratch/p3.png" && fail "sRGB to P3 changes nothing"
+refused 2 'is a colour space, which "nonsense" is not' --filter ColorspaceTransformer --set srcProfile=nonsense \
+    "$photograph" "$scratch/out.png"
+refused 1 'Cannot make src profile from code' --filter ColorspaceTransformer --set srcProfile=none \
+    "$photograph" "$scratch/out.png"
+refused 1 'Cannot make dst profile from code' --filter ColorspaceTransformer --set dstProfile=none \
+    "$photograph" "$scratch/out.png"
 
 accepted --list
 grep -A1 '^FastBilateralBlur' "$scratch/stdout" | grep -q 'runs on cpu, gl' || fail "targets of FastBilateralBlur"
@@ -80,6 +97,7 @@ grep -A1 '^FastBilateralFilter' "$scratch/stdout" | grep -q 'runs on cpu, gl' ||
 for line in 'FastBilateralBlur  (Motion Loft, Norvane Works, version 1)' \
     'spatialSigma  float2  default 10,10  from 0.1,0.1 to 100,100' 'rangeSigma  float  default 0.15' \
     'colorize  bool  default false' 'input src' 'RGBToLABCPU' 'SimpleBilateralCPU' \
+    'ColorspaceTransformer  (com.norvane.orvo, Norvane, version 1)' 'srcProfile  int  default 0x41533938' \
     'premultiply  (ORVO, Norvane, version 1)' 'runs on cpu' 'runs on gl' \
     'MirelCheckerBoardGPU  (ImageFlow, Norvane, version 1)' 'checkerSize  float2  default 16,16' \
     'MirelGamutComposite  (ImageFlow, Norvane, version 1)' 'input GamutTestResultInputImage' \

@@ -46,10 +46,11 @@ void storeWord(unsigned char* pSample, int value) {
     std::memcpy(pSample, &word, sizeof(word));
 }
 
+__m128i entryPair(float const* pEntry) { return _mm_loadl_epi64(reinterpret_cast<__m128i const*>(pEntry)); }
+
 /// Two neighbouring entries for each of two steps.
 __m128 entryPairs(float const* pTable, std::int32_t first, std::int32_t second) {
-    __m128d const pair = _mm_load_sd(reinterpret_cast<double const*>(pTable + first));
-    return _mm_castpd_ps(_mm_loadh_pd(pair, reinterpret_cast<double const*>(pTable + second)));
+    return _mm_castsi128_ps(_mm_unpacklo_epi64(entryPair(pTable + first), entryPair(pTable + second)));
 }
 
 void interpolateWords(unsigned char* pSamples, std::ptrdiff_t nColumnBytes, LightBlock const& block,

@@ -181,9 +181,11 @@ VantleResult reallocProc(void** pBlock, std::size_t size) {
 }
 
 VantleResult allocProc(void** pOut, std::size_t size) {
+    if (pOut == nullptr) {
+        return engineFailure(EngineFailure::InvalidArgument);
+    }
     void* pBlock = nullptr;
-    VantleResult const result =
-        pOut != nullptr ? reallocProc(&pBlock, size) : engineFailure(EngineFailure::InvalidArgument);
+    VantleResult const result = reallocProc(&pBlock, size);
     if (result == 0) {
         *pOut = pBlock;
     }

@@ -57,7 +57,7 @@ std::optional<ShaperTags> readGrayTags(cmsHPROFILE pProfile) {
 }
 
 std::optional<ShaperTags> readTags(Profile const& profile) {
-    cmsHPROFILE const pProfile = profile.handle();
+    void* const pProfile = profile.handle();
     if (profile.isGray()) {
         return readGrayTags(pProfile);
     }

@@ -75,7 +75,7 @@ bool describesDevice(cmsHPROFILE pProfile) {
 
 cmsContext lcmsContext() {
     // Never deleted: profiles that live as long as the process belong to it.
-    static cmsContext const pContext = cmsCreateContext(nullptr, nullptr);
+    static auto* const pContext = cmsCreateContext(nullptr, nullptr);
     return pContext;
 }
 

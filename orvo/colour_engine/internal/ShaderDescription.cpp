@@ -69,7 +69,7 @@ std::string addCurve(ShaderParameters& aParameters, std::string const& sName, st
 }
 
 std::string addMatrix(ShaderParameters& aParameters, std::array<double, 9> const& aMatrix) {
-    std::string const sName = "orvoMatrix";
+    std::string sName = "orvoMatrix";
     _t_Vantle_ShaderParameterData record{};
     record.kind = _t_Vantle_ShaderParameterData::KIND_MATRIX_3X3;
     std::vector<float> aColumns;

@@ -9,7 +9,6 @@
 #include "orvo/colour_engine/internal/TransformResolver.h"
 
 #include <algorithm>
-#include <cstring>
 #include <iterator>
 #include <stdexcept>
 #include <string>
@@ -59,7 +58,7 @@ VantleResult stringASCIIProc(VantleString* pString, char* pBuffer, std::uint32_t
         }
         *pSize = static_cast<std::uint32_t>(spText->size());
         if (pBuffer != nullptr) {
-            std::memcpy(pBuffer, spText->data(), std::min<std::size_t>(capacity, spText->size()));
+            std::copy_n(spText->data(), std::min<std::size_t>(capacity, spText->size()), pBuffer);
         }
         return VantleResult{0};
     });

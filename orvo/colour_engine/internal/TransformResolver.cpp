@@ -69,12 +69,14 @@ bool agrees(ResolvedTransform const& transform, ExactRoad const& road) {
         Colour const theirs = road(colour);
         return std::equal(ours.begin(), ours.end(), theirs.begin(), isSameSample);
     };
-    constexpr int nLattice = 5;
-    for (int index = 0; index < nLattice * nLattice * nLattice; ++index) {
-        constexpr double step = 1.0 / (nLattice - 1);
-        if (!same({step * (index % nLattice), step * (index / nLattice % nLattice),
-                   step * (index / nLattice / nLattice)})) {
-            return false;
+    constexpr std::array aLevels = {0.0, 0.25, 0.5, 0.75, 1.0};
+    for (double const red : aLevels) {
+        for (double const green : aLevels) {
+            for (double const blue : aLevels) {
+                if (!same({red, green, blue})) {
+                    return false;
+                }
+            }
         }
     }
     constexpr int nGreys = 64;

@@ -2,6 +2,7 @@
 
 #include "orvo/core/Check.h"
 #include "orvo/filter_graph/filters/Bilateral.h"
+#include "orvo/filter_graph/filters/ColorspaceTransformer.h"
 #include "orvo/filter_graph/filters/Premultiply.h"
 #include "orvo/filter_graph/filters/Scale15_1_to_16.h"
 #include "orvo/filter_graph/filters/Scale16_to_15_1.h"
@@ -64,8 +65,9 @@ void appendScalingFilters(std::vector<std::shared_ptr<IFilter>>& prototypes,
 std::vector<std::shared_ptr<IFilter>> standardPrototypes() {
     std::vector<std::shared_ptr<IFilter>> prototypes;
     prototypes.push_back(std::make_shared<Internal::Bilateral>());
+    prototypes.push_back(std::make_shared<Internal::Filters::ColorspaceTransformer>());
     for (char const* name : {"FastBilateralFilter", "SimpleBilateralCPU", "RGBToLABCPU", "LABToRGBCPU",
-                             "MirelCheckerBoardGPU", "MirelGamutComposite"})
+                             "VantleFilterCPU", "MirelCheckerBoardGPU", "MirelGamutComposite"})
         prototypes.push_back(std::make_shared<Internal::ImageFlowFilterWrapper>(imageFlowIdentifier(name)));
     prototypes.push_back(std::make_shared<Internal::ImageFlowFilter<ConvertToSIMDOptimized>>(
         imageFlowIdentifier("ConvertToSIMDOptimized"), ORVO_TARGET_CPU));

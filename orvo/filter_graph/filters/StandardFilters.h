@@ -10,11 +10,16 @@ namespace ORVO::FilterGraph {
 /// name space and vendor "Motion Loft", "Norvane Works":
 /// - "FastBilateralBlur": the bilateral filter that suits the processing mode, the grid on either target.
 ///
+/// name space and vendor "com.norvane.orvo", "Norvane":
+/// - "ColorspaceTransformer": from one colour space to another, by the node that suits the processing mode.
+///
 /// name space and vendor "ImageFlow", "Norvane":
 /// - "FastBilateralFilter": the bilateral grid node by itself, of OpenGL where the library was started with a
 ///   context, else of the CPU. Of OpenGL it filters colours as they stand, without regard to alpha,
 /// - "SimpleBilateralCPU": the direct bilateral filter,
 /// - "RGBToLABCPU", "LABToRGBCPU": conversion of sRGB to scaled Lab and back,
+/// - "VantleFilterCPU": the node of colour transforms on the CPU, for transforms that the host has made
+///   ("VantleFilterGPU" is the one of Library::insertORVOFilters),
 /// - "ConvertToSIMDOptimized": 8-bit or 16-bit integers to 32-bit float,
 /// - "ConvertFromSIMDOptimized": 32-bit float to the depth of the output image,
 /// - "MirelCheckerBoardGPU", "MirelGamutComposite", "MirelToneMappingGPU": previews for the screen, on OpenGL
@@ -27,9 +32,10 @@ namespace ORVO::FilterGraph {
 ///   of `CHANNEL_TYPE_UINT15_1` meet a graph on OpenGL. On textures of two channels the result has four.
 ///
 /// All have version 1. The simple bilateral and Lab filters and the converters run on the CPU alone. Those of
-/// the CPU read and write 8-bit and float images, and every filter works in the depth of the image that its
-/// graph ends in. A host with 16-bit images puts "ConvertToSIMDOptimized" in front of them, ends the graph in
-/// a float image, and brings that back to 16 bits with a graph that has no filter between input and output.
+/// the CPU read and write 8-bit and float images (colour transforms 8-bit and 16-bit ones), and every filter
+/// works in the depth of the image that its graph ends in. A host with 16-bit images puts
+/// "ConvertToSIMDOptimized" in front of the others, ends the graph in a float image, and brings that back to
+/// 16 bits with a graph that has no filter between input and output.
 ///
 /// Library::initialize does not call this.
 /// @throws Exception if one of them is registered already, InternalException "isInitialized()" while the

@@ -9,6 +9,20 @@ namespace ORVO::ImageFlow {
 
 namespace {
 
+/// The reference that came with a new error object, for a scope.
+class NewErrorReference {
+public:
+    NewErrorReference(QuorErrorReleaseProc pRelease, QuorError* pError) noexcept
+        : pRelease_(pRelease), pError_(pError) {}
+    ~NewErrorReference() { pRelease_(pError_); }
+    NewErrorReference(NewErrorReference const&) = delete;
+    NewErrorReference& operator=(NewErrorReference const&) = delete;
+
+private:
+    QuorErrorReleaseProc pRelease_;
+    QuorError* pError_;
+};
+
 [[noreturn]] void throwMissingProcedure() {
     auto* const pNewError = freshProcedure<QuorNewErrorProc>(quorErrorInterface(), QUOR_ERROR_NEW_ERROR);
     auto* const pRelease = freshProcedure<QuorErrorReleaseProc>(quorErrorInterface(), QUOR_ERROR_RELEASE);
@@ -16,9 +30,8 @@ namespace {
     if (pNewError == nullptr || pRelease == nullptr || pNewError(&pError, "", "Quor") != 0) {
         throw Quor_T_MT::CQuorError("Missing Interface");
     }
-    Quor_T_MT::CQuorError const error(pError);
-    pRelease(pError);
-    throw error;
+    NewErrorReference const reference(pRelease, pError);
+    throw Quor_T_MT::CQuorError(pError);
 }
 
 } // namespace

@@ -29,10 +29,12 @@ struct StandardFilter {
 
 constexpr StandardFilter standardFilters[] = {
     {"FastBilateralBlur", "Motion Loft", "Norvane Works", "src", true},
+    {"ColorspaceTransformer", "com.norvane.orvo", "Norvane", "src", false},
     {"FastBilateralFilter", "ImageFlow", "Norvane", "InputImage", true},
     {"SimpleBilateralCPU", "ImageFlow", "Norvane", "InputImage", true},
     {"RGBToLABCPU", "ImageFlow", "Norvane", "InputImage", false},
     {"LABToRGBCPU", "ImageFlow", "Norvane", "InputImage", false},
+    {"VantleFilterCPU", "ImageFlow", "Norvane", "InputImage", false},
     {"MirelCheckerBoardGPU", "ImageFlow", "Norvane", nullptr, false},
     {"MirelGamutComposite", "ImageFlow", "Norvane", nullptr, false},
     {"ConvertToSIMDOptimized", "ImageFlow", "Norvane", "input", false},

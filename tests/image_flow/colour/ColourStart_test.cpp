@@ -15,7 +15,11 @@
 #include "tests/support/ImageFlowLayers.h"
 
 #include <array>
+#include <atomic>
 #include <iterator>
+#include <string>
+#include <thread>
+#include <vector>
 
 namespace {
 
@@ -78,6 +82,74 @@ TEST(ColourStart, AStrictLoadFailsWithAnErrorOfTheEngines) {
     std::size_t const nErrors = ColourEngine::engineStatistics().nErrors;
     EXPECT_THROW(table.load(), Quor_T_MT::CQuorError);
     EXPECT_EQ(nErrors, ColourEngine::engineStatistics().nErrors);
+}
+
+template <typename Procedure>
+Procedure layerProcedure(char const* pName) {
+    return reinterpret_cast<Procedure>(ColourEngine::embeddedEngine()("Quor", pName, pName));
+}
+
+TEST(ColourStart, TheEmbeddedEngineMayGoAndComeBackToo) {
+    struct Row {
+        char const* pSelector;
+        char const* pProcName;
+    };
+    constexpr std::array<Row, 6> aRows = {{{"NewShader", "VantleNewShaderProc"},
+                                           {"Family", "VantleFamilyProc"},
+                                           {"Strings", "VantleStringsProc"},
+                                           {"NumParameters", "VantleNumParametersProc"},
+                                           {"Parameter", "VantleParameterProc"},
+                                           {"CopyData", "VantleCopyDataProc"}}};
+    ORVO::Test::ImageFlowLayers const layers;
+    std::uint32_t count = 0;
+    EXPECT_NE(0u, CVantleShader::NumParameters(nullptr, &count));
+    std::array<void*, aRows.size()> aProcedures{};
+    for (std::size_t i = 0; i < aRows.size(); ++i) {
+        aProcedures[i] =
+            ColourEngine::embeddedEngine()("VantleShaderInterface", aRows[i].pSelector, aRows[i].pProcName);
+    }
+    EXPECT_EQ(
+        0u, layerProcedure<QuorUnregisterInterfaceProc>("QuorUnregisterInterface")("VantleShaderInterface"));
+    EXPECT_THROW(CVantleShader::NumParameters(nullptr, &count), TrelException);
+    EXPECT_TRUE(CVantle::isAvailable()) << "the other interface stays";
+    for (std::size_t i = 0; i < aRows.size(); ++i) {
+        EXPECT_EQ(0u, layerProcedure<QuorRegisterProcAddressProc>("QuorRegisterProcAddress")(
+                          "VantleShaderInterface", aRows[i].pSelector, aRows[i].pProcName, aProcedures[i]));
+    }
+    EXPECT_NE(0u, CVantleShader::NumParameters(nullptr, &count));
+}
+
+TEST(ColourStart, TablesAreLoadedAgainUnderManyThreads) {
+    ORVO::Test::ImageFlowLayers const layers;
+    auto* const pRegister = layerProcedure<QuorRegisterProcAddressProc>("QuorRegisterProcAddress");
+    auto* const pUnregister = layerProcedure<QuorUnregisterInterfaceProc>("QuorUnregisterInterface");
+    VantleTransform* pKept = nullptr; // worked out once
+    ASSERT_EQ(0u, CVantle::makeTransform(&pKept, ColourEngine::PROFILE_SRGB, ColourEngine::PROFILE_BT_2020));
+    std::atomic<int> nFailed{0};
+    auto const work = [&nFailed] {
+        for (int i = 0; i < 200; ++i) {
+            VantleTransform* pTransform = nullptr;
+            nFailed += CVantle::makeTransform(&pTransform, ColourEngine::PROFILE_SRGB,
+                                              ColourEngine::PROFILE_BT_2020) == 0
+                           ? 0
+                           : 1;
+            nFailed += CVantle::UnReferenceTransform(pTransform) == 0 ? 0 : 1;
+        }
+    };
+    std::vector<std::thread> aThreads;
+    for (int i = 0; i < 4; ++i) {
+        aThreads.emplace_back(work);
+    }
+    int procedure = 0;
+    for (int i = 0; i < 100; ++i) {
+        EXPECT_EQ(0u, pRegister("PaintInterface", "Draw", "DrawProc", &procedure));
+        EXPECT_EQ(0u, pUnregister("PaintInterface"));
+    }
+    for (std::thread& thread : aThreads) {
+        thread.join();
+    }
+    EXPECT_EQ(0, nFailed);
+    EXPECT_EQ(0u, CVantle::UnReferenceTransform(pKept));
 }
 
 TEST(ColourStart, WithoutAnEngineAllElseStarts) {

@@ -1,0 +1,240 @@
+// The pass of a colour transform on OpenGL against a shader that hands its input on: 1920 x 1080 pixels, in a
+// context without a display. The label names the driver.
+//
+// A frame is a controller's, in which the source has changed and all runs; it ends when the driver has done
+// with it. The two run by turns, so that both see the same machine. The counter of_pass_through is the time
+// of the transform's frame in times of the other's. of_matrix is the same against a shader that multiplies
+// colours by a matrix in floats: some drivers have a road of their own for shaders that only copy bytes.
+// shaders_described, programs_linked and textures_made are sums over all measured frames of the transform,
+// whose codes stay: they are 0.
+#include "orvo/colour_engine/ColourEngine.h"
+#include "orvo/core/Core.h"
+#include "orvo/data_flow/DataFlow.h"
+#include "orvo/image_flow/ImageFlow.h"
+#include "orvo/image_flow/filters/VantleFilterGPU.h"
+#include "orvo/image_flow/sources/ImageGPUInput.h"
+#include "orvo/image_flow/sources/ImageGPUOutput.h"
+#include "orvo/image_runtime/ImageRuntime.h"
+#include "orvo/ogl/OGL.h"
+
+#include "benchmarks/support/Timing.h"
+
+#include <benchmark/benchmark.h>
+#include <epoxy/egl.h>
+#include <epoxy/gl.h>
+
+#include <cmath>
+#include <memory>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace {
+
+using namespace ORVO;
+
+constexpr int nWidth = 1920;
+constexpr int nHeight = 1080;
+constexpr std::size_t nValues = std::size_t(4) * nWidth * nHeight;
+
+std::string shaderOf(char const* pExpression) {
+    return std::string("uniform vec2 _outOffset;\n"
+                       "uniform vec2 _outPixelExtent;\n"
+                       "uniform sampler2D src_sampler;\n"
+                       "uniform vec2 src_offset;\n"
+                       "uniform vec2 src_delta;\n"
+                       "void main() {\n"
+                       "    vec4 src = texture2D(src_sampler, "
+                       "(gl_TexCoord[0].xy*_outPixelExtent+_outOffset-src_offset)*src_delta);\n"
+                       "    gl_FragData[0] = ") +
+           pExpression + ";\n}\n";
+}
+
+/// Counts the calls of an entry point.
+template <auto* pSlot, typename Function = std::remove_pointer_t<decltype(pSlot)>>
+struct Counted;
+template <auto* pSlot, typename... Arguments>
+struct Counted<pSlot, void (*)(Arguments...)> {
+    static inline void (*pOriginal)(Arguments...) = nullptr;
+    static inline long nCalls = 0;
+
+    static void call(Arguments... arguments) {
+        ++nCalls;
+        pOriginal(arguments...);
+    }
+    static void install(char const* pName) {
+        pOriginal = reinterpret_cast<decltype(pOriginal)>(eglGetProcAddress(pName));
+        *pSlot = &call;
+    }
+};
+using Links = Counted<&epoxy_glLinkProgram>;
+using Textures = Counted<&epoxy_glGenTextures>;
+
+/// All layers up to the nodes, on a context of their own, which is current.
+class Layers {
+public:
+    Layers() : pContext_(makeContext()), oRuntime_(pContext_.get(), VideoMemory::Configuration()) {}
+
+    OGL::Context const& context() const { return *pContext_; }
+
+private:
+    static std::unique_ptr<OGL::ContextOffscreen> makeContext() {
+        auto pContext = OGL::ContextOffscreen::createHeadless();
+        pContext->makeCurrent();
+        Links::install("glLinkProgram");
+        Textures::install("glGenTextures");
+        return pContext;
+    }
+
+    Core::AutoInitializer oCore_;
+    OGL::AutoInitializer oOGL_;
+    std::unique_ptr<OGL::ContextOffscreen> pContext_;
+    ImageRuntime::AutoInitializer oRuntime_;
+    DataFlow::AutoInitializer oDataFlow_;
+    ImageFlow::AutoInitializer oImageFlow_{true};
+};
+
+/// A shader over the input "src".
+class ExpressionFilter : public BasicGLShaderFilter {
+public:
+    explicit ExpressionFilter(char const* pExpression)
+        : BasicGLShaderFilter("expression", shaderOf(pExpression).c_str(), 4) {
+        addInput("src");
+    }
+};
+
+PositionExtentInPixelSpace frameRectangle() {
+    return PositionExtentInPixelSpace(ExtentInPixelSpace(nWidth, nHeight));
+}
+
+/// A source, one filter and a sink.
+class Pass {
+public:
+    Pass(OGL::Context const& context, std::unique_ptr<BasicGLShaderFilter> upFilter, bool bHalf)
+        : oImage_(frameRectangle(), bHalf ? ImageGPU::PIXEL_FORMAT_RGBA16F : ImageGPU::PIXEL_FORMAT_RGBA8,
+                  PixelExtentInWorldSpace(), true),
+          upFilter_(std::move(upFilter)) {
+        std::vector<unsigned char> aPixels(nValues);
+        for (std::size_t i = 0; i < aPixels.size(); ++i)
+            aPixels[i] = static_cast<unsigned char>(i * 7 + i / 4096);
+        oImage_.copyImageData(aPixels.data(), frameRectangle(), PixelExtentInWorldSpace(), GL_RGBA,
+                              GL_UNSIGNED_BYTE, 0);
+        oController_.setContextGPU(context);
+        oSource_.setImageGPUWithNoOwnership(&oImage_);
+        upFilter_->outputPrecisionHintParameter().setValue(bHalf ? ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT
+                                                                 : ImageFilter::OUTPUT_PRECISION_8_BIT_INT);
+        DataFlow::Connect(*upFilter_->imageInput(0), *oSource_.imageOutput());
+        DataFlow::Connect(*oSink_.imageInput(0), *upFilter_->imageOutput());
+        for (ImageFilter* pNode : std::initializer_list<ImageFilter*>{&oSource_, upFilter_.get(), &oSink_})
+            oController_.addNode(pNode);
+        oController_.setImageSink(oSink_);
+        oController_.computeRegions(pixelToWorldSpace(frameRectangle(), PixelExtentInWorldSpace()));
+    }
+    ~Pass() {
+        oController_.flushGraph();
+        upFilter_->disconnect();
+    }
+    Pass(Pass const&) = delete;
+    Pass& operator=(Pass const&) = delete;
+
+    void frame() {
+        oSource_.emit();
+        oController_.setDirtyState();
+        oController_.process();
+        glFinish();
+    }
+
+    std::vector<float> pixels() const {
+        std::vector<float> aPixels(nValues);
+        OGL::Texture2D const& texture = *oSink_.getImageGPU()->texture();
+        std::vector<float> aAll(4 * texture.width(0) * texture.height(0));
+        OGL::TextureUnit::Unit(0).bind(&texture);
+        glGetTexImage(GL_TEXTURE_2D, 0, GL_RGBA, GL_FLOAT, aAll.data());
+        OGL::TextureUnit::Unit(0).bind2DDefault();
+        for (std::size_t row = 0; row < nHeight; ++row)
+            std::copy_n(&aAll[4 * row * texture.width(0)], 4 * nWidth, &aPixels[4 * row * nWidth]);
+        return aPixels;
+    }
+
+private:
+    ImageFlowController oController_;
+    ImageGPU oImage_;
+    ImageGPUInput oSource_;
+    std::unique_ptr<BasicGLShaderFilter> upFilter_;
+    ImageGPUOutput oSink_;
+};
+
+/// sRGB to the wide gamut.
+VantleTransform* makeTransform() {
+    VantleTransform* pTransform = nullptr;
+    if (CVantle::makeTransform(&pTransform, ColourEngine::PROFILE_SRGB, ColourEngine::PROFILE_WIDE_GAMUT) !=
+        0)
+        throw std::runtime_error("no transform");
+    return pTransform;
+}
+
+void requireChange(std::vector<float> const& aBefore, std::vector<float> const& aAfter) {
+    double dMean = 0;
+    for (std::size_t i = 0; i < nValues; ++i)
+        dMean += std::abs(double(aBefore[i]) - double(aAfter[i])) / nValues;
+    if (dMean < 1e-3 || dMean > 0.2)
+        throw std::runtime_error("the transform does not do what it should");
+}
+
+void transform(benchmark::State& state, bool bHalf) {
+    Layers const layers;
+    VantleTransform* const pTransform = makeTransform();
+    {
+        auto upTransform = std::make_unique<VantleFilterGPU>();
+        upTransform->transform()->setValue(pTransform);
+        Pass transformed(layers.context(), std::move(upTransform), bHalf);
+        Pass passed(layers.context(), std::make_unique<ExpressionFilter>("src"), bHalf);
+        Pass multiplied(layers.context(),
+                        std::make_unique<ExpressionFilter>(
+                            "vec4(clamp(mat3(0.8,0.1,0.1,0.1,0.8,0.1,0.1,0.1,0.8)*src.rgb,0.0,1.0),src.a)"),
+                        bHalf);
+        for (int i = 0; i < 3; ++i) {
+            transformed.frame();
+            passed.frame();
+            multiplied.frame();
+        }
+        requireChange(passed.pixels(), transformed.pixels());
+        std::vector<double> aTransformed;
+        std::vector<double> aPassed;
+        std::vector<double> aMultiplied;
+        auto const nDescribed = ColourEngine::engineStatistics().nShadersDescribed;
+        long nLinks = 0;
+        long nTextures = 0;
+        for (auto _ : state) {
+            aPassed.push_back(Benchmarks::secondsOf([&] { passed.frame(); }));
+            aMultiplied.push_back(Benchmarks::secondsOf([&] { multiplied.frame(); }));
+            nLinks -= Links::nCalls;
+            nTextures -= Textures::nCalls;
+            aTransformed.push_back(Benchmarks::secondsOf([&] { transformed.frame(); }));
+            nLinks += Links::nCalls;
+            nTextures += Textures::nCalls;
+            state.SetIterationTime(aTransformed.back());
+        }
+        state.counters["of_pass_through"] =
+            Benchmarks::medianOf(aTransformed) / Benchmarks::medianOf(aPassed);
+        state.counters["of_matrix"] = Benchmarks::medianOf(aTransformed) / Benchmarks::medianOf(aMultiplied);
+        state.counters["shaders_described"] =
+            static_cast<double>(ColourEngine::engineStatistics().nShadersDescribed - nDescribed);
+        state.counters["programs_linked"] = static_cast<double>(nLinks);
+        state.counters["textures_made"] = static_cast<double>(nTextures);
+        state.SetItemsProcessed(static_cast<std::int64_t>(state.iterations()) * nWidth * nHeight);
+        state.SetLabel(reinterpret_cast<char const*>(glGetString(GL_RENDERER)));
+    }
+    CVantle::UnReferenceTransform(pTransform);
+}
+
+BENCHMARK_CAPTURE(transform, bytes, false)
+    ->Name("colour_gl/8_bit")
+    ->UseManualTime()
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(transform, halves, true)
+    ->Name("colour_gl/16_bit_float")
+    ->UseManualTime()
+    ->Unit(benchmark::kMillisecond);
+
+} // namespace

@@ -1,0 +1,22 @@
+#pragma once
+
+#include "common/Picture.h"
+
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace ORVO::FilterGraph {
+class IFilter;
+} // namespace ORVO::FilterGraph
+
+namespace example {
+
+/// Makes the ICC profile of the picture's file the source of a colour transform: it is registered with the
+/// engine, and "srcProfile" set to its code. Does nothing for filters without that parameter, for files
+/// without a profile, and where `values`, those of the command line, name a source. Throws ValueError for a
+/// profile that the engine cannot use.
+void useProfileOfFile(ORVO::FilterGraph::IFilter& filter, Picture const& file,
+                      std::vector<std::pair<std::string, std::string>> const& values);
+
+} // namespace example
