@@ -151,8 +151,8 @@ public:
         cmsCIExyYTRIPLE const primaries = {{0.64, 0.33, 1.0}, {0.21, 0.71, 1.0}, {0.15, 0.06, 1.0}};
         cmsToneCurve* const pGamma = cmsBuildGamma(nullptr, 563.0 / 256.0);
         std::array<cmsToneCurve*, 3> const aCurves = {pGamma, pGamma, pGamma};
-        cmsHPROFILE const pSource = cmsCreate_sRGBProfile();
-        cmsHPROFILE const pDestination = cmsCreateRGBProfile(&white, &primaries, aCurves.data());
+        cmsHPROFILE pSource = cmsCreate_sRGBProfile();
+        cmsHPROFILE pDestination = cmsCreateRGBProfile(&white, &primaries, aCurves.data());
         pTransform_ = cmsCreateTransform(pSource, format.nLcmsFormat_, pDestination, format.nLcmsFormat_,
                                          INTENT_PERCEPTUAL, 0);
         cmsCloseProfile(pDestination);

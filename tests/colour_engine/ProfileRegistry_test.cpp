@@ -90,6 +90,44 @@ TEST_F(ProfileRegistryTest, ATableProfileWorksInTheDirectionThatItHas) {
     EXPECT_EQ(0u, engine.UnReferenceProfile(pSRGB));
 }
 
+TEST_F(ProfileRegistryTest, TakesGreyProfiles) {
+    NothingLeft const nothingLeft;
+    Engine const engine;
+    cmsToneCurve* const pCurve = cmsBuildGamma(nullptr, 2.0);
+    Bytes const aBytes = bytesOf(cmsCreateGrayProfile(cmsD50_xyY(), pCurve));
+    cmsFreeToneCurve(pCurve);
+    registerProfile(iCode, aBytes.data(), aBytes.size());
+    VantleTransform* const pFrom = engine.transform(iCode, PROFILE_LINEAR_SRGB);
+    VantleTransform* const pTo = engine.transform(PROFILE_LINEAR_SRGB, iCode);
+    EXPECT_EQ(39, transformed(engine, pFrom, 100));
+    // sqrt(39 / 255) * 255 = 99.7
+    EXPECT_EQ(100, transformed(engine, pTo, 39));
+    EXPECT_EQ(0u, engine.UnReferenceTransform(pFrom));
+    EXPECT_EQ(0u, engine.UnReferenceTransform(pTo));
+}
+
+TEST_F(ProfileRegistryTest, SurvivesDamagedProfiles) {
+    std::uint32_t noise = 1;
+    auto const next = [&noise] { return noise = noise * 1664525U + 1013904223U; };
+    int nRefused = 0;
+    for (Bytes const& aGood : {bytesOf(ORVO::Test::gammaProfile(2.0)), ORVO::Test::tableSourceProfile()}) {
+        for (int i = 0; i < 100; ++i) {
+            Bytes aBytes = aGood;
+            for (int iByte = 0; iByte < 4; ++iByte) {
+                // Most of what can go wrong stands in the header, the table of tags and the heads of the
+                // first tags.
+                aBytes[(next() >> 8U) % 400] = static_cast<unsigned char>(next() >> 16U);
+            }
+            try {
+                registerProfile(iCode, aBytes.data(), aBytes.size());
+            } catch (ParameterException const&) {
+                ++nRefused;
+            }
+        }
+    }
+    EXPECT_GT(nRefused, 0);
+}
+
 TEST_F(ProfileRegistryTest, RefusesWhatIsNoProfileOfColoursAndKeepsTheOldOne) {
     Bytes const aGood = bytesOf(ORVO::Test::gammaProfile(2.0));
     registerProfile(iCode, aGood.data(), aGood.size());

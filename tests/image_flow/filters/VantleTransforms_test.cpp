@@ -6,6 +6,7 @@
 
 #include "orvo/colour_engine/ProfileCodes.h"
 #include "orvo/colour_engine/VantlePackingSpec.h"
+#include "orvo/colour_engine/internal/Applier.h"
 #include "orvo/colour_engine/internal/ResolvedTransform.h"
 #include "orvo/colour_engine/internal/ShaderDescription.h"
 #include "orvo/image_flow/colour/CVantle.h"
@@ -69,8 +70,9 @@ std::vector<T> colours(unsigned white) {
     return aValues;
 }
 
-template <typename T>
-std::vector<T> onCPU(std::vector<T> const& aColours, EngineTransform const& transform) {
+/// The colours, through a function that transforms packed pixels.
+template <typename T, typename Apply>
+std::vector<T> packed(std::vector<T> const& aColours, Apply const& apply) {
     std::vector<T> aResult(aColours.size());
     auto const specOf = [](std::vector<T> const& aPixels) {
         _t_Vantle_PackingSpec spec{};
@@ -86,8 +88,16 @@ std::vector<T> onCPU(std::vector<T> const& aColours, EngineTransform const& tran
     };
     _t_Vantle_PackingSpec const source = specOf(aColours);
     _t_Vantle_PackingSpec const destination = specOf(aResult);
-    EXPECT_EQ(0U, CVantle::ApplyGeneral(transform.get(), &source, &destination, nHeight, nWidth, nullptr));
+    apply(source, destination);
     return aResult;
+}
+
+template <typename T>
+std::vector<T> onCPU(std::vector<T> const& aColours, EngineTransform const& transform) {
+    return packed(aColours, [&](auto const& source, auto const& destination) {
+        EXPECT_EQ(0U,
+                  CVantle::ApplyGeneral(transform.get(), &source, &destination, nHeight, nWidth, nullptr));
+    });
 }
 
 template <typename T>
@@ -192,15 +202,15 @@ Internal::ColourCube bentCube() {
         double const g = double(i / n % n) / (n - 1);
         double const b = double(i / n / n) / (n - 1);
         for (double const value :
-             {0.7 * r * r + 0.3 * g * b, std::sqrt(g) * 0.5 + 0.5 * b * b * g, r * g * b})
+             {0.7 * r * r + 0.3 * g * b, std::sqrt(g) * 0.5 + 0.5 * b * b * g, 0.5 * b + 0.5 * r * g * b})
             cube.aValues_.push_back(float(value));
     }
     return cube;
 }
 
 TEST_F(VantleTransformsTest, CubesAreInterpolated) {
-    Internal::ResolvedTransform const resolved(bentCube());
-    Internal::ShaderDescription const description(resolved);
+    auto const spResolved = std::make_shared<Internal::ResolvedTransform const>(bentCube());
+    Internal::ShaderDescription const description(*spResolved);
     RecordingEngine::shader() = {description.entryPoint(), description.code(), {}};
     for (auto const& parameter : description.parameters())
         RecordingEngine::shader().aTables_.push_back({parameter.sName_, parameter.record_, parameter.aData_});
@@ -208,13 +218,21 @@ TEST_F(VantleTransformsTest, CubesAreInterpolated) {
     Texels const input = pictureOf(aColours, 32768.0);
     Road road(frameContext(), input, ImageGPU::PIXEL_FORMAT_RGBA32F,
               ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT);
-    Errors const errors = errorsOf(road.run(RecordingEngine::ownTransform()), input, [&](int x, int y) {
+    Texels const actual = road.run(RecordingEngine::ownTransform());
+    Errors const errors = errorsOf(actual, input, [&](int x, int y) {
         Pixel const c = input.at(x, y);
-        auto const e = resolved.evaluate({c[0], c[1], c[2]});
+        auto const e = spResolved->evaluate({c[0], c[1], c[2]});
         return Pixel{e[0], e[1], e[2], c[3]};
     });
     EXPECT_LE(errors.dLargest_, 1e-3);
     EXPECT_LE(errors.dMean_, 2e-4);
+    // The CPU interpolates in tetrahedra.
+    Internal::Applier const applier(spResolved);
+    auto const aOnCPU = packed(aColours, [&](auto const& source, auto const& destination) {
+        EXPECT_TRUE(applier.apply(source, destination, nHeight, nWidth));
+    });
+    Texels const expected = pictureOf(aOnCPU, 32768.0);
+    EXPECT_LE(errorsOf(actual, input, [&](int x, int y) { return expected.at(x, y); }).dLargest_, 1e-3);
 }
 
 } // namespace
