@@ -17,6 +17,12 @@ namespace {
 namespace FG = ORVO::FilterGraph;
 using FG::OptimizationOptions;
 
+// What a picture of a few pixels takes: the libraries that the program is linked to, threads.
+constexpr std::size_t program = std::size_t(140) << 20U;
+constexpr std::size_t softwareDriver = std::size_t(120) << 20U;
+// Unused textures that stay for the next frame.
+constexpr std::size_t unusedTextures = std::size_t(64) << 20U;
+
 FG::ImageDescriptor::Format formatOf(std::size_t channels, Depth depth) {
     return {channels, depth == Depth::uint8 ? FG::ImageDescriptor::CHANNEL_TYPE_UINT8
                                             : FG::ImageDescriptor::CHANNEL_TYPE_FLOAT32};
@@ -87,7 +93,7 @@ struct TileFrame::Graph {
         if (settings.context) {
             std::size_t const largest = std::numeric_limits<std::int32_t>::max();
             textures.setGPUMemoryLimit(static_cast<std::int32_t>(std::min(settings.textureMemory, largest)));
-            ORVO::TexturePool::Instance()->setMaximumPoolSize(settings.textureMemory / 4);
+            ORVO::TexturePool::Instance()->setMaximumPoolSize(unusedTextures);
             input->setImage(&textures.createTileAt(place, rectangleBetween(0, 0, 1, 1))->image());
         } else {
             input->setImage(&source);
@@ -154,13 +160,14 @@ void TileFrame::run(Band const& band, Rectangle const& computed, Picture& result
     graph.processor->processFrameEmbedded(graph.options);
 }
 
-PixelBytes TileFrame::pixelBytes() const {
+MemoryUse TileFrame::memoryUse() const {
     TileFrameSettings const& settings = graph_->settings;
     std::size_t const channel = bytesPerChannel(settings.depth);
     std::size_t const pixel = workingChannels(settings) * channel;
-    // On the CPU four planes of floats; on OpenGL the copy, its texture, and buffers of floats.
-    std::size_t const work = settings.context ? 2 * pixel + 48 : 16 + (settings.channels < 3 ? pixel : 0);
-    return {settings.channels * channel, pixel, work};
+    // On the CPU four planes of floats; on OpenGL the copy, its texture, and textures and buffers of floats.
+    std::size_t const work = settings.context ? 2 * pixel + 64 : 16 + (settings.channels < 3 ? pixel : 0);
+    std::size_t const fixed = settings.context ? softwareDriver + unusedTextures : 0;
+    return {program + fixed, settings.channels * channel, pixel, work};
 }
 
 } // namespace example

@@ -46,8 +46,7 @@ public:
     /// colour, and on OpenGL every picture has alpha. Throws what the engine throws.
     void run(Band const& band, Rectangle const& computed, Picture& result);
 
-    /// Bytes that are held for each pixel.
-    [[nodiscard]] PixelBytes pixelBytes() const;
+    [[nodiscard]] MemoryUse memoryUse() const;
 
 private:
     struct Graph;

@@ -23,9 +23,6 @@ constexpr int vectorColumns = 16;
 // Beyond this a step would cost more than it is good for.
 constexpr int largestStep = 2048;
 
-// Bytes that the program takes for a picture of a few pixels: the libraries that it is linked to, threads.
-constexpr std::size_t baseMemory = std::size_t(140) << 20U;
-
 // Results that are computed, wait, and are being written.
 constexpr std::size_t resultsInFlight = 4;
 
@@ -59,10 +56,10 @@ std::size_t areaOf(Rectangle const& rectangle) {
 }
 
 // The frame is counted one and a half times, for what is kept from one for the next.
-std::size_t bytesNeeded(Rectangle const& window, int width, PixelBytes const& bytes) {
+std::size_t bytesNeeded(Rectangle const& window, int width, MemoryUse const& use) {
     auto const rows = static_cast<std::size_t>(window.extent().height());
-    return 2 * rows * static_cast<std::size_t>(width) * bytes.file +
-           areaOf(window) * (resultsInFlight * bytes.result + bytes.work + bytes.work / 2);
+    return 2 * rows * static_cast<std::size_t>(width) * use.file +
+           areaOf(window) * (resultsInFlight * use.result + use.work + use.work / 2);
 }
 
 // Every second row of tiles is walked the other way.
@@ -119,7 +116,7 @@ GridReach gridReachOf(float sigmaX, float sigmaY) {
     return reach;
 }
 
-TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, PixelBytes const& bytes,
+TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, MemoryUse const& use,
                    std::size_t memory)
     : width_(width),
       height_(height),
@@ -134,14 +131,14 @@ TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, 
         int const bottom = tileHeight + 15 + 3 * reach.marginY + reach.stepY;
         return commonPart(rectangleBetween(0, 0, right, bottom), picture());
     };
-    auto const needed = [&] { return baseMemory + bytesNeeded(window(), width, bytes); };
+    auto const needed = [&] { return use.fixed + bytesNeeded(window(), width, use); };
     while (needed() > memory && tileHeight > fileTile_)
         tileHeight -= fileTile_;
     if (needed() > memory)
         throw UsageError("The memory does not suffice: --memory-limit has to be " +
                          std::to_string((needed() >> 20U) + 1) + " or more, or --tile smaller");
     tiles_ = serpentine(picture(), tileWidth, tileHeight);
-    frameMemory_ = areaOf(window()) * bytes.work;
+    frameMemory_ = areaOf(window()) * use.work;
 }
 
 Rectangle TilePlan::computed(Rectangle const& tile) const {

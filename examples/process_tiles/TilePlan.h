@@ -42,11 +42,12 @@ struct GridReach {
 /// the step comes as near to one as it can.
 [[nodiscard]] GridReach gridReachOf(float sigmaX, float sigmaY);
 
-/// Bytes that are held for each pixel.
-struct PixelBytes {
-    std::size_t file;   ///< of the rows that are read, twice
-    std::size_t result; ///< of the results on their way into the file
-    std::size_t work;   ///< of the frame that is computed
+/// Bytes that are held: so many in any case, and so many for each pixel.
+struct MemoryUse {
+    std::size_t fixed;
+    std::size_t file;   ///< a pixel of the rows that are read, twice
+    std::size_t result; ///< a pixel of the results on their way into the file
+    std::size_t work;   ///< a pixel of the frame that is computed
 };
 
 /// A picture cut into tiles.
@@ -54,7 +55,7 @@ class TilePlan {
 public:
     /// Tiles of about tileSize pixels each way, lower where memory (in bytes) demands it. Throws UsageError
     /// if it does not suffice for the lowest ones.
-    TilePlan(int width, int height, int tileSize, GridReach const& reach, PixelBytes const& bytes,
+    TilePlan(int width, int height, int tileSize, GridReach const& reach, MemoryUse const& use,
              std::size_t memory);
 
     [[nodiscard]] Rectangle picture() const { return rectangleBetween(0, 0, width_, height_); }

@@ -101,7 +101,7 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     Depth const depth = reader.depth() == Depth::uint8 ? Depth::uint8 : Depth::float32;
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
     TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter),
-                        frame.pixelBytes(), memory);
+                        frame.memoryUse(), memory);
     ORVO::Core::setImageStorageLimit(plan.frameMemory());
 
     std::vector<Row> const rows = rowsOf(plan, frame);

@@ -16,7 +16,7 @@ namespace example {
 namespace {
 
 constexpr std::size_t plenty = std::size_t(1) << 40U;
-constexpr PixelBytes rgb8 = {3, 3, 16};
+constexpr MemoryUse rgb8 = {std::size_t(140) << 20U, 3, 3, 16};
 
 std::string tileRefusal(std::initializer_list<char const*> arguments) {
     std::vector<char const*> all{"process_tiles"};

@@ -46,7 +46,7 @@ for variation in "--threads 1" "--tile 128 --threads 3"; do
 done
 accepted "${bilateral[@]}" --tile 128 "$photograph" "$scratch/out.exr"
 accepted "${bilateral[@]}" --tile 128 "$scratch/out.exr" "$scratch/again.TIFF"
-accepted --filter premultiply --target gl --tile 200 --memory-limit 300 "$photograph" "$scratch/gl.tif"
+accepted --filter premultiply --target gl --tile 200 "$photograph" "$scratch/gl.tif"
 accepted --help
 grep -q '^Usage: process_tiles' "$scratch/stdout" || fail "no usage in --help"
 

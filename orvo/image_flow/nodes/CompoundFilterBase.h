@@ -15,6 +15,7 @@ class ImageFlowController;
 /// owns the inner nodes, and wires them to each other. In its run it hands its input to an inner source, runs
 /// the inner graph for a region, and takes the result from an inner sink:
 ///
+///     using CompoundFilterBase::internalProcess; // beside the override of ImageFilter's
 ///     void MyFilter::internalProcess() {
 ///         bPreparedForRender_ = false;
 ///         propagatePrecisionHint(outputPrecisionHint());
