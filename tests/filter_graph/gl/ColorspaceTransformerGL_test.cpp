@@ -191,28 +191,32 @@ TEST_F(ColorspaceTransformerGLTest, SurvivesEveryFailingCall) {
     auto const aExpected = transformed(input.pixels(), PROFILE_SRGB, PROFILE_DISPLAY_P3);
     GLColourGraph graph(context(), input.handle(), output.handle(),
                         {makeTransformer(PROFILE_SRGB, PROFILE_DISPLAY_P3)});
-    bool bMore = true;
-    std::uint64_t n = 1;
-    for (; bMore && n < 1000; ++n) {
-        {
-            GLCallFailure const failure(n);
-            try {
-                // Another transform, so that its program and tables are made.
-                setCodes(graph.filter(), PROFILE_SRGB, n % 2 == 0 ? PROFILE_BT_2020 : PROFILE_WIDE_GAMUT);
-                TexturePool::Instance()->clearAll();
-                graph.frame();
-            } catch (OGL::ExceptionOGL const&) {
-                EXPECT_TRUE(failure.hasFired());
+    for (char const* pName :
+         {"glGenTextures", "glTexImage2D", "glTexSubImage1D", "glCreateProgram", "glCreateShader",
+          "glCompileShader", "glLinkProgram", "glFramebufferTexture2D", "glCheckFramebufferStatus"}) {
+        bool bFailed = true;
+        std::uint64_t n = 1;
+        for (; bFailed && n < 100; ++n) {
+            // Another transform and nothing in the pool, so that program and tables are filled and the rest
+            // is made.
+            setCodes(graph.filter(), PROFILE_SRGB, n % 2 == 0 ? PROFILE_BT_2020 : PROFILE_WIDE_GAMUT);
+            TexturePool::Instance()->clearAll();
+            {
+                GLCallFailure const failure(pName, n);
+                try {
+                    graph.frame();
+                } catch (OGL::ExceptionOGL const&) {
+                    EXPECT_TRUE(failure.hasFired());
+                }
+                bFailed = failure.hasFired();
             }
-            bMore = failure.hasFired();
+            setCodes(graph.filter(), PROFILE_SRGB, PROFILE_DISPLAY_P3);
+            graph.frame();
+            EXPECT_LE(largestDifference(aExpected, output.pixels()), 1) << pName << " " << n;
         }
-        host().makeCurrent();
-        setCodes(graph.filter(), PROFILE_SRGB, PROFILE_DISPLAY_P3);
-        graph.frame();
-        EXPECT_LE(largestDifference(aExpected, output.pixels()), 1) << n;
+        EXPECT_FALSE(bFailed);
+        EXPECT_GT(n, 2U) << pName << " was not called";
     }
-    EXPECT_FALSE(bMore);
-    EXPECT_GT(n, 5U);
 }
 
 class ColorspaceTransformerGLWithoutEngineTest : public GLFrameTest {

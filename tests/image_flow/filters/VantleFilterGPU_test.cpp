@@ -400,25 +400,38 @@ TEST_F(VantleFilterGPUTest, SurvivesEveryFailingCall) {
     OpenVantleFilter filter;
     ShaderRoad road(frameContext(), filter);
     road.setInput(0, *upInput);
-    failEveryCallBeforeThePool(
-        [&] {
-            setTransform(filter, nullptr);
-            road.run(world(0, 0, 9, 5));
-            setTransform(filter, RecordingEngine::ownTransform());
-            road.run(world(0, 0, 9, 5));
-        },
-        [&] {
-            host().makeCurrent();
-            setTransform(filter, RecordingEngine::ownTransform());
-            expectMixed(road, input);
-            EXPECT_EQ(-1, upInput->boundTexUnit());
-            // The next run makes its textures anew.
-            host().makeCurrent();
-            setTransform(filter, nullptr);
-            road.run(world(0, 0, 9, 5));
-            TexturePool::Instance()->clearAll();
-        },
-        {"glCreateShader", "glLinkProgram", "glTexImage1D", "glTexSubImage1D", "glTexSubImage3D"});
+    // Runs a frame that makes everything, with the n-th call of an entry point failing, then one without;
+    // whether one failed.
+    auto const failedCall = [&](std::string const& sName, std::uint64_t n) {
+        SCOPED_TRACE(sName + " " + std::to_string(n));
+        setTransform(filter, nullptr);
+        road.run(world(0, 0, 9, 5));
+        TexturePool::Instance()->clearAll();
+        setTransform(filter, RecordingEngine::ownTransform());
+        bool bFailed = false;
+        {
+            GLCallFailure const failure(sName, n);
+            try {
+                road.run(world(0, 0, 9, 5));
+            } catch (OGL::ExceptionOGL const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bFailed = failure.hasFired();
+        }
+        EXPECT_EQ(0U, drainErrors());
+        expectMixed(road, input);
+        EXPECT_EQ(-1, upInput->boundTexUnit());
+        return bFailed;
+    };
+    for (char const* pName :
+         {"glGenTextures", "glTexImage1D", "glTexImage2D", "glTexImage3D", "glTexSubImage1D",
+          "glTexSubImage2D", "glTexSubImage3D", "glCreateProgram", "glCreateShader", "glCompileShader",
+          "glLinkProgram", "glFramebufferTexture2D", "glCheckFramebufferStatus"}) {
+        std::uint64_t n = 1;
+        while (failedCall(pName, n))
+            ++n;
+        EXPECT_GT(n, 1U) << pName << " was not called";
+    }
 }
 
 } // namespace
