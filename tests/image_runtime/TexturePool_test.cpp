@@ -478,6 +478,22 @@ TEST_F(TexturePoolTest, SurvivesEveryFailureOfTheDriver) {
     EXPECT_EQ(1u, aFailed.count("glTexImage3D"));
 }
 
+TEST_F(TexturePoolTest, LetsNobodyGoOnInItsOwnContext) {
+    {
+        // The first call makes its own context current, the second gives the host's back.
+        ORVO::Test::GLCallFailure const failure("eglMakeCurrent", 2);
+        ORVO_EXPECT_OGL(pPool_->getTexture2DFromPool(4, 4, eRGBA8, true),
+                        "The current context could not be made current again");
+        EXPECT_TRUE(failure.hasFired());
+    }
+    host().makeCurrent();
+    // The texture is there for the next one.
+    EXPECT_EQ(64u, TexturePoolProbe::freeListBytes(*pPool_));
+    std::uint64_t const nMade = GLHooks::calls("glGenTextures");
+    pPool_->returnTexture2DToPool(pPool_->getTexture2DFromPool(4, 4, eRGBA8, true));
+    EXPECT_EQ(nMade, GLHooks::calls("glGenTextures"));
+}
+
 TEST_F(TexturePoolTest, DiesWhereItsOwnContextIsRefused) {
     pPool_.reset();
     for (std::uint64_t n = 1; n < 20; ++n) {
