@@ -156,7 +156,7 @@ bool hasAssociatedAlpha(OIIO::ImageSpec const& spec) {
     return hasAlpha && spec.get_int_attribute("oiio:UnassociatedAlpha") == 0;
 }
 
-Depth depthOf(OIIO::TypeDesc type) {
+Depth depthOf(OIIO::TypeDesc const& type) {
     if (type.is_floating_point())
         return Depth::float32;
     return type.size() == 1 ? Depth::uint8 : Depth::uint15_1;

@@ -22,7 +22,7 @@ namespace example {
 [[nodiscard]] bool hasAssociatedAlpha(OIIO::ImageSpec const& spec);
 
 /// The depth that holds every value of that type.
-[[nodiscard]] Depth depthOf(OIIO::TypeDesc type);
+[[nodiscard]] Depth depthOf(OIIO::TypeDesc const& type);
 
 /// Divides the colours by alpha, or multiplies with it.
 void changeAlpha(std::vector<float>& pixels, std::size_t channels, bool divide);

@@ -6,6 +6,7 @@
 #include "common/Picture.h"
 
 #include <algorithm>
+#include <cmath>
 #include <cstdio>
 #include <cstring>
 #include <memory>
@@ -50,7 +51,7 @@ Picture reduced(Picture const& picture) {
                     sum += channelOf(picture, (row * picture.width + column) * picture.channels + c);
                 }
                 small.pixels[(y * small.width + x) * 3 + c] =
-                    static_cast<unsigned char>(sum / float(reduction * reduction) + 0.5F);
+                    static_cast<unsigned char>(std::lround(sum / float(reduction * reduction)));
             }
         }
     }

@@ -23,7 +23,7 @@ struct BandReader::File {
     /// Rows are read in multiples of this, counted from the top.
     [[nodiscard]] int rowUnit() const { return isTiled() ? spec.tile_height : 1; }
 
-    void read(int first, int end, OIIO::TypeDesc type, void* pixels) {
+    void read(int first, int end, OIIO::TypeDesc const& type, void* pixels) {
         int const top = spec.y + first;
         int const bottom = spec.y + end;
         bool const done = isTiled()

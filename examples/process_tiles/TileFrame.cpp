@@ -19,7 +19,7 @@ using FG::OptimizationOptions;
 
 // What a picture of a few pixels takes: the libraries that the program is linked to, threads.
 constexpr std::size_t program = std::size_t(140) << 20U;
-constexpr std::size_t softwareDriver = std::size_t(120) << 20U;
+constexpr std::size_t softwareDriver = std::size_t(160) << 20U;
 // Unused textures that stay for the next frame.
 constexpr std::size_t unusedTextures = std::size_t(64) << 20U;
 
@@ -164,8 +164,9 @@ MemoryUse TileFrame::memoryUse() const {
     TileFrameSettings const& settings = graph_->settings;
     std::size_t const channel = bytesPerChannel(settings.depth);
     std::size_t const pixel = workingChannels(settings) * channel;
-    // On the CPU four planes of floats; on OpenGL the copy, its texture, and textures and buffers of floats.
-    std::size_t const work = settings.context ? 2 * pixel + 64 : 16 + (settings.channels < 3 ? pixel : 0);
+    // On the CPU four planes of floats; on OpenGL the copy, its texture, and textures and buffers of floats,
+    // which may be larger than the tile.
+    std::size_t const work = settings.context ? 2 * pixel + 96 : 16 + (settings.channels < 3 ? pixel : 0);
     std::size_t const fixed = settings.context ? softwareDriver + unusedTextures : 0;
     return {program + fixed, settings.channels * channel, pixel, work};
 }

@@ -10,8 +10,8 @@ Pictures of 8 bits are computed in 8 bits, others in floats.
   --filter NAME        the filter to run (apply_filter --list shows the filters)
   --target TARGET      cpu (the default), or gl: OpenGL in a context without a window
   --set NAME=VALUE     a parameter; vectors as numbers with commas: --set spatialSigma=10,10
-  --tile N             size of a tile in pixels, 2048 by default; tiles are lower where memory demands it
-  --memory-limit MIB   memory that may be used, 512 by default; on gl that of textures, too
+  --tile N             size of a tile in pixels, 2048 by default; tiles are smaller where memory demands
+  --memory-limit MIB   memory that may be used, 512 by default; on gl textures count, too
   --threads N          number of threads that compute; all by default
   --help               this text
 

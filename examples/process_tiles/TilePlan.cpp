@@ -23,6 +23,9 @@ constexpr int vectorColumns = 16;
 // Beyond this a step would cost more than it is good for.
 constexpr int largestStep = 2048;
 
+// Tiles become smaller than this only where nothing else helps.
+constexpr int comfortableSide = 1024;
+
 // Results that are computed, wait, and are being written.
 constexpr std::size_t resultsInFlight = 4;
 
@@ -122,7 +125,7 @@ TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, 
       height_(height),
       reach_(reach),
       fileTile_(roundedUp(std::min(tileSize, 256), vectorColumns)) {
-    int const tileWidth = roundedUp(std::min(tileSize, roundedUp(width, fileTile_)), fileTile_);
+    int tileWidth = roundedUp(std::min(tileSize, roundedUp(width, fileTile_)), fileTile_);
     int tileHeight = roundedUp(std::min(tileSize, roundedUp(height, fileTile_)), fileTile_);
     // The worst case: a tile that has taken in a strip, between others, farthest from the grid's corners.
     // What the frame reads beyond what it computes is less than half the margin.
@@ -132,8 +135,16 @@ TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, 
         return commonPart(rectangleBetween(0, 0, right, bottom), picture());
     };
     auto const needed = [&] { return use.fixed + bytesNeeded(window(), width, use); };
-    while (needed() > memory && tileHeight > fileTile_)
-        tileHeight -= fileTile_;
+    auto const shorten = [&](int& side, int least) {
+        while (needed() > memory && side > std::max(least, fileTile_))
+            side -= fileTile_;
+    };
+    // Rows cost the most, since they are as long as the picture is wide; but thin tiles are nearly all
+    // margin.
+    for (int const least : {comfortableSide, 0}) {
+        shorten(tileHeight, least);
+        shorten(tileWidth, least);
+    }
     if (needed() > memory)
         throw UsageError("The memory does not suffice: --memory-limit has to be " +
                          std::to_string((needed() >> 20U) + 1) + " or more, or --tile smaller");

@@ -53,8 +53,8 @@ struct MemoryUse {
 /// A picture cut into tiles.
 class TilePlan {
 public:
-    /// Tiles of about tileSize pixels each way, lower where memory (in bytes) demands it. Throws UsageError
-    /// if it does not suffice for the lowest ones.
+    /// Tiles of about tileSize pixels each way, smaller where memory (in bytes) demands it. Throws UsageError
+    /// if it does not suffice for the smallest ones.
     TilePlan(int width, int height, int tileSize, GridReach const& reach, MemoryUse const& use,
              std::size_t memory);
 

@@ -92,7 +92,7 @@ TEST(TilePlan, ComputesMoreThanTheTileFromACornerOfTheGrid) {
     EXPECT_EQ(plan.computed(rectangleBetween(768, 768, 1000, 900)), rectangleBetween(720, 720, 1000, 900));
 }
 
-TEST(TilePlan, LowersTilesUntilTheyFitIntoMemory) {
+TEST(TilePlan, ShortensTilesUntilTheyFitIntoMemory) {
     auto const heightWith = [](std::size_t mebibytes) {
         TilePlan const plan(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), rgb8, mebibytes << 20U);
         return plan.tiles().front().extent().height();
@@ -102,6 +102,11 @@ TEST(TilePlan, LowersTilesUntilTheyFitIntoMemory) {
     EXPECT_LT(height, 2048);
     EXPECT_GE(height, 1024);
     EXPECT_LT(heightWith(320), height);
+    // The bands of whole rows fit, but not the frame of a tile that is 2048 pixels wide: one of 1280 takes
+    // 1184 rows of 2 * 90,000 + 1481 * 664 bytes, 1314 MiB.
+    MemoryUse const costly = {0, 3, 16, 400};
+    TilePlan const plan(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), costly, std::size_t(1400) << 20U);
+    EXPECT_EQ(plan.tiles().front().extent(), ORVO::ExtentInPixelSpace(1280, 1024));
     try {
         heightWith(141);
         FAIL() << "141 MiB suffice";

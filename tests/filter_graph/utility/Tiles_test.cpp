@@ -29,7 +29,8 @@ Regions regions(Rectangle const& rect, int width, int height) {
 
 /// Every pixel of the rectangle lies in one region, every region in the rectangle, and they come in rows.
 void expectPartition(Rectangle const& rect, Regions const& parts) {
-    std::vector<int> covered(static_cast<std::size_t>(rect.extent().width() * rect.extent().height()));
+    std::vector<int> covered(static_cast<std::size_t>(rect.extent().width()) *
+                             static_cast<std::size_t>(rect.extent().height()));
     for (Rectangle const& part : parts) {
         for (int y = 0; y < part.extent().height(); ++y) {
             for (int x = 0; x < part.extent().width(); ++x) {
