@@ -65,7 +65,6 @@ struct FastBilateralCPUFilter::Call {
 
 FastBilateralCPUFilter::FastBilateralCPUFilter()
     : fPaddingXY_(4.0F),
-      fPaddingZ_(4.0F),
       fGridOffset_(0.0F),
       nGridHeight_(0),
       nGridWidth_(0),

@@ -102,7 +102,6 @@ private:
     void writeImage(Call& call, bool bSlice) const;
 
     float fPaddingXY_;
-    float fPaddingZ_;
     float fGridOffset_;
     std::size_t nGridHeight_;
     std::size_t nGridWidth_;

@@ -372,6 +372,8 @@ TEST_F(FastBilateralFilterGPUTest, EveryCallThatFailsFailsTheFrameAndNotTheNext)
             road.run(world(0, 0, width, 7));
         },
         [&] {
+            // None is current where the driver did not give it back.
+            host().makeCurrent();
             EXPECT_EQ(-1, upImage->boundTexUnit());
             Texels const result(*road.run(world(0, 0, 9, 7)));
             EXPECT_LE(largestDifference(result, expected, true), 2.0 / 255.0);
