@@ -3,6 +3,10 @@
 #include "orvo/filter_graph/filters/ColorspaceTransformer.h"
 
 #include <atomic>
+#include <exception>
+#include <memory>
+#include <string>
+#include <vector>
 
 #include "orvo/colour_engine/EngineStatistics.h"
 #include "orvo/core/memory/MemoryStatistics.h"
@@ -16,6 +20,7 @@
 #include "orvo/filter_graph/internal/IFilterExecutable.h"
 #include "tests/filter_graph/support/ColourGraph.h"
 #include "tests/filter_graph/support/PlainFilter.h"
+#include "tests/image_flow/colour/FakeEngine.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ExpectFilterGraph.h"
 
@@ -30,7 +35,8 @@ constexpr std::uint32_t kUnknown = profileCode("none");
 constexpr char const* kNoSource = "Cannot make src profile from code";
 constexpr char const* kNoDestination = "Cannot make dst profile from code";
 
-class ColorspaceTransformerTest : private WithRecordingEngine, public FrameTest {
+/// A transformer is unfolded between two filters.
+class UnfoldTest : public FrameTest {
 protected:
     /// Unfolds between a producer and a consumer, which are made for it.
     std::shared_ptr<Internal::ParameterForwarder> unfold(ColorspaceTransformer& filter,
@@ -47,6 +53,8 @@ protected:
     std::shared_ptr<PlainFilter> spProducer_ = makePlain("producer");
     std::shared_ptr<PlainFilter> spConsumer_ = makePlain("consumer", {"in"});
 };
+
+class ColorspaceTransformerTest : private WithRecordingEngine, public UnfoldTest {};
 
 TEST_F(ColorspaceTransformerTest, HasItsIdentifierInputAndParameters) {
     ColorspaceTransformer const filter;
@@ -301,7 +309,13 @@ TEST_F(ColorspaceTransformerTest, FloatImagesAreRefusedOnTheCPU) {
     Connect(spSource, spFilter);
     Connect(spFilter, spSink);
     auto const spProcessor = createProcessor(spSink, nullptr);
-    EXPECT_THROW(spProcessor->processFrame(cpuOptions()), std::exception);
+    try {
+        spProcessor->processFrame(cpuOptions());
+        ADD_FAILURE() << "nothing thrown";
+    } catch (std::exception const& error) { // a worker's failure comes wrapped
+        EXPECT_NE(std::string::npos, std::string(error.what()).find("Invalid input image type"))
+            << error.what();
+    }
 }
 
 // 10,000 frames of 2 by 2 pixels, codes changed on every hundredth. Counted are tracked blocks and bytes, and
@@ -348,6 +362,31 @@ TEST_F(ColorspaceTransformerTest, IsCreatedByTheFactory) {
     graph.spProcessor_->processFrame(cpuOptions());
     EXPECT_EQ(transformed(graph.oInput_.pixels(), PROFILE_SRGB, PROFILE_BT_2020), graph.oOutput_.pixels());
     DisconnectAll(spCreated.get());
+}
+
+/// Before all layers come up.
+struct WithFakeEngine {
+    WithFakeEngine() {
+        FakeEngine::reset();
+        Core::Library::setQuorGetAddressProc(&FakeEngine::address);
+    }
+};
+
+class ColorspaceTransformerFakeEngineTest : private WithFakeEngine, public UnfoldTest {};
+
+TEST_F(ColorspaceTransformerFakeEngineTest, ForwarderCallsTheEngineInOrderAndHandsItsTransformOn) {
+    using Calls = std::vector<std::string>;
+    ColorspaceTransformer filter;
+    setCodes(filter, 1, 2);
+    auto const spForwarder = unfold(filter, cpuOptions());
+    EXPECT_EQ(Calls(), FakeEngine::calls());
+    spForwarder->forwardStuff();
+    // The engine's profile of code n is 1000 + n, its transform 2000, the optimised one 3000.
+    EXPECT_EQ((Calls{"ProfileFromCode 1", "ProfileFromCode 2", "MakeColorTransform 1001 1002 0 0",
+                     "UnReferenceProfile 1002", "UnReferenceProfile 1001", "OptimizeTransform 2000 0",
+                     "UnReferenceTransform 2000"}),
+              FakeEngine::calls());
+    EXPECT_EQ(FakeEngine::handle<void>(3000), transformOfNode());
 }
 
 struct WithoutEngine {
