@@ -405,6 +405,14 @@ TEST_F(VantleDataAdapterTest, AnswersWhetherTheDriverCanDoIt) {
     EXPECT_TRUE(can({table1D()}));
     manager.clearOverrides();
 
+    // Without programs nothing can be done, whatever the tables are.
+    manager.overrideSupport(OGL::EXTENSION_ARB_SHADER_OBJECTS, false);
+    EXPECT_FALSE(can({}));
+    EXPECT_FALSE(can({table1D()}));
+    EXPECT_FALSE(VantleDataAdapter::canCreateGLObjectsAsRequested(invalid));
+    manager.clearOverrides();
+    EXPECT_TRUE(can({table1D()}));
+
     // One unit is the input's, and one has to be left.
     manager.overrideNumberOfTextureUnits(4);
     EXPECT_TRUE(can({table1D("a"), table2D("b")}));
