@@ -76,6 +76,23 @@ TEST(QuorTable, AStrictLoadThrowsAndLeavesTheTablePartlyFilledFromTheEnd) {
     EXPECT_EQ(2u, FakeEngine::asked().size()) << "the row before the missing one is not asked for";
 }
 
+TEST(QuorTable, AStrictLoadWithoutErrorObjectsSaysThatAnInterfaceIsMissing) {
+    FakeBinding const binding;
+    TestTable test;
+    FakeEngine::missing() = {"VantleShaderInterface/Strings", "QuorErrorInterface/NewError"};
+    // The interface of errors is loaded again, in vain.
+    FakeEngine::unregister();
+    try {
+        test.oTable_.load();
+        FAIL() << "nothing thrown";
+    } catch (CQuorError const& error) {
+        EXPECT_STREQ("Missing Interface", error.what());
+        EXPECT_EQ(nullptr, error.error());
+    }
+    EXPECT_EQ(Names(), FakeEngine::calls()) << "no error object is made";
+    EXPECT_EQ(nullptr, test.oTable_.procedure(0));
+}
+
 TEST(QuorTable, ALenientLoadReportsAndLeavesTheEarlierRowsAsTheyAre) {
     FakeEngine::reset();
     ASSERT_FALSE(QuorClient::isStrict());
