@@ -182,9 +182,6 @@ TEST_F(VantleFilterGPUTest, LeavesNoUnitBoundOrEnabled) {
         setTransform(filter, pTransform);
         ShaderRoad road(frameContext(), filter);
         road.setInput(0, *upInput);
-        frameContext().makeCurrent();
-        GLState const before;
-        host().makeCurrent();
         road.run(world(0, 0, 9, 5));
         EXPECT_EQ(1, filter.texUnitCount_);
         EXPECT_EQ(-1, upInput->boundTexUnit());
