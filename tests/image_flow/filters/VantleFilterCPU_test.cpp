@@ -10,7 +10,9 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <array>
+#include <cstddef>
 #include <cstdint>
 #include <cstring>
 #include <mutex>
@@ -239,11 +241,16 @@ TEST(VantleFilterCPU, PixelsOutsideTheInputBecomeTransparentBlack) {
     expectRecord(aCalls[0].source, false, 1, node.inputPixels(), 12, 4);
     expectRecord(aCalls[0].destination, false, 1, output.pixels() + 28 + 8, 28, 4);
 
-    // Nothing in common: no call.
+    // Nothing in common: no call, and the whole rectangle is cleared; beyond it the rows stay as they are.
     ImageCPU far = imageOf(ImageCPU::PIXEL_FORMAT_RGBA8, pixels(100, 100, 3, 2));
     node.setImages(far, output);
     node.processSlice(0, 5);
     EXPECT_EQ(1U, aCalls.size());
+    for (std::size_t y = 0; y < 5; ++y) {
+        std::fill_n(expected.begin() + static_cast<std::ptrdiff_t>(28 * y), 24,
+                    static_cast<unsigned char>(0));
+    }
+    EXPECT_EQ(expected, bytesOf(output));
 }
 
 /// What the copy of alpha leaves in the output: byte i of pixel p is that of the input's at `from`.
