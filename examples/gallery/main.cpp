@@ -74,6 +74,8 @@ Sample sampleOf(std::string const& name, Picture const& photograph, ORVO::OGL::C
     auto const filter = example::createFilterNamed(name);
     if (auto* const colorize = filter->parameter("colorize"))
         colorize->as<bool>().setValue(true);
+    if (auto* const source = filter->parameter("srcProfile"))
+        source->as<int>().setValue(static_cast<int>(ORVO::ColourEngine::profileCode("sRGB")));
     for (auto const& [from, to] : {std::pair(Depth::uint8, Depth::uint8),
                                    {Depth::uint8, Depth::float32},
                                    {Depth::float32, Depth::uint8}}) {

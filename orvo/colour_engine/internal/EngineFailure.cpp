@@ -30,11 +30,17 @@ FailureResults makeFailures() {
     return aResults;
 }
 
+FailureResults const& failureResults() {
+    static FailureResults const aResults = makeFailures();
+    return aResults;
+}
+
 } // namespace
 
+void prepareEngineFailures() { failureResults(); }
+
 VantleResult engineFailure(EngineFailure eFailure) noexcept {
-    static FailureResults const aResults = makeFailures();
-    return aResults[static_cast<std::size_t>(eFailure)];
+    return failureResults()[static_cast<std::size_t>(eFailure)];
 }
 
 } // namespace ORVO::ColourEngine::Internal

@@ -30,7 +30,12 @@ enum class EngineFailure {
     Internal
 };
 
-/// The result that stands for a failure; never 0, always the same one.
+/// Makes the error objects of all failures, so that telling of one, of too little memory above all, needs no
+/// memory. Throws std::bad_alloc.
+/// Threads: any.
+void prepareEngineFailures();
+
+/// The result that stands for a failure; never 0, always the same one. After prepareEngineFailures().
 /// Threads: any.
 VantleResult engineFailure(EngineFailure eFailure) noexcept;
 

@@ -1,5 +1,6 @@
 #include "orvo/colour_engine/internal/ProcedureRegistry.h"
 
+#include "orvo/colour_engine/internal/EngineFailure.h"
 #include "orvo/colour_engine/internal/EngineProcedures.h"
 
 #include <atomic>
@@ -21,6 +22,7 @@ ProcedureRegistry& ProcedureRegistry::instance() {
 }
 
 ProcedureRegistry::ProcedureRegistry() {
+    prepareEngineFailures();
     for (ProcedureSpan const procedures :
          {layerProcedures(), containerProcedures(), errorProcedures(), stringProcedures(), memoryProcedures(),
           transformProcedures(), shaderProcedures()}) {

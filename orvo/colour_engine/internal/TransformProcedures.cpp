@@ -115,6 +115,11 @@ VantleResult applyGeneralProc(VantleTransform* pTransform, _t_Vantle_PackingSpec
         if (pSource == nullptr || pDestination == nullptr) {
             return engineFailure(EngineFailure::InvalidArgument);
         }
+        try {
+            spTransform->resolved();
+        } catch (std::runtime_error const&) {
+            return engineFailure(EngineFailure::NoTransform);
+        }
         return resultOf(spTransform->applier().apply(*pSource, *pDestination, rows, columns),
                         EngineFailure::UnsupportedPixels);
     });

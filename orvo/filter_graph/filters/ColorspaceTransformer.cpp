@@ -49,7 +49,7 @@ public:
             if (pHandle_ != nullptr) {
                 drop(pHandle_);
             }
-        } catch (TrelException const&) { // The engine is gone, and the object with it.
+        } catch (...) { // The engine is gone, and the object with it.
             pHandle_ = nullptr;
         }
     }

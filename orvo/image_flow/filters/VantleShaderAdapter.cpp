@@ -73,6 +73,9 @@ VantleShaderAdapter::VantleShaderAdapter(VantleTransform* transform, _t_Vantle_O
         vantleShader_ = nullptr;
     } catch (TrelException const&) {
         vantleShader_ = nullptr;
+    } catch (...) {
+        release();
+        throw;
     }
     if (vantleShader_ == nullptr) {
         release();
