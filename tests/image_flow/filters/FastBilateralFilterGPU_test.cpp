@@ -317,17 +317,18 @@ TEST_F(FastBilateralFilterGPUTest, WhatAHostHasBoundToTheGridsUnitIsNotSeen) {
     FastBilateralFilterGPU filter;
     filter.spatialSigma().setValue(float2(2.0F, 2.0F));
     filter.colorize().setValue(true);
-    ShaderRoad road(context(), filter);
+    ShaderRoad road(frameContext(), filter);
     road.setInput(0, *upImage);
     std::array<unsigned char, 4> aBlack{};
     OGL::Texture2D texture(OGL::Texture::INTERNAL_FORMAT_RGBA8, 1, 1, false, aBlack.data());
-    OGL::TextureUnit::Unit(1).bind(&texture);
-    ImageGPU const* const pResult = road.run(world(0, 0, 16, 16));
-    OGL::TextureUnit::Unit(1).bind2DDefault();
-    glActiveTexture(GL_TEXTURE0);
-    EXPECT_LE(
-        largestDifference(Texels(*pResult), filtered(Texels(*upImage), region, {2, 2, 0.15F, true}), true),
-        2.0 / 255.0);
+    {
+        OGL::ScopedContextWrapper const wrapper;
+        frameContext().makeCurrent();
+        OGL::TextureUnit::Unit(1).bind(&texture);
+    }
+    EXPECT_LE(largestDifference(Texels(*road.run(world(0, 0, 16, 16))),
+                                filtered(Texels(*upImage), region, {2, 2, 0.15F, true}), true),
+              2.0 / 255.0);
 }
 
 /// Draws its input with fixed function.
