@@ -52,15 +52,20 @@ void addSources(ShaderProgramProxyOGL& oProgram, std::string const& sVertex, std
     pManager->RegisterShaderProgram(&oProgram);
 }
 
-/// Units 0 and 1 with 2D texturing enabled, unit 0 the active one; at the end both are as they were.
-void enableUnits(GLStateStack& states) {
+/// Unit 0 with 2D texturing enabled and the active one; at the end it is as it was.
+void enableInputUnit(GLStateStack& states) {
     states.push_back(ORVO_NEW ScopedActiveTextureUnitRestore());
-    states.push_back(ORVO_NEW ScopedTexture2DEnablerWithActivation(1));
     OGL::TextureState::setActiveTextureUnit(0);
     // The controller has enabled unit 0 for the length of the frame: the next node needs it, too.
     if (glIsEnabled(GL_TEXTURE_2D) == GL_FALSE) {
         states.push_back(ORVO_NEW ScopedTexture2DEnablerWithActivation(0));
     }
+}
+
+/// Unit 1 with 2D texturing enabled, unit 0 still the active one.
+void enableGridUnit(GLStateStack& states) {
+    states.push_back(ORVO_NEW ScopedTexture2DEnablerWithActivation(1));
+    OGL::TextureState::setActiveTextureUnit(0);
 }
 
 } // namespace
@@ -188,7 +193,7 @@ void FastBilateralFilterGPU::internalProcess() {
     ImageGPU const& input = *oInput_;
     try {
         GLStateStack states;
-        enableUnits(states);
+        enableInputUnit(states);
         // A frame that failed may have left a program behind, if the driver took its context away.
         glUseProgram(0);
         readParameters();
@@ -197,6 +202,8 @@ void FastBilateralFilterGPU::internalProcess() {
         setUpGrid();
         setUpBuffers();
         copyDataFromTextureObjectToVBO(input);
+        // Not before: the copy draws without a program, where whatever a host has bound to the unit counts.
+        enableGridUnit(states);
         // Each stage's grid goes back to the pool when the next one has read it.
         auto const width = static_cast<float>(nGridWidth_ * nGridDepth_);
         auto pGrid = scatterInput();

@@ -311,6 +311,26 @@ TEST_F(FastBilateralFilterGPUTest, BuffersAreKeptWhileTheSizeStays) {
     EXPECT_EQ(2, objects("buffer"));
 }
 
+TEST_F(FastBilateralFilterGPUTest, WhatAHostHasBoundToTheGridsUnitIsNotSeen) {
+    PositionExtentInPixelSpace const region = pixels(0, 0, 16, 16);
+    ImageGPUPtr const upImage = textureOf(scene(region, 1), ImageGPU::PIXEL_FORMAT_RGBA8);
+    FastBilateralFilterGPU filter;
+    filter.spatialSigma().setValue(float2(2.0F, 2.0F));
+    filter.colorize().setValue(true);
+    ShaderRoad road(frameContext(), filter);
+    road.setInput(0, *upImage);
+    std::array<unsigned char, 4> aBlack{};
+    OGL::Texture2D texture(OGL::Texture::INTERNAL_FORMAT_RGBA8, 1, 1, false, aBlack.data());
+    {
+        OGL::ScopedContextWrapper const wrapper;
+        frameContext().makeCurrent();
+        OGL::TextureUnit::Unit(1).bind(&texture);
+    }
+    EXPECT_LE(largestDifference(Texels(*road.run(world(0, 0, 16, 16))),
+                                filtered(Texels(*upImage), region, {2, 2, 0.15F, true}), true),
+              2.0 / 255.0);
+}
+
 /// Draws its input with fixed function.
 class PlainCopy : public SimpleFilterGPU {
 public:
