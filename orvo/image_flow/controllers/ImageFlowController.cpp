@@ -118,8 +118,43 @@ void sweepErrors() {
     }
 }
 
+void activateUnit(unsigned nUnit) noexcept {
+    OGL::ExtensionManager::Instance()->table()->glActiveTexture(GL_TEXTURE0 + nUnit);
+}
+
+/// What would change or keep back the pixels of a pass, set to none of it.
+void setPlainDrawing() {
+    for (GLenum const capability :
+         {GL_ALPHA_TEST, GL_BLEND, GL_CLIP_PLANE0, GL_CLIP_PLANE1, GL_CLIP_PLANE2, GL_CLIP_PLANE3,
+          GL_CLIP_PLANE4, GL_CLIP_PLANE5, GL_COLOR_LOGIC_OP, GL_CULL_FACE, GL_DEPTH_TEST, GL_FOG, GL_LIGHTING,
+          GL_POINT_SMOOTH, GL_POLYGON_SMOOTH, GL_POLYGON_STIPPLE, GL_SCISSOR_TEST, GL_STENCIL_TEST}) {
+        glDisable(capability);
+    }
+    for (GLenum const array : {GL_COLOR_ARRAY, GL_EDGE_FLAG_ARRAY, GL_INDEX_ARRAY, GL_NORMAL_ARRAY,
+                               GL_TEXTURE_COORD_ARRAY, GL_VERTEX_ARRAY}) {
+        glDisableClientState(array);
+    }
+    glColorMask(GL_TRUE, GL_TRUE, GL_TRUE, GL_TRUE);
+    glPolygonMode(GL_FRONT_AND_BACK, GL_FILL);
+    glPointSize(1.0F);
+    // Passes without a program of their own see all units.
+    GLint nUnits = 0;
+    glGetIntegerv(GL_MAX_TEXTURE_UNITS, &nUnits);
+    for (GLint i = nUnits; i-- > 0;) {
+        activateUnit(static_cast<unsigned>(i));
+        for (GLenum const capability :
+             {GL_TEXTURE_1D, GL_TEXTURE_2D, GL_TEXTURE_3D, GL_TEXTURE_CUBE_MAP, GL_TEXTURE_GEN_S,
+              GL_TEXTURE_GEN_T, GL_TEXTURE_GEN_R, GL_TEXTURE_GEN_Q}) {
+            glDisable(capability);
+        }
+    }
+    glMatrixMode(GL_TEXTURE);
+    glLoadIdentity();
+}
+
 /// What a frame changes in its context, which is current, put back at the end of a scope: texture units,
-/// matrices, viewport, program and framebuffers. A host may have named a context in which it draws itself.
+/// matrices, viewport, program, framebuffers, arrays, and how pixels are drawn, which is made plain for the
+/// frame. A host may have named a context in which it draws itself.
 class FrameState {
 public:
     explicit FrameState(OGL::Context const& context)
@@ -127,6 +162,7 @@ public:
           bPrograms_(OGL::Program::isSupported()),
           bSeparate_(OGL::ExtensionManager::Instance()->isSupported(OGL::EXTENSION_ARB_FRAMEBUFFER_OBJECT)) {
         glPushAttrib(nAttributes_);
+        glPushClientAttrib(GL_CLIENT_VERTEX_ARRAY_BIT);
         glGetDoublev(GL_PROJECTION_MATRIX, aProjection_.data());
         glGetDoublev(GL_MODELVIEW_MATRIX, aModelview_.data());
         glGetIntegerv(GL_FRAMEBUFFER_BINDING, &nDraw_);
@@ -135,6 +171,12 @@ public:
         }
         if (bPrograms_) {
             glGetIntegerv(GL_CURRENT_PROGRAM, &nProgram_);
+        }
+        activateUnit(0);
+        glGetDoublev(GL_TEXTURE_MATRIX, aTexture_.data());
+        setPlainDrawing();
+        if (bPrograms_) {
+            glUseProgram(0);
         }
     }
     ~FrameState() {
@@ -151,19 +193,23 @@ public:
         if (bSeparate_) {
             bindFramebuffer(GL_READ_FRAMEBUFFER, nRead_);
         }
+        activateUnit(0);
+        glMatrixMode(GL_TEXTURE);
+        glLoadMatrixd(aTexture_.data());
         glMatrixMode(GL_PROJECTION);
         glLoadMatrixd(aProjection_.data());
         glMatrixMode(GL_MODELVIEW);
         glLoadMatrixd(aModelview_.data());
+        glPopClientAttrib();
         glPopAttrib();
     }
     FrameState(FrameState const&) = delete;
     FrameState& operator=(FrameState const&) = delete;
 
 private:
-    /// Bindings, enables and active unit; the matrix mode; the viewport.
-    static constexpr GLbitfield nAttributes_ =
-        GL_TEXTURE_BIT | GL_ENABLE_BIT | GL_TRANSFORM_BIT | GL_VIEWPORT_BIT;
+    static constexpr GLbitfield nAttributes_ = GL_TEXTURE_BIT | GL_ENABLE_BIT | GL_TRANSFORM_BIT |
+                                               GL_VIEWPORT_BIT | GL_COLOR_BUFFER_BIT | GL_CURRENT_BIT |
+                                               GL_POINT_BIT | GL_POLYGON_BIT | GL_SCISSOR_BIT;
 
     static void bindFramebuffer(GLenum target, GLint nName) noexcept {
         OGL::ExtensionManager::Instance()->table()->glBindFramebuffer(target, static_cast<GLuint>(nName));
@@ -174,6 +220,7 @@ private:
     bool bSeparate_;
     std::array<GLdouble, 16> aProjection_{};
     std::array<GLdouble, 16> aModelview_{};
+    std::array<GLdouble, 16> aTexture_{}; // of unit 0, the one whose coordinates are used
     GLint nDraw_ = 0;
     GLint nRead_ = 0;
     GLint nProgram_ = 0;

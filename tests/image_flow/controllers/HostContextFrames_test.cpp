@@ -1,7 +1,9 @@
 // Frames that run in the host's own context: its state is what it was, also after a frame that failed.
+#include "tests/image_flow/support/GPUBilateralReference.h"
 #include "tests/image_flow/support/ShaderRoad.h"
 
 #include "orvo/core/Check.h"
+#include "orvo/image_flow/filters/FastBilateralFilterGPU.h"
 #include "orvo/ogl/Texture2D.h"
 #include "tests/support/Expect.h"
 #include "tests/support/gl/GLState.h"
@@ -27,6 +29,11 @@ protected:
             glBindTexture(GL_TEXTURE_2D, pTexture_->objectID());
         }
         glEnable(GL_TEXTURE_2D);
+        glActiveTexture(GL_TEXTURE0);
+        glMatrixMode(GL_TEXTURE);
+        glPushMatrix();
+        glTranslatef(0.25f, 0.5f, 0.0f);
+        glEnable(GL_TEXTURE_GEN_S);
         glActiveTexture(GL_TEXTURE1);
         glViewport(1, 2, 3, 4);
         for (GLenum const mode : {GL_PROJECTION, GL_MODELVIEW, GL_TEXTURE}) {
@@ -34,6 +41,22 @@ protected:
             glPushMatrix();
             glTranslatef(1.0f, 2.0f, 3.0f);
         }
+        glEnable(GL_SCISSOR_TEST);
+        glScissor(0, 0, 1, 1);
+        glEnable(GL_BLEND);
+        glBlendFunc(GL_ZERO, GL_SRC_ALPHA);
+        glEnable(GL_ALPHA_TEST);
+        glAlphaFunc(GL_NEVER, 0.0f);
+        glColorMask(GL_FALSE, GL_TRUE, GL_FALSE, GL_TRUE);
+        glClearColor(0.1f, 0.2f, 0.3f, 0.4f);
+        glColor4f(0.5f, 0.25f, 0.75f, 1.0f);
+        glPointSize(5.0f);
+        std::array<double, 4> const aNothing{0.0, 0.0, 0.0, -1.0};
+        glClipPlane(GL_CLIP_PLANE3, aNothing.data());
+        glEnable(GL_CLIP_PLANE3);
+        glPushClientAttrib(GL_CLIENT_VERTEX_ARRAY_BIT);
+        glEnableClientState(GL_NORMAL_ARRAY);
+        glVertexPointer(3, GL_FLOAT, 12, aVertices_.data());
         char const* pText = "void main() { gl_FragColor = vec4(1.0); }";
         pProgram_ = std::make_unique<OGL::Program>();
         pProgram_->loadFragmentShader(1, &pText, nullptr);
@@ -44,17 +67,35 @@ protected:
     void makeStateNormal() {
         pProgram_->disable();
         pProgram_.reset();
+        glPopClientAttrib();
         for (GLenum const mode : {GL_PROJECTION, GL_MODELVIEW, GL_TEXTURE}) {
             glMatrixMode(mode);
             glPopMatrix();
         }
+        glActiveTexture(GL_TEXTURE0);
+        glPopMatrix();
         pTexture_.reset();
         glBindFramebuffer(GL_FRAMEBUFFER, 0);
         glDeleteFramebuffers(2, aFramebuffers_.data());
         glPopAttrib();
     }
 
+    static std::array<float, 16> textureMatrix() {
+        std::array<float, 16> aMatrix{};
+        glActiveTexture(GL_TEXTURE0);
+        glGetFloatv(GL_TEXTURE_MATRIX, aMatrix.data());
+        glActiveTexture(GL_TEXTURE1);
+        return aMatrix;
+    }
+
+    static GLvoid* vertexPointer() {
+        GLvoid* pVertices = nullptr;
+        glGetPointerv(GL_VERTEX_ARRAY_POINTER, &pVertices);
+        return pVertices;
+    }
+
 private:
+    std::array<float, 3> aVertices_{};
     std::array<GLuint, 2> aFramebuffers_{};
     std::unique_ptr<OGL::Texture2D> pTexture_;
     std::unique_ptr<OGL::Program> pProgram_;
@@ -78,6 +119,25 @@ TEST_F(HostContextFramesTest, LeaveTheStateAsItWas) {
         EXPECT_EQ("", before.differencesTo(GLState::capture())) << bThrow;
         makeStateNormal();
     }
+}
+
+TEST_F(HostContextFramesTest, TheBilateralFilterSeesNothingOfTheHostsStateAndPutsItBack) {
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 9, 7), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
+    FastBilateralFilterGPU filter;
+    filter.spatialSigma().setValue(float2(2.0f, 2.0f));
+    ShaderRoad road(context(), filter);
+    road.setInput(0, *upInput);
+    Texels const plain(*road.run(world(0, 0, 9, 7)));
+    makeStateOdd();
+    GLState const before = GLState::capture();
+    GLvoid const* const pVertices = vertexPointer();
+    std::array<float, 16> const aMatrix = textureMatrix();
+    ImageGPU const* const pResult = road.run(world(0, 0, 9, 7));
+    EXPECT_EQ("", before.differencesTo(GLState::capture()));
+    EXPECT_EQ(pVertices, vertexPointer());
+    EXPECT_EQ(aMatrix, textureMatrix());
+    makeStateNormal();
+    EXPECT_EQ(0.0, gpuBilateral::largestDifference(Texels(*pResult), plain, false));
 }
 
 } // namespace
