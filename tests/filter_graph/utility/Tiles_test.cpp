@@ -149,13 +149,37 @@ TEST_F(TilesTest, VisitsASerpentine) {
     EXPECT_EQ(order(tiles),
               (std::vector<std::pair<int, int>>{
                   {0, 0}, {20, 0}, {40, 0}, {40, 20}, {20, 20}, {0, 20}, {0, 40}, {20, 40}, {40, 40}}));
-    // The flag is down again: the last tile loses its storage first.
-    for (auto const& spTile : tiles.tiles()) {
-        spTile->initializeStorage();
-    }
     Tiles columns(rgb8(), rectangle(0, 0, 20, 80), ExtentInPixelSpace(20, 20));
     columns.reorderTilesAsSerpentine();
     EXPECT_EQ(order(columns), (std::vector<std::pair<int, int>>{{0, 0}, {0, 20}, {0, 40}, {0, 60}}));
+}
+
+TEST_F(TilesTest, FreesTheEndOfASerpentineFirst) {
+    Tiles row(rgb8(), rectangle(0, 0, 30, 10), 3);
+    fill(row);
+    row.setReverseTraversal(true);
+    row.reorderTilesAsSerpentine();
+    row.cleanupGPU(600); // the flag is down again: from the back
+    EXPECT_EQ(haveStorage(row), (std::vector<bool>{true, true, false}));
+    EXPECT_EQ(row.memoryUseGPU(), 600);
+
+    Tiles tiles(rgb8(), rectangle(0, 0, 20, 20), 4);
+    for (int i = 0; i < 4; ++i) {
+        tiles.createTileAt(i, rectangle(10 * (i % 2), 10 * (i / 2), 10, 10))->initializeStorage();
+    }
+    ImageWrapper const* const pLowerLeft = tiles.tiles()[2].get();
+    tiles.setReverseTraversal(true);
+    tiles.reorderTilesAsSerpentine();
+    EXPECT_EQ(order(tiles), (std::vector<std::pair<int, int>>{{0, 0}, {10, 0}, {10, 10}, {0, 10}}));
+    tiles.cleanupGPU(900); // the last of the new order, which came before the last of the old one
+    EXPECT_FALSE(pLowerLeft->imageHasPixelStorage());
+    EXPECT_EQ(haveStorage(tiles), (std::vector<bool>{true, true, true, false}));
+    tiles.cleanupGPU(600);
+    EXPECT_EQ(haveStorage(tiles), (std::vector<bool>{true, true, false, false}));
+    tiles.setReverseTraversal(true); // counts again after the new order
+    tiles.cleanupGPU(300);
+    EXPECT_EQ(haveStorage(tiles), (std::vector<bool>{false, true, false, false}));
+    EXPECT_EQ(tiles.memoryUseGPU(), 300);
 }
 
 TEST_F(TilesTest, KeepsTheOrderOfFewerThanThreeTiles) {

@@ -1,6 +1,8 @@
 // The bilateral filter on OpenGL: its interface, its choice of what runs, its resources, and its failures.
 #include "orvo/image_flow/filters/FastBilateralFilterGPU.h"
 
+#include "orvo/core/memory/AllocationFailure.h"
+#include "orvo/core/memory/MemoryStatistics.h"
 #include "orvo/image_runtime/TexturePool.h"
 #include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/NativeContext.h"
@@ -24,6 +26,19 @@ long objects(char const* kind) {
     ObjectCounts const counts = GLHooks::objects();
     auto const found = counts.find(kind);
     return found == counts.end() ? 0 : found->second;
+}
+
+/// What is in use: tracked objects, their bytes, and objects of OpenGL.
+struct Usage {
+    std::size_t nBlocks_ = Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT);
+    std::size_t nBytes_ = Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT);
+    ObjectCounts oObjects_ = GLHooks::objects();
+};
+
+void expectSame(Usage const& before, Usage const& after) {
+    EXPECT_EQ(before.nBlocks_, after.nBlocks_);
+    EXPECT_EQ(before.nBytes_, after.nBytes_);
+    EXPECT_EQ(before.oObjects_, after.oObjects_);
 }
 
 class FastBilateralFilterGPUTest : public ShaderFlowTest {
@@ -156,6 +171,31 @@ TEST_F(FastBilateralFilterGPUTest, EveryCallThatFailsWhileItIsMadeOnlyKeepsItFro
                              "glCheckFramebufferStatus", "glCompileShader", "glLinkProgram"}) {
         EXPECT_EQ(1U, aFailed.count(name)) << name;
     }
+}
+
+TEST_F(FastBilateralFilterGPUTest, EveryAllocationThatFailsWhileItIsMadeKeepsItFromRunning) {
+    Usage const before;
+    int nFailed = 0;
+    bool bMore = true;
+    for (std::uint64_t n = 1; bMore; ++n) {
+        SCOPED_TRACE(n);
+        ASSERT_LT(n, 200U);
+        bool bRuns = false;
+        {
+            Core::AllocationFailure const failure(n);
+            try {
+                bRuns = FastBilateralFilterGPU().willRunInHardware();
+            } catch (std::bad_alloc const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bMore = failure.hasFired();
+        }
+        EXPECT_EQ(!bMore, bRuns);
+        nFailed += bMore ? 1 : 0;
+        expectSame(before, Usage());
+        EXPECT_EQ(GLenum(GL_NO_ERROR), glGetError());
+    }
+    EXPECT_GE(nFailed, 6); // a program each
 }
 
 TEST_F(FastBilateralFilterGPUTest, AnUndefinedRegionMakesAnEmptyImageOverTheLeastGrid) {
@@ -404,21 +444,66 @@ TEST_F(FastBilateralFilterGPUTest, EveryCallThatFailsFailsTheFrameAndNotTheNext)
         {"glBufferData", "glReadPixels", "glFinish", "glFramebufferTexture2D", "glCheckFramebufferStatus"});
 }
 
+TEST_F(FastBilateralFilterGPUTest, EveryAllocationThatFailsFailsTheFrameAndNotTheNext) {
+    PositionExtentInPixelSpace const region = pixels(0, 0, 9, 7);
+    ImageGPUPtr const upImage = textureOf(scene(region, 1), ImageGPU::PIXEL_FORMAT_RGBA8, false);
+    Texels const expected = filtered(Texels(*upImage), region, {2, 2, 0.15F, true});
+    FastBilateralFilterGPU filter;
+    filter.spatialSigma().setValue(float2(2.0F, 2.0F));
+    filter.colorize().setValue(true);
+    ShaderRoad road(frameContext(), filter);
+    road.setInput(0, *upImage);
+    EXPECT_LE(largestDifference(Texels(*road.run(world(0, 0, 9, 7))), expected, true), 2.0 / 255.0);
+    // Without textures in the pool, so that they are made, too.
+    TexturePool::Instance()->clearAll();
+    road.run(world(0, 0, 9, 7));
+    Usage const before;
+    int nFailed = 0;
+    bool bMore = true;
+    for (std::uint64_t n = 1; bMore; ++n) {
+        SCOPED_TRACE(n);
+        ASSERT_LT(n, 200U);
+        TexturePool::Instance()->clearAll();
+        bool bThrown = false;
+        {
+            Core::AllocationFailure const failure(n);
+            try {
+                road.launch(world(0, 0, 9, 7));
+            } catch (std::bad_alloc const&) {
+                bThrown = true;
+            }
+            bMore = failure.hasFired();
+        }
+        EXPECT_EQ(bMore, bThrown);
+        nFailed += bThrown ? 1 : 0;
+        host().makeCurrent();
+        EXPECT_EQ(GLenum(GL_NO_ERROR), glGetError());
+        EXPECT_EQ(-1, upImage->boundTexUnit());
+        ImageGPU const* const pResult = road.run(world(0, 0, 9, 7));
+        expectSame(before, Usage());
+        EXPECT_LE(largestDifference(Texels(*pResult), expected, true), 2.0 / 255.0);
+    }
+    EXPECT_GE(nFailed, 5); // an image, a copy of the input, two grids, and a state that is restored
+}
+
 TEST_F(FastBilateralFilterGPUTest, AThousandFramesOfChangingSizesGrowNothing) {
     ImageGPUPtr const upImage = textureOf(scene(pixels(0, 0, 12, 12), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
     FastBilateralFilterGPU filter;
     filter.rangeSigma().setValue(1.0F);
     ShaderRoad road(frameContext(), filter);
     road.setInput(0, *upImage);
-    ObjectCounts before;
-    for (int frame = 0; frame < 1000; ++frame) {
-        filter.colorize().setValue(frame % 3 == 0);
-        road.run(world(0, 0, float(4 + frame % 7), float(3 + frame % 5)));
-        if (frame == 200) {
-            before = GLHooks::objects();
+    auto const frames = [&](int nFrames) {
+        for (int frame = 0; frame < nFrames; ++frame) {
+            filter.colorize().setValue(frame % 3 == 0);
+            road.run(world(0, 0, float(4 + frame % 7), float(3 + frame % 5)));
         }
-    }
-    EXPECT_EQ(before, GLHooks::objects());
+    };
+    frames(2 * 105); // all sizes, with and without colours
+    Usage const before;
+    std::uint64_t const nPrograms = GLHooks::calls("glCreateProgram");
+    frames(8 * 105); // ends as the measurement began
+    expectSame(before, Usage());
+    EXPECT_EQ(nPrograms, GLHooks::calls("glCreateProgram"));
 }
 
 } // namespace
