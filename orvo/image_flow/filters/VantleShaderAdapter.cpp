@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <utility>
 
 namespace ORVO {
 
@@ -20,20 +21,23 @@ constexpr std::uint32_t nEntryPointCapacity = 1024;
 constexpr std::uint32_t nCodeCapacity = 8192;
 constexpr std::uint32_t nMaximumMatrixBytes = 16 * sizeof(float);
 
-/// A string of the engine's, dropped at the end of the scope.
+/// A string of the engine's, dropped at the end of the scope unless it was before.
 class EngineString {
 public:
     EngineString() = default;
     explicit EngineString(VantleString* pString) : pString_(pString) {}
     EngineString(EngineString const&) = delete;
     EngineString& operator=(EngineString const&) = delete;
-    ~EngineString() {
+    ~EngineString() { drop(); }
+
+    void drop() noexcept {
+        VantleString* const pDropped = std::exchange(pString_, nullptr);
         try {
-            if (pString_ != nullptr) {
-                CVantle::UnReferenceString(pString_);
+            if (pDropped != nullptr) {
+                CVantle::UnReferenceString(pDropped);
             }
         } catch (...) { // The engine is gone, and the string with it.
-            pString_ = nullptr;
+            return;
         }
     }
 
@@ -107,6 +111,7 @@ void VantleShaderAdapter::getShaderInfo(std::string& entryPoint, std::string& co
     EngineString codeString;
     checkQuorResult(CVantleShader::Strings(vantleShader_, entryPointString.out(), codeString.out()));
     std::string sEntryPoint = entryPointString.text(nEntryPointCapacity);
+    entryPointString.drop();
     code = codeString.text(nCodeCapacity);
     entryPoint.swap(sEntryPoint);
 }

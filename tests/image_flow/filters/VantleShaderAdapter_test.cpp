@@ -80,8 +80,8 @@ TEST_F(VantleShaderAdapterTest, AsksForLengthsBeforeTexts) {
     adapter.getShaderInfo(sEntryPoint, sCode);
     EXPECT_EQ("entry", sEntryPoint);
     EXPECT_EQ("void entry(inout vec4 c) {}\n", sCode);
-    EXPECT_EQ((Lines{"Strings", "StringASCII size 1024", "StringASCII text 5", "StringASCII size 8192",
-                     "StringASCII text 28", "UnReferenceString", "UnReferenceString"}),
+    EXPECT_EQ((Lines{"Strings", "StringASCII size 1024", "StringASCII text 5", "UnReferenceString",
+                     "StringASCII size 8192", "StringASCII text 28", "UnReferenceString"}),
               take());
     // Texts with an end mark, and empty ones.
     RecordingEngine::shader().sEntryPoint_ = std::string("name\0", 5);
