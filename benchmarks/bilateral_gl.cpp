@@ -7,6 +7,7 @@
 // "to_cpu" that divided by the frame on OpenGL; "difference" the largest between the two results, in steps of
 // 8 bits. GB/s counts the picture read once and written once; to_memcpy is the time in times of a copy of
 // those bytes.
+#include "benchmarks/support/GLLayers.h"
 #include "benchmarks/support/Timing.h"
 
 #include "orvo/orvo.h"
@@ -34,28 +35,6 @@ constexpr int kWidth = 1920;
 constexpr int kHeight = 1080;
 
 using Bytes = std::vector<unsigned char>;
-
-/// All layers, on a context of their own, which is current.
-class GLLayers {
-public:
-    GLLayers() { FilterGraph::insertStandardFilters(); }
-    OGL::Context const* context() const { return pContext_.get(); }
-
-private:
-    static std::unique_ptr<OGL::ContextOffscreen> makeContext() {
-        auto pContext = OGL::ContextOffscreen::createHeadless();
-        pContext->makeCurrent();
-        return pContext;
-    }
-
-    Core::AutoInitializer oCore_;
-    OGL::AutoInitializer oOGL_;
-    std::unique_ptr<OGL::ContextOffscreen> pContext_ = makeContext();
-    ImageRuntime::AutoInitializer oRuntime_{pContext_.get(), VideoMemory::Configuration()};
-    DataFlow::AutoInitializer oDataFlow_;
-    ImageFlow::AutoInitializer oImageFlow_{true};
-    FilterGraph::AutoInitializer oFilterGraph_{FilterGraph::Library::InitializationOptions()};
-};
 
 /// Gradients, edges and some noise; opaque, so that premultiplying changes nothing.
 Bytes makePicture() {
@@ -131,7 +110,8 @@ void measure(benchmark::State& state, bool bColorize) {
     using FilterGraph::ImageDescriptorCPU;
     using FilterGraph::ImageDescriptorGL;
     using FilterGraph::ImageGL;
-    GLLayers const layers;
+    Benchmarks::GLLayers const layers;
+    FilterGraph::insertStandardFilters();
     Bytes source = makePicture();
     Bytes result(source.size());
     OGL::Texture2D sourceTexture(OGL::Texture::INTERNAL_FORMAT_RGBA8, kWidth, kHeight, false, source.data());
@@ -141,8 +121,8 @@ void measure(benchmark::State& state, bool bColorize) {
     FilterGraph::ImageCPU sourceCPU(ImageDescriptorCPU(bytesRGBA(), {}), frame(), source.data(), 0);
     FilterGraph::ImageCPU resultCPU(ImageDescriptorCPU(bytesRGBA(), {}), frame(), result.data(), 0);
     // On OpenGL the node alone: an opaque picture needs no companions.
-    Road gpu("FastBilateralFilter", "ImageFlow", "Norvane", sourceGL, resultGL, layers.context(), bColorize);
-    Road cpu("FastBilateralBlur", "Motion Loft", "Norvane Works", sourceCPU, resultCPU, layers.context(),
+    Road gpu("FastBilateralFilter", "ImageFlow", "Norvane", sourceGL, resultGL, &layers.context(), bColorize);
+    Road cpu("FastBilateralBlur", "Motion Loft", "Norvane Works", sourceCPU, resultCPU, &layers.context(),
              bColorize);
     gpu.run(OptimizationOptions::FULL_OPTIMIZATION);
     cpu.run(OptimizationOptions::CPU_PROCESSING);

@@ -17,6 +17,7 @@
 #include "orvo/image_runtime/ImageRuntime.h"
 #include "orvo/ogl/OGL.h"
 
+#include "benchmarks/support/GLLayers.h"
 #include "benchmarks/support/Timing.h"
 
 #include <benchmark/benchmark.h>
@@ -32,6 +33,7 @@
 namespace {
 
 using namespace ORVO;
+using Layers = Benchmarks::CountingGLNodeLayers;
 
 constexpr int nWidth = 1920;
 constexpr int nHeight = 1080;
@@ -49,50 +51,6 @@ std::string shaderOf(char const* pExpression) {
                        "    gl_FragData[0] = ") +
            pExpression + ";\n}\n";
 }
-
-/// Counts the calls of an entry point.
-template <auto* pSlot, typename Function = std::remove_pointer_t<decltype(pSlot)>>
-struct Counted;
-template <auto* pSlot, typename... Arguments>
-struct Counted<pSlot, void (*)(Arguments...)> {
-    static inline void (*pOriginal)(Arguments...) = nullptr;
-    static inline long nCalls = 0;
-
-    static void call(Arguments... arguments) {
-        ++nCalls;
-        pOriginal(arguments...);
-    }
-    static void install(char const* pName) {
-        pOriginal = reinterpret_cast<decltype(pOriginal)>(eglGetProcAddress(pName));
-        *pSlot = &call;
-    }
-};
-using Links = Counted<&epoxy_glLinkProgram>;
-using Textures = Counted<&epoxy_glGenTextures>;
-
-/// All layers up to the nodes, on a context of their own, which is current.
-class Layers {
-public:
-    Layers() : pContext_(makeContext()), oRuntime_(pContext_.get(), VideoMemory::Configuration()) {}
-
-    OGL::Context const& context() const { return *pContext_; }
-
-private:
-    static std::unique_ptr<OGL::ContextOffscreen> makeContext() {
-        auto pContext = OGL::ContextOffscreen::createHeadless();
-        pContext->makeCurrent();
-        Links::install("glLinkProgram");
-        Textures::install("glGenTextures");
-        return pContext;
-    }
-
-    Core::AutoInitializer oCore_;
-    OGL::AutoInitializer oOGL_;
-    std::unique_ptr<OGL::ContextOffscreen> pContext_;
-    ImageRuntime::AutoInitializer oRuntime_;
-    DataFlow::AutoInitializer oDataFlow_;
-    ImageFlow::AutoInitializer oImageFlow_{true};
-};
 
 /// A shader over the input "src".
 class ExpressionFilter : public BasicGLShaderFilter {
@@ -208,11 +166,11 @@ void transform(benchmark::State& state, bool bHalf) {
         for (auto _ : state) {
             aPassed.push_back(Benchmarks::secondsOf([&] { passed.frame(); }));
             aMultiplied.push_back(Benchmarks::secondsOf([&] { multiplied.frame(); }));
-            nLinks -= Links::nCalls;
-            nTextures -= Textures::nCalls;
+            nLinks -= Layers::Links::nCalls;
+            nTextures -= Layers::Textures::nCalls;
             aTransformed.push_back(Benchmarks::secondsOf([&] { transformed.frame(); }));
-            nLinks += Links::nCalls;
-            nTextures += Textures::nCalls;
+            nLinks += Layers::Links::nCalls;
+            nTextures += Layers::Textures::nCalls;
             state.SetIterationTime(aTransformed.back());
         }
         state.counters["of_pass_through"] =

@@ -16,6 +16,8 @@
 #include "orvo/image_runtime/ShaderProgramProxyOGLAutoLock.h"
 #include "orvo/ogl/OGL.h"
 
+#include "benchmarks/support/GLLayers.h"
+
 #include <benchmark/benchmark.h>
 #include <epoxy/egl.h>
 #include <epoxy/gl.h>
@@ -52,6 +54,7 @@ void operator delete(void* pBlock, std::size_t) noexcept { std::free(pBlock); }
 namespace {
 
 using namespace ORVO;
+using Layers = Benchmarks::CountingGLNodeLayers;
 
 constexpr int nSize = 64;
 constexpr std::size_t nFilters = 50;
@@ -67,50 +70,6 @@ void main() {
         (gl_TexCoord[0].xy*_outPixelExtent+_outOffset-src_offset)*src_delta);
 }
 )";
-
-/// Counts the calls of an entry point.
-template <auto* pSlot, typename Function = std::remove_pointer_t<decltype(pSlot)>>
-struct Counted;
-template <auto* pSlot, typename... Arguments>
-struct Counted<pSlot, void (*)(Arguments...)> {
-    static inline void (*pOriginal)(Arguments...) = nullptr;
-    static inline long nCalls = 0;
-
-    static void call(Arguments... arguments) {
-        ++nCalls;
-        pOriginal(arguments...);
-    }
-    static void install(char const* pName) {
-        pOriginal = reinterpret_cast<decltype(pOriginal)>(eglGetProcAddress(pName));
-        *pSlot = &call;
-    }
-};
-using Links = Counted<&epoxy_glLinkProgram>;
-using Textures = Counted<&epoxy_glGenTextures>;
-
-/// All layers up to the nodes, on a context of their own, which is current.
-class Layers {
-public:
-    Layers() : pContext_(makeContext()), oRuntime_(pContext_.get(), VideoMemory::Configuration()) {}
-
-    OGL::Context const& context() const { return *pContext_; }
-
-private:
-    static std::unique_ptr<OGL::ContextOffscreen> makeContext() {
-        auto pContext = OGL::ContextOffscreen::createHeadless();
-        pContext->makeCurrent();
-        Links::install("glLinkProgram");
-        Textures::install("glGenTextures");
-        return pContext;
-    }
-
-    Core::AutoInitializer oCore_;
-    OGL::AutoInitializer oOGL_;
-    std::unique_ptr<OGL::ContextOffscreen> pContext_;
-    ImageRuntime::AutoInitializer oRuntime_;
-    DataFlow::AutoInitializer oDataFlow_;
-    ImageFlow::AutoInitializer oImageFlow_{true};
-};
 
 /// Multiplies its input by its parameter "gain".
 class GainFilter : public BasicGLShaderFilter {
@@ -338,12 +297,12 @@ void frame(benchmark::State& state) {
     long nLarge = 0;
     for (auto _ : state) {
         dLoop += secondsOf([&] { byHand.run(gainOf(iFrame)); });
-        nLinks -= Links::nCalls;
-        nTextures -= Textures::nCalls;
+        nLinks -= Layers::Links::nCalls;
+        nTextures -= Layers::Textures::nCalls;
         nLarge -= nLargeAllocations;
         double const dSeconds = secondsOf([&] { chain.frame(gainOf(iFrame++)); });
-        nLinks += Links::nCalls;
-        nTextures += Textures::nCalls;
+        nLinks += Layers::Links::nCalls;
+        nTextures += Layers::Textures::nCalls;
         nLarge += nLargeAllocations;
         dFrame += dSeconds;
         state.SetIterationTime(dSeconds);

@@ -6,6 +6,7 @@
 // draws. Every frame runs in full and ends when the driver has done with it. The counters are shares of the
 // frame's time: "upload" and "read_back" are frames without filters from memory to a texture and back, run by
 // turns with the others so that all see the same machine, and "passes" is what remains.
+#include "benchmarks/support/GLLayers.h"
 #include "benchmarks/support/Timing.h"
 
 #include "orvo/filter_graph/internal/ImageFlowFilter.h"
@@ -26,6 +27,7 @@
 namespace {
 
 using namespace ORVO;
+using Layers = Benchmarks::GLLayers;
 
 constexpr int WIDTH = 1920;
 constexpr int HEIGHT = 1080;
@@ -80,27 +82,6 @@ PositionExtentInWorldSpace Mean::needed(PositionExtentInWorldSpace const& output
     region.outset(float2(1.0F, 1.0F));
     return region;
 }
-
-/// All layers, on a context of their own, which is current.
-class Layers {
-public:
-    OGL::Context const* context() const { return pContext_.get(); }
-
-private:
-    static std::unique_ptr<OGL::ContextOffscreen> makeContext() {
-        auto pContext = OGL::ContextOffscreen::createHeadless();
-        pContext->makeCurrent();
-        return pContext;
-    }
-
-    Core::AutoInitializer oCore_;
-    OGL::AutoInitializer oOGL_;
-    std::unique_ptr<OGL::ContextOffscreen> pContext_ = makeContext();
-    ImageRuntime::AutoInitializer oRuntime_{pContext_.get(), VideoMemory::Configuration()};
-    DataFlow::AutoInitializer oDataFlow_;
-    ImageFlow::AutoInitializer oImageFlow_{true};
-    FilterGraph::AutoInitializer oFilterGraph_{FilterGraph::Library::InitializationOptions()};
-};
 
 using Bytes = std::vector<unsigned char>;
 
@@ -213,9 +194,9 @@ void measure(benchmark::State& state, std::size_t iRoad) {
     Layers const layers;
     Client source(makePicture());
     Client result(Bytes(source.pixels().size()));
-    Road road(source.image(bFromTexture), result.image(bToTexture), layers.context(), true);
-    Road upload(source.image(false), result.image(true), layers.context(), false);
-    Road readBack(source.image(true), result.image(false), layers.context(), false);
+    Road road(source.image(bFromTexture), result.image(bToTexture), &layers.context(), true);
+    Road upload(source.image(false), result.image(true), &layers.context(), false);
+    Road readBack(source.image(true), result.image(false), &layers.context(), false);
     upload.run();
     readBack.run();
     if (result.texels() != source.pixels() || result.pixels() != source.pixels())

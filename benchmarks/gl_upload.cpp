@@ -13,6 +13,8 @@
 #include "orvo/image_runtime/ImageRuntime.h"
 #include "orvo/ogl/OGL.h"
 
+#include "benchmarks/support/GLLayers.h"
+
 #include <benchmark/benchmark.h>
 #include <epoxy/gl.h>
 
@@ -27,6 +29,7 @@
 namespace {
 
 using namespace ORVO;
+using Layers = Benchmarks::GLNodeLayers;
 
 constexpr int WIDTH = 3840;
 constexpr int HEIGHT = 2160;
@@ -41,28 +44,6 @@ struct Setting {
 
     std::size_t bytes() const { return static_cast<std::size_t>(WIDTH) * HEIGHT * pixelSizeBytes(eCPU); }
     GLenum type() const { return OGL::Texture::Type2GL(eType); }
-};
-
-/// All layers up to the nodes, on a context of their own, which is current.
-class Layers {
-public:
-    Layers() : pContext_(makeContext()), oRuntime_(pContext_.get(), VideoMemory::Configuration()) {}
-
-    OGL::Context const& context() const { return *pContext_; }
-
-private:
-    static std::unique_ptr<OGL::ContextOffscreen> makeContext() {
-        auto pContext = OGL::ContextOffscreen::createHeadless();
-        pContext->makeCurrent();
-        return pContext;
-    }
-
-    Core::AutoInitializer oCore_;
-    OGL::AutoInitializer oOGL_;
-    std::unique_ptr<OGL::ContextOffscreen> pContext_;
-    ImageRuntime::AutoInitializer oRuntime_;
-    DataFlow::AutoInitializer oDataFlow_;
-    ImageFlow::AutoInitializer oImageFlow_{true};
 };
 
 /// A host image of changing bytes, none of them part of a float that is no number.
