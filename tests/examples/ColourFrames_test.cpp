@@ -4,7 +4,9 @@
 #include "apply_filter/FilterList.h"
 #include "apply_filter/FilterValues.h"
 #include "apply_filter/FrameRunner.h"
+#include "common/Engine.h"
 #include "orvo/orvo.h"
+#include "tests/examples/support/PictureDifference.h"
 
 #include <OpenImageIO/imageio.h>
 #include <gtest/gtest.h>
@@ -27,28 +29,13 @@ using FilterPtr = std::shared_ptr<ORVO::FilterGraph::IFilter>;
 class ColourFrames : public testing::Test {
 protected:
     ColourFrames() {
-        context_->makeCurrent();
-        runtime_ = std::make_unique<ORVO::ImageRuntime::AutoInitializer>(context_.get(),
-                                                                         ORVO::VideoMemory::Configuration());
-        dataFlow_ = std::make_unique<ORVO::DataFlow::AutoInitializer>();
-        imageFlow_ = std::make_unique<ORVO::ImageFlow::AutoInitializer>(true);
-        filterGraph_ = std::make_unique<ORVO::FilterGraph::AutoInitializer>(
-            ORVO::FilterGraph::Library::InitializationOptions());
-        ORVO::FilterGraph::insertStandardFilters();
         filter_ = createFilterNamed("ColorspaceTransformer");
         file_ = (fs::temp_directory_path() /
                  ("orvo-colour-" +
                   std::string(testing::UnitTest::GetInstance()->current_test_info()->name()) + ".png"))
                     .string();
     }
-    ~ColourFrames() override {
-        fs::remove(file_);
-        filter_.reset();
-        filterGraph_.reset();
-        imageFlow_.reset();
-        dataFlow_.reset();
-        runtime_.reset();
-    }
+    ~ColourFrames() override { fs::remove(file_); }
 
     int code(char const* name) const { return filter_->parameter(name)->as<int>().value(); }
     void setCodes(char const* source, char const* destination) const {
@@ -60,7 +47,7 @@ protected:
         EXPECT_TRUE(runFrames(filter_, source, result, {context, 1, false}));
         return result;
     }
-    ORVO::OGL::Context const* context() const { return context_.get(); }
+    ORVO::OGL::Context const* context() const { return engine_.context.get(); }
 
     // A picture of all greys and of some colours, with this profile in the file.
     void writeFile(std::vector<unsigned char> const& profile) const {
@@ -80,25 +67,13 @@ protected:
         return picture;
     }
 
+private:
+    Engine engine_{makeContext}; // down after the filter
+
+protected:
     FilterPtr filter_;
     std::string file_;
-
-private:
-    ORVO::Core::AutoInitializer core_;
-    ORVO::OGL::AutoInitializer ogl_;
-    std::unique_ptr<ORVO::OGL::ContextOffscreen> context_ = ORVO::OGL::ContextOffscreen::createHeadless();
-    std::unique_ptr<ORVO::ImageRuntime::AutoInitializer> runtime_;
-    std::unique_ptr<ORVO::DataFlow::AutoInitializer> dataFlow_;
-    std::unique_ptr<ORVO::ImageFlow::AutoInitializer> imageFlow_;
-    std::unique_ptr<ORVO::FilterGraph::AutoInitializer> filterGraph_;
 };
-
-int largestDifference(Picture const& a, Picture const& b) {
-    int largest = a.pixels.size() == b.pixels.size() ? 0 : 1000;
-    for (std::size_t i = 0; i < std::min(a.pixels.size(), b.pixels.size()); ++i)
-        largest = std::max(largest, std::abs(int(a.pixels[i]) - int(b.pixels[i])));
-    return largest;
-}
 
 // The bytes of an RGB profile with the primaries of P3 and a gamma.
 std::vector<unsigned char> profileWithGamma(double gamma) {

@@ -1,6 +1,7 @@
 #include "apply_filter/FrameRunner.h"
 
 #include "apply_filter/FilterList.h"
+#include "common/Engine.h"
 #include "orvo/orvo.h"
 
 #include <gtest/gtest.h>
@@ -26,37 +27,14 @@ using Pixel = std::array<double, 4>; // red, green, blue, alpha
 // The layers as the program starts them: with a context from nothing.
 class FrameRunner : public testing::Test {
 protected:
-    FrameRunner() {
-        context_->makeCurrent();
-        runtime_ = std::make_unique<ORVO::ImageRuntime::AutoInitializer>(context_.get(),
-                                                                         ORVO::VideoMemory::Configuration());
-        dataFlow_ = std::make_unique<ORVO::DataFlow::AutoInitializer>();
-        imageFlow_ = std::make_unique<ORVO::ImageFlow::AutoInitializer>(true);
-        filterGraph_ = std::make_unique<ORVO::FilterGraph::AutoInitializer>(
-            ORVO::FilterGraph::Library::InitializationOptions());
-        ORVO::FilterGraph::insertStandardFilters();
-    }
-    ~FrameRunner() override {
-        filterGraph_.reset();
-        imageFlow_.reset();
-        dataFlow_.reset();
-        runtime_.reset();
-    }
-
-    ORVO::OGL::Context const* context() const { return context_.get(); }
+    ORVO::OGL::Context const* context() const { return engine_.context.get(); }
 
     bool run(std::string const& filter, Picture const& source, Picture& result, bool async = false) const {
         return runFrames(createFilterNamed(filter), source, result, {context(), 1, async});
     }
 
 private:
-    ORVO::Core::AutoInitializer core_;
-    ORVO::OGL::AutoInitializer ogl_;
-    std::unique_ptr<ORVO::OGL::ContextOffscreen> context_ = ORVO::OGL::ContextOffscreen::createHeadless();
-    std::unique_ptr<ORVO::ImageRuntime::AutoInitializer> runtime_;
-    std::unique_ptr<ORVO::DataFlow::AutoInitializer> dataFlow_;
-    std::unique_ptr<ORVO::ImageFlow::AutoInitializer> imageFlow_;
-    std::unique_ptr<ORVO::FilterGraph::AutoInitializer> filterGraph_;
+    Engine engine_{makeContext};
 };
 
 // What a filter does to one pixel, in OpenGL's scale.

@@ -7,6 +7,7 @@
 #include "common/Engine.h"
 #include "common/Picture.h"
 #include "common/PictureIO.h"
+#include "tests/examples/support/PictureDifference.h"
 
 #include <gtest/gtest.h>
 
@@ -46,15 +47,6 @@ Picture scene(std::size_t width, std::size_t height, std::size_t channels, Depth
             reinterpret_cast<float*>(picture.pixels.data())[i] = static_cast<float>(value);
     }
     return picture;
-}
-
-int largestDifference(Picture const& one, Picture const& other) {
-    if (one.pixels.size() != other.pixels.size())
-        return 256;
-    int largest = 0;
-    for (std::size_t i = 0; i < one.pixels.size(); ++i)
-        largest = std::max(largest, std::abs(int(one.pixels[i]) - int(other.pixels[i])));
-    return largest;
 }
 
 class ProcessTiles : public testing::Test {

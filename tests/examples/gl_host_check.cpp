@@ -2,6 +2,7 @@
 // here in double precision. Tolerance: 1 of 255 in each channel of each pixel. Before that it shows, on
 // screenshots that were spoilt on purpose, that the comparison finds a small fault.
 #include "common/Picture.h"
+#include "tests/examples/support/PictureDifference.h"
 
 #include <algorithm>
 #include <cmath>
@@ -36,15 +37,6 @@ Picture filtered(Picture const& photograph) {
         result.pixels[i] = static_cast<unsigned char>(std::lround(value));
     }
     return result;
-}
-
-int largestDifference(Picture const& a, Picture const& b) {
-    if (a.width != b.width || a.height != b.height || a.channels != b.channels)
-        return 256;
-    int largest = 0;
-    for (std::size_t i = 0; i < a.pixels.size(); ++i)
-        largest = std::max(largest, std::abs(a.pixels[i] - b.pixels[i]));
-    return largest;
 }
 
 // Every value taken from another place of the picture.
