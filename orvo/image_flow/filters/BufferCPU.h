@@ -1,58 +1,24 @@
 #pragma once
 
-#include "orvo/core/Export.h"
-#include "orvo/image_flow/nodes/ImageFilter.h"
+#include "orvo/image_flow/filters/ImageBuffer.h"
 
 namespace ORVO {
 
-/// Keeps the last image in host memory that it passed, and can emit it again without its input running.
-/// Input "InputImage", output "OutputImage".
+/// Keeps the last image in host memory that it passed, and can emit it again: see ImageBuffer.
 ///
-/// A run passes the input's image on and keeps it. A run after `emit` gives the image that is kept, whatever
-/// region it covers (`bufferDOD`), and takes nothing from the input; the run after that passes again. To be
-/// emitted again an image must have been passed: a buffer that is told to emit and keeps none is not ready,
-/// also in later frames, until it is run directly. So ask `hasData` first.
+/// Throws beside what ImageBuffer throws, on a bound output, as ImageCPUInput.
 ///
-/// The image is shared with the consumer, and survives a flush. One that a source only refers to must live
-/// for as long as the buffer may give it. Where the output is bound, the compute region is copied into the
-/// bound image, as far as the image covers it.
-///
-/// Throws `InternalException` "Enforce pImage != NULL" for a run without an input image, and on a bound
-/// output as ImageCPUInput.
-///
-/// Threads: as ImageFilter; `hasData` and `bufferDOD` between frames.
-class ORVO_API BufferCPU : public ImageFilter {
+/// Threads: as ImageBuffer.
+class ORVO_API BufferCPU : public ImageBuffer<ImageCPU> {
 public:
     /// Node name "BufferCPU".
     BufferCPU();
     explicit BufferCPU(char const* name);
     ~BufferCPU() override;
 
-    /// Lets the next run give the image that is kept.
-    void emit() override;
-    /// True.
-    bool canEmit() const override;
-    /// Before a run that passes as `Node::isReady`; before one that emits: whether there is an image, and no
-    /// output that is not bound still holds data.
-    bool isReady() const override;
-
-    /// Whether an image is kept.
-    bool hasData() const;
-    /// The pixels that the image which is kept covers; a default rectangle if there is none.
-    virtual PositionExtentInPixelSpace bufferDOD() const;
-
 protected:
-    void internalProcess() override;
     void postProcess() override;
-
-private:
-    void passOn();
-    void handOut();
-
-    bool bPassThrough_;
-    DataFlow::ConstDataPointer<ImageCPU> oBuffered_;
-    DataFlow::ConstInput<ImageCPU> oInputImage_;
-    DataFlow::ConstOutput<ImageCPU> oOutputImage_;
+    void copyToBoundOutput(ImageCPU const& image) override;
 };
 
 } // namespace ORVO
