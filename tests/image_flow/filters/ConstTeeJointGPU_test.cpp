@@ -121,6 +121,48 @@ TEST_F(ConstTeeJointGPUTest, CopiesIntoABoundTexture) {
     EXPECT_EQ(upTarget.get(), tee.clonedImageOutput(0)->data());
 }
 
+TEST_F(ConstTeeJointGPUTest, EveryFailureOnTheWayToABoundTextureLeavesTheNextFrameRight) {
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 5, 4), 3), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upTarget = textureImage(pixels(0, 0, 5, 4), ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const input(*upInput);
+    OpenTee tee;
+    ShaderRoad road(frameContext(), tee);
+    road.setInput(0, *upInput);
+    auto const expectRight = [&] {
+        writeTexels(*upTarget, std::vector<unsigned char>(4 * 5 * 4, 7));
+        road.runInto(*upTarget, world(0, 0, 5, 4));
+        EXPECT_EQ("", differences(Texels(*upTarget), input, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
+        EXPECT_EQ(upTarget.get(), tee.clonedImageOutput(0)->data());
+    };
+    expectRight();
+    std::set<std::string> const aFailed = failEveryCall([&] { road.runInto(*upTarget, world(0, 0, 5, 4)); },
+                                                        [&] {
+                                                            // None is current where the driver did not give
+                                                            // it back.
+                                                            host().makeCurrent();
+                                                            EXPECT_EQ(0U, drainErrors());
+                                                            expectRight();
+                                                        },
+                                                        {"eglMakeCurrent"});
+    EXPECT_EQ(1U, aFailed.count("glCheckFramebufferStatus"));
+    std::size_t const nBlocks = Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT);
+    bool bMore = true;
+    for (std::uint64_t n = 1; bMore; ++n) {
+        ASSERT_LT(n, 100U);
+        {
+            Core::AllocationFailure const failure(n);
+            try {
+                road.runInto(*upTarget, world(0, 0, 5, 4));
+            } catch (std::bad_alloc const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bMore = failure.hasFired();
+        }
+        expectRight();
+        EXPECT_EQ(nBlocks, Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT));
+    }
+}
+
 TEST_F(ConstTeeJointGPUTest, EveryAllocationOfItsConstructionMayFail) {
     std::uint64_t n = 1;
     for (bool bMore = true; bMore && n < 50; ++n) {
