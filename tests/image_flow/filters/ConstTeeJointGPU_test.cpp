@@ -41,27 +41,33 @@ TEST_F(ConstTeeJointGPUTest, BothConsumersShareTheTexture) {
     TextureNode left;
     TextureNode right;
     TextureNode end(2, false);
-    ImageGPUPtr const upImage = textureImage(pixels(0, 0, 4, 3), ImageGPU::PIXEL_FORMAT_RGBA8);
+    std::vector<ImageGPUPtr> aupImages;
+    for (int i = 0; i < 12; ++i)
+        aupImages.push_back(textureImage(pixels(0, 0, 1 + i % 4, 1 + i % 3), ImageGPU::PIXEL_FORMAT_RGBA8));
     DataFlow::Connect(*left.imageInput(0), *tee.imageOutput());
     DataFlow::Connect(*right.imageInput(0), *tee.clonedImageOutput(0));
     feed(end, 0, left);
     feed(end, 1, right);
     ImageGPUInput source;
     feed(tee, 0, source);
-    source.setImageGPUWithNoOwnership(upImage.get());
     NodeScope const scope(tee);
     ImageFlowController controller;
     plant(controller, {&source, &tee, &left, &right, &end}, end);
     controller.setContextGPU(frameContext());
     auto const nTextures = GLHooks::calls("glGenTextures");
-    for (int i = 0; i < 1000 && !HasFailure(); ++i) {
+    std::size_t nBytes = 0;
+    for (std::size_t i = 0; i < 1000 && !HasFailure(); ++i) {
+        ImageGPU& image = *aupImages[i % aupImages.size()];
+        source.setImageGPUWithNoOwnership(&image);
         source.emit();
-        controller.computeRegions(world(0, 0, 4, 3));
+        controller.computeRegions(pixelToWorldSpace(image.positionExtent(), PixelExtentInWorldSpace()));
         controller.process();
-        EXPECT_EQ(upImage.get(), left.pSeen_);
-        EXPECT_EQ(upImage.get(), right.pSeen_);
+        EXPECT_EQ(&image, left.pSeen_);
+        EXPECT_EQ(&image, right.pSeen_);
         EXPECT_FALSE(tee.imageInput(0)->hasData());
+        nBytes = i == 11 ? Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT) : nBytes;
     }
+    EXPECT_EQ(nBytes, Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT));
     EXPECT_EQ(1000, end.nRuns_);
     EXPECT_LE(GLHooks::calls("glGenTextures"), nTextures + 2); // of the two nodes, which the pool reuses
     end.disconnect();

@@ -264,10 +264,23 @@ TEST_F(DeformationSourceTest, AThousandMapsLeaveNothingBehind) {
     std::vector<float> const aValues = values(7 * 5);
     DeformationMap map{1, 1, aValues.data()};
     OpenDeformationSource source("deform", &map);
+    TextureNode end(1, false);
+    feed(end, 0, source);
+    ImageFlowController controller;
+    plant(controller, {&source, &end}, end);
+    controller.setContextGPU(frameContext());
+    std::size_t nBytes = 0;
     for (std::uint32_t i = 0; i < 1000; ++i) {
         DeformationMap next{1 + i % 7, 1 + i % 5, aValues.data()};
+        controller.flushGraph();
         source.setDeformationMap(&next);
+        source.emit();
+        controller.computeRegions(world(0, 0, float(next.width), float(next.height)));
+        controller.process();
+        nBytes = i == 69 ? Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT) : nBytes;
     }
+    EXPECT_EQ(1000, end.nRuns_);
+    EXPECT_EQ(nBytes, Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT));
     EXPECT_LE(GLHooks::objects()["texture"], 37L); // one for each size, the pool's and the one that is held
 }
 
