@@ -5,6 +5,7 @@
 
 #include "orvo/core/Check.h"
 #include "orvo/ogl/internal/Scopes.h"
+#include "orvo/ogl/internal/ShareGroup.h"
 #include "orvo/ogl/internal/TokenTable.h"
 
 namespace ORVO::OGL {
@@ -45,9 +46,8 @@ Buffer::Buffer(long long size, Type type, Usage usage, void const* pData)
 }
 
 Buffer::~Buffer() {
-    GLuint const nName = Buffer::objectID();
-    if (isShareGroupCurrent())
-        epoxy_glDeleteBuffers(1, &nName);
+    if (Internal::ShareGroup const* const pGroup = shareGroup())
+        pGroup->destroy(Internal::ShareGroup::Kind::buffer, Buffer::objectID());
 }
 
 unsigned Buffer::getBoundID() const {

@@ -28,7 +28,7 @@ public:
     /// A buffer of size bytes with a copy of the data, undefined where pData is null. Leaves the bindings as
     /// they were. Throws ParameterException "size >= 0", ExceptionOGL.
     Buffer(long long size, Type type, Usage usage, void const* pData);
-    /// Deletes the buffer, which ends a mapping, if a context of its share group is current.
+    /// Deletes the buffer, which ends a mapping: as Object says.
     ~Buffer() override;
 
     /// Size in bytes.

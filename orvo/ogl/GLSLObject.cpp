@@ -9,6 +9,4 @@ GLSLObject::~GLSLObject() = default;
 
 void GLSLObject::joinShareGroup() { spGroup_ = Internal::ShareGroup::current(); }
 
-bool GLSLObject::isShareGroupCurrent() const noexcept { return spGroup_ != nullptr && spGroup_->isCurrent(); }
-
 } // namespace ORVO::OGL

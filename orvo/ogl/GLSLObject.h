@@ -10,8 +10,8 @@ namespace Internal {
 class ShareGroup;
 }
 
-/// Base of the objects of the shading language: a name, which is no texture's or buffer's. Made and destroyed
-/// as Object is.
+/// Base of the objects of the shading language: a name, which is no texture's or buffer's. Made, destroyed
+/// and deleted as Object is.
 ///
 /// Threads: any thread with a context of the share group current, one thread at a time for one object.
 class ORVO_API GLSLObject {
@@ -28,8 +28,8 @@ protected:
     void setObjectID(unsigned nName) noexcept { nName_ = nName; }
     /// Remembers the current context's share group. Throws ExceptionOGL.
     void joinShareGroup();
-    /// Whether a context of that group is current: only then is the name to be deleted.
-    bool isShareGroupCurrent() const noexcept;
+    /// That group; null before.
+    Internal::ShareGroup const* shareGroup() const noexcept { return spGroup_.get(); }
 
 private:
     unsigned nName_ = 0;

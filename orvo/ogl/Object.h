@@ -12,10 +12,11 @@ class ShareGroup;
 
 /// Base of objects that OpenGL knows by a name: a target to bind to, and what is bound there.
 ///
-/// Objects are made in the calling thread's current context and are destroyed while a context of the same
-/// share group is current; without one, or with a foreign one, destruction leaves the name to the group's
-/// end. Every operation that speaks to OpenGL throws ExceptionOGL "No OpenGL context is current" if there is
-/// none.
+/// Objects are made in the calling thread's current context. Destroyed while a context of the same share
+/// group is current, they delete their name; without one, or with a foreign one, the name is deleted when a
+/// context of the group is next made current through this layer, or an object is made in one. Once no object
+/// and no context of the library is left in the group, names that still wait live as long as the group. Every
+/// operation that speaks to OpenGL throws ExceptionOGL "No OpenGL context is current" if there is none.
 ///
 /// Threads: any thread with a context of the share group current, one thread at a time for one object.
 class ORVO_API Object {
@@ -42,6 +43,8 @@ protected:
     void setObjectID(unsigned nName) noexcept { nName_ = nName; }
     /// Remembers the current context's share group. Throws ExceptionOGL.
     void joinShareGroup();
+    /// That group; null before.
+    Internal::ShareGroup const* shareGroup() const noexcept { return spGroup_.get(); }
 
 private:
     unsigned nTarget_;

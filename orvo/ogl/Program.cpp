@@ -11,6 +11,7 @@
 #include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/Scopes.h"
 #include "orvo/ogl/internal/ShaderLog.h"
+#include "orvo/ogl/internal/ShareGroup.h"
 
 namespace ORVO::OGL {
 
@@ -75,10 +76,14 @@ Program::Program() : pDetails_(std::make_unique<Details>()) {
 }
 
 Program::~Program() {
-    if (!isShareGroupCurrent())
+    using Kind = Internal::ShareGroup::Kind;
+    Internal::ShareGroup const* const pGroup = shareGroup();
+    if (pGroup == nullptr)
         return;
-    releaseShaders();
-    glDeleteProgram(objectID());
+    // Shaders go with the program that they are attached to.
+    for (Details::Shader const& shader : pDetails_->aShaders_)
+        pGroup->destroy(Kind::shader, shader.nName_);
+    pGroup->destroy(Kind::program, objectID());
 }
 
 void Program::loadVertexShader(unsigned count, char const** ppSources, int* pLengths) {

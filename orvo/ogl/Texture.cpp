@@ -8,6 +8,7 @@
 #include "orvo/core/Check.h"
 #include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/Scopes.h"
+#include "orvo/ogl/internal/ShareGroup.h"
 
 namespace ORVO::OGL {
 
@@ -46,9 +47,8 @@ Texture::Texture(unsigned nTarget, InternalFormat format, Extent const& extent, 
 }
 
 Texture::~Texture() {
-    GLuint const nName = Texture::objectID();
-    if (isShareGroupCurrent())
-        glDeleteTextures(1, &nName);
+    if (Internal::ShareGroup const* const pGroup = shareGroup())
+        pGroup->destroy(Internal::ShareGroup::Kind::texture, Texture::objectID());
 }
 
 unsigned Texture::getBoundID() const {

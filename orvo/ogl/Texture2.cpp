@@ -52,6 +52,7 @@ void Texture2::copyTexSubImage(int level, int x, int y, int sourceX, int sourceY
     requireBound();
     if (w == 0 || h == 0)
         return;
+    Internal::ScopedPlainPixelTransfer const transfer;
     glCopyTexSubImage2D(target(), level, x, y, sourceX, sourceY, static_cast<GLsizei>(w),
                         static_cast<GLsizei>(h));
 }

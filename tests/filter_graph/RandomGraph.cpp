@@ -1,40 +1,16 @@
 #include "tests/filter_graph/RandomGraph.h"
 
 #include <algorithm>
-#include <cmath>
-#include <cstring>
 #include <set>
-#include <sstream>
+
+#include "orvo/filter_graph/filters/Bilateral.h"
+#include "tests/filter_graph/support/ColourGraph.h"
 
 namespace ORVO::Test {
 
 using FilterGraph::ImageDescriptor;
 
 namespace {
-
-constexpr float kSpoiled = 77.0f;
-
-std::size_t bytesOf(ImageDescriptor::eChannelType type) {
-    return type == ImageDescriptor::CHANNEL_TYPE_UINT8      ? 1
-           : type == ImageDescriptor::CHANNEL_TYPE_UINT15_1 ? 2
-                                                            : 4;
-}
-
-/// The smallest rectangle around both; an empty one adds nothing.
-RasterValues around(RasterValues const& a, RasterValues const& b) {
-    if (a.width == 0 || a.height == 0) {
-        return b;
-    }
-    if (b.width == 0 || b.height == 0) {
-        return a;
-    }
-    RasterValues result = a;
-    result.x = std::min(a.x, b.x);
-    result.y = std::min(a.y, b.y);
-    result.width = std::max(a.x + a.width, b.x + b.width) - result.x;
-    result.height = std::max(a.y + a.height, b.y + b.height) - result.y;
-    return result;
-}
 
 PositionExtentInWorldSpace worldOf(RasterValues const& rect, float pixelSize) {
     return {
@@ -45,72 +21,14 @@ PositionExtentInWorldSpace worldOf(RasterValues const& rect, float pixelSize) {
 
 } // namespace
 
-std::size_t RasterValues::index(int px, int py, std::size_t channel) const {
-    return (static_cast<std::size_t>(py - y) * static_cast<std::size_t>(width) +
-            static_cast<std::size_t>(px - x)) *
-               channels +
-           channel;
-}
-
-float RasterValues::at(int px, int py, std::size_t channel) const {
-    return contains(px, py) ? values[index(px, py, channel)] : 0.0f;
-}
-
-// ---- Images
-
-AnyImage::AnyImage(ImageDescriptor::eChannelType type, float pixelSize, RasterValues const& picture)
-    : eType_(type),
-      oRect_(picture),
-      aBytes_(static_cast<std::size_t>(picture.width) * static_cast<std::size_t>(picture.height) *
-              picture.channels * bytesOf(type)),
-      oHandle_(FilterGraph::ImageDescriptorCPU({picture.channels, type},
-                                               PixelExtentInWorldSpace(pixelSize, pixelSize)),
-               PositionExtentInPixelSpace(PositionInPixelSpace(picture.x, picture.y),
-                                          ExtentInPixelSpace(picture.width, picture.height)),
-               aBytes_.data(), 0) {
-    oRect_.values.clear();
-    store(picture);
-}
-
-void AnyImage::store(RasterValues const& picture) {
-    for (std::size_t i = 0; i < picture.values.size(); ++i) {
-        unsigned char* const pChannel = aBytes_.data() + i * bytesOf(eType_);
-        float const value = picture.values[i];
-        if (eType_ == ImageDescriptor::CHANNEL_TYPE_UINT8) {
-            *pChannel = static_cast<unsigned char>(value);
-        } else if (eType_ == ImageDescriptor::CHANNEL_TYPE_UINT15_1) {
-            auto const word = static_cast<std::uint16_t>(value);
-            std::memcpy(pChannel, &word, sizeof word);
-        } else {
-            std::memcpy(pChannel, &value, sizeof value);
-        }
-    }
-}
-
-RasterValues AnyImage::load() const {
-    RasterValues picture = oRect_;
-    picture.values.resize(aBytes_.size() / bytesOf(eType_));
-    for (std::size_t i = 0; i < picture.values.size(); ++i) {
-        unsigned char const* const pChannel = aBytes_.data() + i * bytesOf(eType_);
-        if (eType_ == ImageDescriptor::CHANNEL_TYPE_UINT8) {
-            picture.values[i] = *pChannel;
-        } else if (eType_ == ImageDescriptor::CHANNEL_TYPE_UINT15_1) {
-            std::uint16_t word = 0;
-            std::memcpy(&word, pChannel, sizeof word);
-            picture.values[i] = word;
-        } else {
-            std::memcpy(&picture.values[i], pChannel, sizeof(float));
-        }
-    }
-    return picture;
-}
-
 // ---- Building
 
-RandomGraph::RandomGraph(std::uint32_t seed, IAdapter::eRegionSyncMode mode, std::size_t maxFilters)
+RandomGraph::RandomGraph(std::uint32_t seed, IAdapter::eRegionSyncMode mode, std::size_t maxFilters,
+                         eFilters filters)
     : oRandom_(seed),
       eMode_(mode),
       nMaxFilters_(maxFilters),
+      eFilters_(filters),
       spSink_(FilterGraph::createOutputAdapter(mode)) {
     oRandom_.discard(7);
     eType_ = chance(60)   ? ImageDescriptor::CHANNEL_TYPE_FLOAT32
@@ -152,6 +70,9 @@ std::size_t RandomGraph::numberOfInputs(eKind kind) {
 }
 
 char const* RandomGraph::inputName(Node const& node, std::size_t iInput) {
+    if (node.kind == BILATERAL || node.kind == TRANSFORMER) {
+        return "src";
+    }
     return node.kind != MIX ? "input" : iInput == 0 ? "a" : "b";
 }
 
@@ -161,7 +82,12 @@ RandomGraph::eKind RandomGraph::randomKind() {
     }
     for (;;) {
         auto const kind = static_cast<eKind>(random(SOURCE, KINDS - 1));
+        // What the two filters of the library take; they cost more than all others together.
+        bool const bLibrary = eFilters_ == ALL_FILTERS && nChannels_ >= 3;
+        bool const bBilateral = bLibrary && eType_ != ImageDescriptor::CHANNEL_TYPE_UINT15_1 && chance(25);
+        bool const bTransformer = bLibrary && eType_ != ImageDescriptor::CHANNEL_TYPE_FLOAT32 && chance(25);
         bool const bAllowed = (kind != SIMD_GAIN || bSIMD_) && (kind != BLUR || nBlurs_ < 4) &&
+                              (kind != BILATERAL || bBilateral) && (kind != TRANSFORMER || bTransformer) &&
                               // Sources end a branch: fewer of them make larger graphs.
                               (numberOfInputs(kind) > 0 || chance(35));
         if (bAllowed) {
@@ -200,6 +126,12 @@ RandomGraph::Node* RandomGraph::makeNode(int rank) {
     case MIX:
         pNode->spFilter = makeFilter<MixNode>("mix");
         break;
+    case BILATERAL:
+        pNode->spFilter = std::make_shared<FilterGraph::Internal::Bilateral>();
+        break;
+    case TRANSFORMER:
+        pNode->spFilter = std::make_shared<ColorspaceTransformer>();
+        break;
     case SIMD_GAIN:
     case KINDS:
         pNode->spFilter = makeFilter<SIMDGainNode>("simd gain");
@@ -236,6 +168,21 @@ void RandomGraph::randomiseParameters(Node& node) {
     case MIX:
         node.value *= 0.1f;
         setParameter(*node.spFilter, "amount", node.value);
+        break;
+    case BILATERAL:
+        node.width = static_cast<float>(random(1, 6)) * 0.5f;
+        node.height = static_cast<float>(random(1, 6)) * 0.5f;
+        node.value = 0.1f * static_cast<float>(random(1, 5));
+        node.colorize = chance(50);
+        node.spFilter->parameter("spatialSigma")->as<float2>().setValue(float2(node.width, node.height));
+        node.spFilter->parameter("rangeSigma")->as<float>().setValue(node.value);
+        node.spFilter->parameter("colorize")->as<bool>().setValue(node.colorize);
+        break;
+    case TRANSFORMER:
+        for (std::uint32_t& code : node.codes) {
+            code = chance(50) ? ColourEngine::PROFILE_SRGB : ColourEngine::PROFILE_WIDE_GAMUT;
+        }
+        setCodes(*node.spFilter, node.codes[0], node.codes[1]);
         break;
     case SOURCE:
     case KINDS:
@@ -379,147 +326,6 @@ void RandomGraph::removeUnreachable() {
         }
     }
     aNodes_.erase(std::remove_if(aNodes_.begin(), aNodes_.end(), isGone), aNodes_.end());
-}
-
-// ---- The reference
-
-float RandomGraph::quantised(float value) const {
-    float const highest = eType_ == ImageDescriptor::CHANNEL_TYPE_UINT8 ? 255.0f : 65535.0f;
-    return eType_ == ImageDescriptor::CHANNEL_TYPE_FLOAT32
-               ? value
-               : std::min(std::max(std::nearbyint(value), 0.0f), highest);
-}
-
-RasterValues RandomGraph::evaluateDomain(Node const& node, std::vector<RasterValues> const& inputs) const {
-    RasterValues domain;
-    if (node.kind == SOURCE) {
-        domain = node.spImage->rect();
-    } else if (node.kind == GENERATOR) {
-        domain.width = static_cast<int>(node.width);
-        domain.height = static_cast<int>(node.height);
-    } else {
-        for (RasterValues const& input : inputs) {
-            RasterValues grown = input;
-            int const margin = node.kind == BLUR ? node.count : 0;
-            grown.x -= margin;
-            grown.y -= margin;
-            grown.width += 2 * margin;
-            grown.height += 2 * margin;
-            domain = around(domain, grown);
-        }
-    }
-    domain.channels = nChannels_;
-    domain.values.clear();
-    return domain;
-}
-
-float RandomGraph::evaluatePixel(Node const& node, std::vector<RasterValues> const& inputs, int x, int y,
-                                 std::size_t channel) const {
-    switch (node.kind) {
-    case GENERATOR:
-        return node.value + 0.5f * static_cast<float>(x) + static_cast<float>(y) +
-               static_cast<float>(channel);
-    case ADD:
-        return inputs[0].at(x, y, channel) + node.value;
-    case GAIN:
-    case SIMD_GAIN:
-        return inputs[0].at(x, y, channel) * node.value;
-    case MIX:
-        return inputs[0].at(x, y, channel) * (1.0f - node.value) + inputs[1].at(x, y, channel) * node.value;
-    case BLUR: {
-        float sum = 0.0f;
-        for (int row = y - node.count; row <= y + node.count; ++row) {
-            for (int column = x - node.count; column <= x + node.count; ++column) {
-                sum += inputs[0].at(column, row, channel);
-            }
-        }
-        auto const side = static_cast<float>(2 * node.count + 1);
-        return sum / (side * side);
-    }
-    case SOURCE:
-    case KINDS:
-        break;
-    }
-    return 0.0f;
-}
-
-RasterValues RandomGraph::evaluate(Node const& node, std::map<Node const*, RasterValues>& known) {
-    auto const iKnown = known.find(&node);
-    if (iKnown != known.end()) {
-        return iKnown->second;
-    }
-    std::vector<RasterValues> inputs;
-    for (Node const* const pInput : node.aInputs) {
-        inputs.push_back(evaluate(*pInput, known));
-    }
-    RasterValues result = evaluateDomain(node, inputs);
-    if (node.kind == SOURCE) {
-        result = node.spImage->load();
-    } else {
-        for (int y = result.y; y < result.y + result.height; ++y) {
-            for (int x = result.x; x < result.x + result.width; ++x) {
-                for (std::size_t channel = 0; channel < nChannels_; ++channel) {
-                    result.values.push_back(quantised(evaluatePixel(node, inputs, x, y, channel)));
-                }
-            }
-        }
-    }
-    return known[&node] = result;
-}
-
-void RandomGraph::spoilOutput() {
-    RasterValues spoiled = spOutput_->load();
-    std::fill(spoiled.values.begin(), spoiled.values.end(), kSpoiled);
-    spOutput_->store(spoiled);
-}
-
-RasterValues RandomGraph::expectedOutput() {
-    std::map<Node const*, RasterValues> known;
-    RasterValues const result = evaluate(*pTop_, known);
-    RasterValues expected = spOutput_->load();
-    for (int y = expected.y; y < expected.y + expected.height; ++y) {
-        for (int x = expected.x; x < expected.x + expected.width; ++x) {
-            for (std::size_t channel = 0; channel < nChannels_; ++channel) {
-                bool const bWritten = oRequested_.contains(x, y) && result.contains(x, y);
-                expected.values[expected.index(x, y, channel)] =
-                    bWritten ? result.at(x, y, channel) : kSpoiled;
-            }
-        }
-    }
-    return expected;
-}
-
-bool RandomGraph::isOutputRight() {
-    std::vector<float> const expected = expectedOutput().values;
-    std::vector<float> const computed = spOutput_->load().values;
-    return std::memcmp(expected.data(), computed.data(), expected.size() * sizeof(float)) == 0;
-}
-
-std::string RandomGraph::describeDifference() {
-    static char const* const kNames[] = {"source", "generator", "add", "gain", "blur", "mix", "simd gain"};
-    RasterValues const expected = expectedOutput();
-    RasterValues const computed = spOutput_->load();
-    std::ostringstream text;
-    for (std::size_t i = 0; i < expected.values.size(); ++i) {
-        if (std::memcmp(&expected.values[i], &computed.values[i], sizeof(float)) != 0) {
-            auto const pixel = static_cast<int>(i / nChannels_);
-            text << "pixel (" << expected.x + pixel % expected.width << ", "
-                 << expected.y + pixel / expected.width << "), channel " << i % nChannels_ << ": computed "
-                 << computed.values[i] << ", expected " << expected.values[i] << "\n";
-            break;
-        }
-    }
-    text << "output " << expected.x << ", " << expected.y << ", " << expected.width << " x "
-         << expected.height << ", type " << static_cast<int>(eType_) << ", " << nChannels_ << " channels\n";
-    for (auto const& pNode : aNodes_) {
-        text << pNode.get() << " " << kNames[pNode->kind] << " " << pNode->value << " " << pNode->count
-             << " from";
-        for (Node const* const pInput : pNode->aInputs) {
-            text << " " << pInput;
-        }
-        text << "\n";
-    }
-    return text.str();
 }
 
 } // namespace ORVO::Test

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <map>
 #include <memory>
@@ -7,58 +8,32 @@
 #include <string>
 #include <vector>
 
+#include "tests/filter_graph/AnyImage.h"
 #include "tests/support/FrameTest.h"
 
 namespace ORVO::Test {
 
-/// A rectangle of pixels with its values, as the reference computes them.
-struct RasterValues {
-    int x = 0;
-    int y = 0;
-    int width = 0;
-    int height = 0;
-    std::size_t channels = 1;
-    std::vector<float> values;
-
-    bool contains(int px, int py) const { return px >= x && py >= y && px < x + width && py < y + height; }
-    std::size_t index(int px, int py, std::size_t channel) const;
-
-    /// 0 outside.
-    float at(int px, int py, std::size_t channel) const;
-};
-
-/// A client image of one of the channel types, with pixels of its own.
-class AnyImage {
-public:
-    AnyImage(FilterGraph::ImageDescriptor::eChannelType type, float pixelSize, RasterValues const& picture);
-
-    FilterGraph::ImageCPU* handle() { return &oHandle_; }
-    RasterValues const& rect() const { return oRect_; }
-
-    void store(RasterValues const& picture);
-    RasterValues load() const;
-
-private:
-    FilterGraph::ImageDescriptor::eChannelType eType_;
-    RasterValues oRect_; // without values
-    std::vector<unsigned char> aBytes_;
-    FilterGraph::ImageCPU oHandle_;
-};
-
 /// A graph of up to 30 filters with several sources and fan-out, which can be changed at random, and an
 /// evaluation of its own: each filter is computed from scratch over its whole domain, by recursion, with the
-/// arithmetic of the test filters and nothing of the library.
+/// arithmetic of the test filters and nothing of the library. Bilateral filters, whose result hangs on the
+/// region that a frame computes, are run over that region by the algorithm itself, and colour transforms are
+/// asked from the engine: both without a graph.
 ///
 /// Every filter reaches the output, as a processor asks of a graph. Each has a rank above those of its
 /// consumers, so that no connection closes a cycle.
 class RandomGraph {
 public:
-    enum eKind { SOURCE, GENERATOR, ADD, GAIN, BLUR, MIX, SIMD_GAIN, KINDS };
+    enum eKind { SOURCE, GENERATOR, ADD, GAIN, BLUR, MIX, SIMD_GAIN, BILATERAL, TRANSFORMER, KINDS };
 
-    RandomGraph(std::uint32_t seed, IAdapter::eRegionSyncMode mode, std::size_t maxFilters = 30);
+    /// Whether the filters of the library may stand in a graph beside those of the tests.
+    enum eFilters { TEST_FILTERS, ALL_FILTERS };
+
+    RandomGraph(std::uint32_t seed, IAdapter::eRegionSyncMode mode, std::size_t maxFilters = 30,
+                eFilters filters = ALL_FILTERS);
 
     SinkPtr const& sink() const { return spSink_; }
     std::size_t numberOfFilters() const { return aNodes_.size(); }
+    std::size_t numberOf(eKind kind) const;
 
     /// Makes between one and four changes: parameters, pixels, images, regions, connections.
     void change();
@@ -87,6 +62,9 @@ private:
         int count = 0;      // radius of blurs
         float width = 0.0f; // generators, in pixels
         float height = 0.0f;
+        bool colorize = false; // bilateral filters; `value` is their range sigma, `width` and `height` theirs
+        std::array<std::uint32_t, 2> codes{}; // of the spaces that a transformer goes between
+        RasterValues interest;                // what the frame asks of it, without values
     };
 
     static char const* inputName(Node const& node, std::size_t iInput);
@@ -109,7 +87,11 @@ private:
     void reconnect();
     void removeUnreachable();
 
+    RasterValues grown(RasterValues rect, Node const& node) const;
+    void findInterests();
     RasterValues evaluate(Node const& node, std::map<Node const*, RasterValues>& known);
+    RasterValues evaluateBilateral(Node const& node, RasterValues const& input, RasterValues result) const;
+    RasterValues evaluateTransformer(Node const& node, RasterValues input) const;
     RasterValues evaluateDomain(Node const& node, std::vector<RasterValues> const& inputs) const;
     float evaluatePixel(Node const& node, std::vector<RasterValues> const& inputs, int x, int y,
                         std::size_t channel) const;
@@ -119,6 +101,7 @@ private:
     std::minstd_rand oRandom_;
     IAdapter::eRegionSyncMode eMode_;
     std::size_t nMaxFilters_;
+    eFilters eFilters_;
     FilterGraph::ImageDescriptor::eChannelType eType_;
     std::size_t nChannels_;
     float fPixelSize_;

@@ -133,7 +133,7 @@ bool throwsWhileArmed(Statement const& statement) {
     return false;
 }
 
-class AllocationFailureTest : public FrameTest, public testing::WithParamInterface<std::uint32_t> {
+class FailingFrameTest : public FrameTest {
 protected:
     using Frame = void (*)(IProcessor& processor);
 
@@ -193,8 +193,7 @@ protected:
         return bFired_ && !HasFailure();
     }
 
-    void failEachInTurn(Frame frame) {
-        RandomGraph graph(GetParam(), IAdapter::REGION_SYNC_FROM_IMAGE, 12);
+    void failEachInTurn(RandomGraph& graph, Frame frame) {
         // What is made once for the process, such as the classes of sizes of the image store, is no leak.
         for (int warming = 0; warming < 40; ++warming) {
             round(graph, 1L << 40, frame);
@@ -216,11 +215,42 @@ protected:
     int nThrown_ = 0;
 };
 
-TEST_P(AllocationFailureTest, OfSynchronousFrames) { failEachInTurn(runSynchronously); }
+class AllocationFailureTest : public FailingFrameTest, public testing::WithParamInterface<std::uint32_t> {};
 
-TEST_P(AllocationFailureTest, OfAsynchronousFrames) { failEachInTurn(runAsynchronously); }
+TEST_P(AllocationFailureTest, OfSynchronousFrames) {
+    RandomGraph graph(GetParam(), IAdapter::REGION_SYNC_FROM_IMAGE, 12, RandomGraph::TEST_FILTERS);
+    failEachInTurn(graph, runSynchronously);
+}
+
+TEST_P(AllocationFailureTest, OfAsynchronousFrames) {
+    RandomGraph graph(GetParam(), IAdapter::REGION_SYNC_FROM_IMAGE, 12, RandomGraph::TEST_FILTERS);
+    failEachInTurn(graph, runAsynchronously);
+}
 
 INSTANTIATE_TEST_SUITE_P(TenGraphs, AllocationFailureTest, testing::Range(1u, 11u));
+
+/// The same with one filter of the library, which makes more allocations than all else: the first small graph
+/// that has one.
+class LibraryFilterAllocationFailureTest : public FailingFrameTest {
+protected:
+    void failEachInGraphWith(RandomGraph::eKind kind) {
+        for (std::uint32_t seed = 1;; ++seed) {
+            RandomGraph graph(seed, IAdapter::REGION_SYNC_FROM_IMAGE, 2);
+            if (graph.numberOf(kind) == 1 && graph.numberOfFilters() == 2) {
+                failEachInTurn(graph, runSynchronously);
+                return;
+            }
+        }
+    }
+};
+
+TEST_F(LibraryFilterAllocationFailureTest, OfTheBilateralFilter) {
+    failEachInGraphWith(RandomGraph::BILATERAL);
+}
+
+TEST_F(LibraryFilterAllocationFailureTest, OfTheColourTransformer) {
+    failEachInGraphWith(RandomGraph::TRANSFORMER);
+}
 
 } // namespace
 } // namespace ORVO::FilterGraph

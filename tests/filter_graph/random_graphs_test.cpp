@@ -143,15 +143,22 @@ TEST_P(RandomGraphsTest, EveryFrameEqualsTheGraphEvaluatedFromScratch) {
     int const nGraphs = numberFrom("ORVO_RANDOM_GRAPHS", 2000) / 2;
     int const nFirst = numberFrom("ORVO_RANDOM_SEED", GetParam() == Library::ALLOCATE_ON_DEMAND ? 1 : 100001);
     std::size_t nFilters = 0;
+    std::size_t nBilaterals = 0;
+    std::size_t nTransformers = 0;
     for (int iGraph = 0; iGraph < nGraphs; ++iGraph) {
         auto const seed = static_cast<std::uint32_t>(nFirst + iGraph);
         std::string difference;
         ASSERT_NO_THROW(difference = RandomRun(seed).run()) << "seed " << seed;
         ASSERT_EQ(difference, "") << "seed " << seed;
-        nFilters += RandomGraph(seed, IAdapter::REGION_SYNC_FROM_IMAGE).numberOfFilters();
+        RandomGraph const graph(seed, IAdapter::REGION_SYNC_FROM_IMAGE);
+        nFilters += graph.numberOfFilters();
+        nBilaterals += graph.numberOf(RandomGraph::BILATERAL);
+        nTransformers += graph.numberOf(RandomGraph::TRANSFORMER);
     }
     RecordProperty("filters", static_cast<int>(nFilters));
     EXPECT_GT(nFilters, static_cast<std::size_t>(4 * nGraphs)) << "the graphs are too small to mean much";
+    EXPECT_GT(nBilaterals, static_cast<std::size_t>(nGraphs / 20)) << "hardly any bilateral filter";
+    EXPECT_GT(nTransformers, static_cast<std::size_t>(nGraphs / 20)) << "hardly any colour transformer";
 }
 
 INSTANTIATE_TEST_SUITE_P(BothAllocationModes, RandomGraphsTest,

@@ -151,7 +151,7 @@ TEST_F(ShaderProgramProxyOGLTest, CannotBeLockedOnAForeignContextAndDiesThereQui
     OGL::Program const anchor; // an object that is alive in the host's context throughout
     auto pProxy = std::make_unique<ShaderProgramProxyOGL>();
     pProxy->add(FragmentShaderSourceOGL(pGain));
-    unsigned const nName = pProxy->LockOglProgram()->objectID();
+    pProxy->LockOglProgram();
     pProxy->UnlockOglProgram();
     auto const pForeign = host().another(false);
     pForeign->makeCurrent();
@@ -163,17 +163,17 @@ TEST_F(ShaderProgramProxyOGLTest, CannotBeLockedOnAForeignContextAndDiesThereQui
     EXPECT_EQ(0U, ShaderManagerOGL::Instance()->GetNumShaders());
     ShaderManagerOGL::Instance()->clearAll();
     EXPECT_EQ(2, programs());
-    glDeleteProgram(nName);
+    { OGL::Program const next; }
+    EXPECT_EQ(1, programs());
 }
 
 TEST_F(ShaderProgramProxyOGLTest, DiesQuietlyWithoutAContextAndAfterTheRuntime) {
     OGL::Program const anchor; // an object that is alive in the host's context throughout
     auto pFirst = std::make_unique<ShaderProgramProxyOGL>();
     auto pSecond = std::make_unique<ShaderProgramProxyOGL>();
-    unsigned nName = 0;
     for (auto* pProxy : {pFirst.get(), pSecond.get()}) {
         pProxy->add(FragmentShaderSourceOGL(pGain));
-        nName = pProxy->LockOglProgram()->objectID();
+        pProxy->LockOglProgram();
     }
     stopRuntime();
     pFirst.reset(); // still locked: its program goes with it
@@ -182,7 +182,9 @@ TEST_F(ShaderProgramProxyOGLTest, DiesQuietlyWithoutAContextAndAfterTheRuntime) 
     host().release();
     pSecond.reset();
     host().makeCurrent();
-    glDeleteProgram(nName); // what could not be deleted without a context
+    EXPECT_EQ(2, programs());
+    { OGL::Program const next; } // takes along what could not be deleted without a context
+    EXPECT_EQ(1, programs());
 }
 
 TEST_F(ShaderProgramProxyOGLTest, BelongsToTheManagerOfTheContextItIsLockedIn) {
@@ -195,7 +197,7 @@ TEST_F(ShaderProgramProxyOGLTest, BelongsToTheManagerOfTheContextItIsLockedIn) {
     startRuntime({context(), pOther.get()});
     auto pProxy = std::make_unique<ShaderProgramProxyOGL>();
     pProxy->add(FragmentShaderSourceOGL(pGain));
-    unsigned const nFirstName = pProxy->LockOglProgram()->objectID();
+    pProxy->LockOglProgram();
     pProxy->UnlockOglProgram();
     ShaderManagerOGL* const pFirst = ShaderManagerOGL::Instance();
     pOther->makeCurrent();
@@ -203,7 +205,7 @@ TEST_F(ShaderProgramProxyOGLTest, BelongsToTheManagerOfTheContextItIsLockedIn) {
     ASSERT_NE(pFirst, pSecond);
     EXPECT_EQ(1U, pFirst->GetNumShaders());
     auto const nLinks = GLHooks::calls("glLinkProgram");
-    unsigned const nSecondName = pProxy->LockOglProgram()->objectID();
+    pProxy->LockOglProgram();
     pProxy->UnlockOglProgram();
     EXPECT_EQ(nLinks + 1, GLHooks::calls("glLinkProgram"));
     EXPECT_EQ(0U, pFirst->GetNumShaders());
@@ -214,10 +216,9 @@ TEST_F(ShaderProgramProxyOGLTest, BelongsToTheManagerOfTheContextItIsLockedIn) {
     pFirst->clearAll();
     pSecond->clearAll();
     stopRuntime();
-    // Each was left in its own context by the other.
-    glDeleteProgram(nFirstName);
+    // What each had left to the other context was deleted there.
+    EXPECT_EQ(2, programs());
     pOther->makeCurrent();
-    glDeleteProgram(nSecondName);
     otherAnchor.reset();
     host().makeCurrent();
 }

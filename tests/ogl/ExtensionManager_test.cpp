@@ -60,6 +60,8 @@ TEST_P(ExtensionManagerTest, TellsWhatTheDriverCan) {
     ASSERT_GE(nMajor * 10 + nMinor, 31);
     for (OGL::teExtension const extension : aExtensions)
         EXPECT_TRUE(manager().isSupported(extension)) << extension;
+    EXPECT_TRUE(manager().isSupported(OGL::EXTENSION_ARB_VERTEX_PROGRAM));
+    EXPECT_TRUE(manager().isSupported(OGL::EXTENSION_ARB_FRAGMENT_PROGRAM));
     EXPECT_FALSE(manager().isSupported(OGL::EXTENSION_APPLE_FENCE));
     EXPECT_FALSE(manager().isSupported(static_cast<OGL::teExtension>(1)));
     EXPECT_TRUE(manager().supportsNonPowerOfTwoTextures());

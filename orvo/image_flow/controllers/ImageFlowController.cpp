@@ -5,6 +5,7 @@
 #include "orvo/core/utility/SharedPtr.h"
 #include "orvo/data_flow/connectors/InputConnector.h"
 #include "orvo/data_flow/connectors/OutputConnector.h"
+#include "orvo/image_flow/controllers/FrameState.h"
 #include "orvo/image_flow/graph/DFSPostStackVisitor.h"
 #include "orvo/image_flow/graph/PropagateDODVisitor.h"
 #include "orvo/image_flow/graph/PropagatePixelExtentVisitor.h"
@@ -13,15 +14,12 @@
 #include "orvo/image_runtime/images/ImageGPU.h"
 #include "orvo/ogl/Context.h"
 #include "orvo/ogl/ExceptionOGL.h"
-#include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/Framebuffer.h"
-#include "orvo/ogl/Program.h"
 #include "orvo/ogl/ScopedContextWrapper.h"
 #include "orvo/ogl/TextureState.h"
 #include "orvo/ogl/TextureUnit.h"
 #include "orvo/ogl/internal/GL.h"
 
-#include <array>
 #include <cstddef>
 #include <deque>
 #include <memory>
@@ -117,114 +115,6 @@ void sweepErrors() {
         throw OGL::ExceptionOGL(__FILE__, __LINE__, "Processing failure due to OpenGL error", GL_NO_ERROR);
     }
 }
-
-void activateUnit(unsigned nUnit) noexcept {
-    OGL::ExtensionManager::Instance()->table()->glActiveTexture(GL_TEXTURE0 + nUnit);
-}
-
-/// What would change or keep back the pixels of a pass, set to none of it.
-void setPlainDrawing() {
-    for (GLenum const capability :
-         {GL_ALPHA_TEST, GL_BLEND, GL_CLIP_PLANE0, GL_CLIP_PLANE1, GL_CLIP_PLANE2, GL_CLIP_PLANE3,
-          GL_CLIP_PLANE4, GL_CLIP_PLANE5, GL_COLOR_LOGIC_OP, GL_CULL_FACE, GL_DEPTH_TEST, GL_FOG, GL_LIGHTING,
-          GL_POINT_SMOOTH, GL_POLYGON_SMOOTH, GL_POLYGON_STIPPLE, GL_SCISSOR_TEST, GL_STENCIL_TEST}) {
-        glDisable(capability);
-    }
-    for (GLenum const array : {GL_COLOR_ARRAY, GL_EDGE_FLAG_ARRAY, GL_INDEX_ARRAY, GL_NORMAL_ARRAY,
-                               GL_TEXTURE_COORD_ARRAY, GL_VERTEX_ARRAY}) {
-        glDisableClientState(array);
-    }
-    glColorMask(GL_TRUE, GL_TRUE, GL_TRUE, GL_TRUE);
-    glPolygonMode(GL_FRONT_AND_BACK, GL_FILL);
-    glPointSize(1.0F);
-    // Passes without a program of their own see all units.
-    GLint nUnits = 0;
-    glGetIntegerv(GL_MAX_TEXTURE_UNITS, &nUnits);
-    for (GLint i = nUnits; i-- > 0;) {
-        activateUnit(static_cast<unsigned>(i));
-        for (GLenum const capability :
-             {GL_TEXTURE_1D, GL_TEXTURE_2D, GL_TEXTURE_3D, GL_TEXTURE_CUBE_MAP, GL_TEXTURE_GEN_S,
-              GL_TEXTURE_GEN_T, GL_TEXTURE_GEN_R, GL_TEXTURE_GEN_Q}) {
-            glDisable(capability);
-        }
-    }
-    glMatrixMode(GL_TEXTURE);
-    glLoadIdentity();
-}
-
-/// What a frame changes in its context, which is current, put back at the end of a scope: texture units,
-/// matrices, viewport, program, framebuffers, arrays, and how pixels are drawn, which is made plain for the
-/// frame. A host may have named a context in which it draws itself.
-class FrameState {
-public:
-    explicit FrameState(OGL::Context const& context)
-        : context_(context),
-          bPrograms_(OGL::Program::isSupported()),
-          bSeparate_(OGL::ExtensionManager::Instance()->isSupported(OGL::EXTENSION_ARB_FRAMEBUFFER_OBJECT)) {
-        glPushAttrib(nAttributes_);
-        glPushClientAttrib(GL_CLIENT_VERTEX_ARRAY_BIT);
-        glGetDoublev(GL_PROJECTION_MATRIX, aProjection_.data());
-        glGetDoublev(GL_MODELVIEW_MATRIX, aModelview_.data());
-        glGetIntegerv(GL_FRAMEBUFFER_BINDING, &nDraw_);
-        if (bSeparate_) {
-            glGetIntegerv(GL_READ_FRAMEBUFFER_BINDING, &nRead_);
-        }
-        if (bPrograms_) {
-            glGetIntegerv(GL_CURRENT_PROGRAM, &nProgram_);
-        }
-        activateUnit(0);
-        glGetDoublev(GL_TEXTURE_MATRIX, aTexture_.data());
-        setPlainDrawing();
-        if (bPrograms_) {
-            glUseProgram(0);
-        }
-    }
-    ~FrameState() {
-        try {
-            // A failed frame may have left another one current.
-            context_.makeCurrent();
-        } catch (...) { // The context went away during the frame, and its state with it.
-            return;
-        }
-        if (bPrograms_) {
-            glUseProgram(static_cast<GLuint>(nProgram_));
-        }
-        bindFramebuffer(bSeparate_ ? GL_DRAW_FRAMEBUFFER : GL_FRAMEBUFFER, nDraw_);
-        if (bSeparate_) {
-            bindFramebuffer(GL_READ_FRAMEBUFFER, nRead_);
-        }
-        activateUnit(0);
-        glMatrixMode(GL_TEXTURE);
-        glLoadMatrixd(aTexture_.data());
-        glMatrixMode(GL_PROJECTION);
-        glLoadMatrixd(aProjection_.data());
-        glMatrixMode(GL_MODELVIEW);
-        glLoadMatrixd(aModelview_.data());
-        glPopClientAttrib();
-        glPopAttrib();
-    }
-    FrameState(FrameState const&) = delete;
-    FrameState& operator=(FrameState const&) = delete;
-
-private:
-    static constexpr GLbitfield nAttributes_ = GL_TEXTURE_BIT | GL_ENABLE_BIT | GL_TRANSFORM_BIT |
-                                               GL_VIEWPORT_BIT | GL_COLOR_BUFFER_BIT | GL_CURRENT_BIT |
-                                               GL_POINT_BIT | GL_POLYGON_BIT | GL_SCISSOR_BIT;
-
-    static void bindFramebuffer(GLenum target, GLint nName) noexcept {
-        OGL::ExtensionManager::Instance()->table()->glBindFramebuffer(target, static_cast<GLuint>(nName));
-    }
-
-    OGL::Context const& context_;
-    bool bPrograms_;
-    bool bSeparate_;
-    std::array<GLdouble, 16> aProjection_{};
-    std::array<GLdouble, 16> aModelview_{};
-    std::array<GLdouble, 16> aTexture_{}; // of unit 0, the one whose coordinates are used
-    GLint nDraw_ = 0;
-    GLint nRead_ = 0;
-    GLint nProgram_ = 0;
-};
 
 } // namespace
 

@@ -9,6 +9,8 @@
 #include "orvo/ogl/internal/GL.h"
 #include "orvo/ogl/internal/Scopes.h"
 
+#include <optional>
+
 namespace ORVO {
 
 namespace {
@@ -99,22 +101,29 @@ ReadFormat readFormat(CPU::tePixelFormat format) {
     ORVO_FAIL("Not implemented: pixelFormat in GPU2CPU::convert()");
 }
 
-/// Takes green and blue out of the sum that luminance is made of, for a scope.
+/// Takes green and blue out of the sum that luminance is made of, for a scope in which pixels are transferred
+/// as they are.
 class ScopedRedAsLuminance {
 public:
-    ScopedRedAsLuminance() {
-        glPushAttrib(GL_PIXEL_MODE_BIT);
-        glPixelTransferf(GL_GREEN_SCALE, 0.0f);
-        glPixelTransferf(GL_BLUE_SCALE, 0.0f);
-    }
-    ~ScopedRedAsLuminance() { glPopAttrib(); }
+    ScopedRedAsLuminance() { scaleGreenAndBlue(0.0F); }
+    ~ScopedRedAsLuminance() { scaleGreenAndBlue(1.0F); }
     ScopedRedAsLuminance(ScopedRedAsLuminance const&) = delete;
     ScopedRedAsLuminance& operator=(ScopedRedAsLuminance const&) = delete;
+
+private:
+    static void scaleGreenAndBlue(float factor) {
+        glPixelTransferf(GL_GREEN_SCALE, factor);
+        glPixelTransferf(GL_BLUE_SCALE, factor);
+    }
 };
 
 /// Reads the area from the bound framebuffer, which is that of `from`.
 void readPixels(PixelArea const& area, ImageGPU const& from, ImageCPU& to, ReadFormat const& format) {
     OGL::Internal::ScopedPixelStore const pixelStore;
+    std::optional<ScopedRedAsLuminance> oRedAsLuminance;
+    if (format.nFormat_ == GL_LUMINANCE_ALPHA) {
+        oRedAsLuminance.emplace();
+    }
     OGL::Internal::ScopedBufferBinding const noBuffer(GL_PIXEL_PACK_BUFFER, 0);
     ExtentInPixelSpace const extent = area.extent();
     int const pitch = to.capacityExtent().width();
@@ -195,12 +204,7 @@ void GPU2CPU::convert() {
     }
     // A framebuffer takes no const texture, though it only reads it.
     ScopedReadFramebuffer const framebuffer(const_cast<OGL::Texture2D&>(*input.texture()));
-    if (format.nFormat_ == GL_LUMINANCE_ALPHA) {
-        ScopedRedAsLuminance const redAsLuminance;
-        readPixels(area, input, *resultCPU_, format);
-    } else {
-        readPixels(area, input, *resultCPU_, format);
-    }
+    readPixels(area, input, *resultCPU_, format);
     ORVO_OGL_THROW_ON_ERROR("The image could not be read back");
 }
 

@@ -29,7 +29,8 @@ void DeformationSource::setDeformationMap(DeformationMap* map) {
     DataFlow::ConstDataPointer<ImageGPU> oImage(
         ORVO_NEW ImageGPU(rectangle, ImageGPU::PIXEL_FORMAT_LUMINANCE_ALPHA32F, pixelExtent, true));
     if (given.data != nullptr) {
-        oImage->copyImageData(rectangle, GL_LUMINANCE_ALPHA, GL_FLOAT, given.data, pixelExtent);
+        oImage->copyImageData(reinterpret_cast<unsigned char const*>(given.data), rectangle, pixelExtent,
+                              GL_LUMINANCE_ALPHA, GL_FLOAT, 0);
     }
     ScopedActiveTextureUnitRestore const restore;
     oImage->bind(0);

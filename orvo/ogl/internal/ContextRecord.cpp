@@ -4,11 +4,13 @@
 #include "orvo/ogl/internal/ContextNames.h"
 #include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/Sentinel.h"
+#include "orvo/ogl/internal/ShareGroup.h"
 
 namespace ORVO::OGL::Internal {
 
 ContextRecord::ContextRecord(NativeContext const& native) : oNative_(native) {
     ORVO_OGL_REQUIRE_CONTEXT();
+    spGroup_ = ShareGroup::current();
     pSync_ = Sentinel::create();
 }
 
@@ -16,14 +18,13 @@ ContextRecord::~ContextRecord() {
     if (pSync_ == nullptr)
         return;
     try {
-        if (isSharingWithCurrentContext()) {
-            Sentinel::destroy(pSync_);
-            return;
-        }
         ScopedContextWrapper const restore;
-        oNative_.makeCurrent();
+        if (!isSharingWithCurrentContext())
+            oNative_.makeCurrent();
         if (Sentinel::isAlive(pSync_))
             Sentinel::destroy(pSync_);
+        spGroup_->deleteWaiting();
+        spGroup_.reset();
     } catch (...) {
         // The host has destroyed the context, or uses it on another thread: the object dies with its group.
     }
@@ -32,6 +33,7 @@ ContextRecord::~ContextRecord() {
 void ContextRecord::makeCurrent() const {
     oNative_.makeCurrent();
     ContextNames::deleteOrphans();
+    spGroup_->deleteWaiting();
 }
 
 bool ContextRecord::isSharingWithCurrentContext() const noexcept {

@@ -21,7 +21,7 @@ struct ExtensionRow {
     unsigned nCoreVersion_;
 };
 
-constexpr std::array<ExtensionRow, 14> aRows{{
+constexpr std::array<ExtensionRow, 16> aRows{{
     {EXTENSION_ARB_PIXEL_BUFFER_OBJECT, "GL_ARB_pixel_buffer_object", 21},
     {EXTENSION_ARB_TEXTURE_FLOAT, "GL_ARB_texture_float", 30},
     {EXTENSION_ATI_TEXTURE_FLOAT, "GL_ATI_texture_float", 30},
@@ -36,6 +36,8 @@ constexpr std::array<ExtensionRow, 14> aRows{{
     {EXTENSION_SGIS_TEXTURE_EDGE_CLAMP, "GL_SGIS_texture_edge_clamp", 12},
     {EXTENSION_ARB_SHADER_OBJECTS, "GL_ARB_shader_objects", 20},
     {EXTENSION_APPLE_FENCE, "GL_APPLE_fence", 0},
+    {EXTENSION_ARB_VERTEX_PROGRAM, "GL_ARB_vertex_program", 0},
+    {EXTENSION_ARB_FRAGMENT_PROGRAM, "GL_ARB_fragment_program", 0},
 }};
 
 std::string textOf(GLenum name) {

@@ -4,6 +4,21 @@ namespace ORVO::OGL::Internal {
 
 namespace {
 
+/// A number that pixels are changed by on their way, and the one by which they are not.
+struct Transfer {
+    GLenum nName_;
+    float fPlain_;
+};
+
+constexpr std::array<Transfer, 8> aTransfers{{{GL_RED_SCALE, 1.0F},
+                                              {GL_GREEN_SCALE, 1.0F},
+                                              {GL_BLUE_SCALE, 1.0F},
+                                              {GL_ALPHA_SCALE, 1.0F},
+                                              {GL_RED_BIAS, 0.0F},
+                                              {GL_GREEN_BIAS, 0.0F},
+                                              {GL_BLUE_BIAS, 0.0F},
+                                              {GL_ALPHA_BIAS, 0.0F}}};
+
 bool hasPixelBuffers() noexcept {
     return epoxy_gl_version() >= 21 || epoxy_has_gl_extension("GL_ARB_pixel_buffer_object") ||
            epoxy_has_gl_extension("GL_EXT_pixel_buffer_object");
@@ -52,6 +67,27 @@ unsigned boundBuffer(unsigned nTarget) noexcept {
 
 unsigned boundTexture(unsigned nTarget) noexcept {
     return static_cast<unsigned>(integerState(textureBindingOf(nTarget)));
+}
+
+ScopedPlainPixelTransfer::ScopedPlainPixelTransfer() noexcept : nMapsColors_(integerState(GL_MAP_COLOR)) {
+    bChanged_ = nMapsColors_ != 0;
+    for (std::size_t i = 0; i < nNumbers_; ++i) {
+        glGetFloatv(aTransfers[i].nName_, &aSaved_[i]);
+        bChanged_ = bChanged_ || aSaved_[i] < aTransfers[i].fPlain_ || aSaved_[i] > aTransfers[i].fPlain_;
+    }
+    if (!bChanged_)
+        return;
+    glPixelTransferi(GL_MAP_COLOR, GL_FALSE);
+    for (Transfer const& transfer : aTransfers)
+        glPixelTransferf(transfer.nName_, transfer.fPlain_);
+}
+
+ScopedPlainPixelTransfer::~ScopedPlainPixelTransfer() {
+    if (!bChanged_)
+        return;
+    glPixelTransferi(GL_MAP_COLOR, nMapsColors_);
+    for (std::size_t i = 0; i < nNumbers_; ++i)
+        glPixelTransferf(aTransfers[i].nName_, aSaved_[i]);
 }
 
 ScopedPixelStore::ScopedPixelStore() noexcept { glPushClientAttrib(GL_CLIENT_PIXEL_STORE_BIT); }

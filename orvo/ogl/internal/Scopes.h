@@ -1,17 +1,41 @@
 /// Guards of OpenGL state that this layer's own operations change.
 #pragma once
 
+#include <array>
+#include <cstddef>
+
 #include "orvo/ogl/internal/GL.h"
 
 namespace ORVO::OGL::Internal {
 
-/// Pixel store parameters, restored at the end.
+/// Pixels that are uploaded, read or copied as they are, for a scope: a host may have set scales, biases and
+/// maps of colours, which are set again at the end.
+class ScopedPlainPixelTransfer {
+public:
+    ScopedPlainPixelTransfer() noexcept;
+    ~ScopedPlainPixelTransfer();
+    ScopedPlainPixelTransfer(ScopedPlainPixelTransfer const&) = delete;
+    ScopedPlainPixelTransfer& operator=(ScopedPlainPixelTransfer const&) = delete;
+
+private:
+    /// Scales of red, green, blue and alpha, and their biases.
+    static constexpr std::size_t nNumbers_ = 8;
+
+    std::array<float, nNumbers_> aSaved_{};
+    int nMapsColors_ = 0;
+    bool bChanged_ = false;
+};
+
+/// Pixel store parameters, restored at the end, and pixels that are transferred as they are.
 class ScopedPixelStore {
 public:
     ScopedPixelStore() noexcept;
     ~ScopedPixelStore();
     ScopedPixelStore(ScopedPixelStore const&) = delete;
     ScopedPixelStore& operator=(ScopedPixelStore const&) = delete;
+
+private:
+    ScopedPlainPixelTransfer oTransfer_;
 };
 
 /// A buffer bound to a target for a scope; what was bound before is bound again at the end. Does nothing for

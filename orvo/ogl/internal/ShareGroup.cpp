@@ -6,6 +6,7 @@
 
 #include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/internal/Failure.h"
+#include "orvo/ogl/internal/GL.h"
 #include "orvo/ogl/internal/Sentinel.h"
 
 namespace ORVO::OGL::Internal {
@@ -36,8 +37,10 @@ std::shared_ptr<ShareGroup const> ShareGroup::current() {
                          known.aGroups_.end());
     for (auto const& wpGroup : known.aGroups_) {
         auto spGroup = wpGroup.lock();
-        if (spGroup != nullptr && spGroup->isCurrent())
+        if (spGroup != nullptr && spGroup->isCurrent()) {
+            spGroup->deleteWaiting();
             return spGroup;
+        }
         aAlive.push_back(std::move(spGroup));
     }
     known.aGroups_.reserve(known.aGroups_.size() + 1);
@@ -51,12 +54,57 @@ std::shared_ptr<ShareGroup const> ShareGroup::current() {
 ShareGroup::ShareGroup(void* pSync) noexcept : pSync_(pSync) {}
 
 ShareGroup::~ShareGroup() {
-    if (isCurrent())
-        Sentinel::destroy(pSync_);
+    if (!isCurrent())
+        return;
+    deleteWaiting();
+    Sentinel::destroy(pSync_);
 }
 
 bool ShareGroup::isCurrent() const noexcept {
     return NativeContext::currentHandle() != nullptr && (pSync_ == nullptr || Sentinel::isAlive(pSync_));
+}
+
+void ShareGroup::deleteName(Name const& name) noexcept {
+    switch (name.eKind_) {
+    case Kind::buffer:
+        epoxy_glDeleteBuffers(1, &name.nName_);
+        break;
+    case Kind::program:
+        glDeleteProgram(name.nName_);
+        break;
+    case Kind::shader:
+        glDeleteShader(name.nName_);
+        break;
+    case Kind::texture:
+        glDeleteTextures(1, &name.nName_);
+        break;
+    }
+}
+
+void ShareGroup::destroy(Kind eKind, unsigned nName) const noexcept {
+    if (isCurrent()) {
+        deleteName({eKind, nName});
+        return;
+    }
+    try {
+        std::lock_guard const guard(oLock_);
+        aWaiting_.push_back({eKind, nName});
+        bAnyWaiting_.store(true, std::memory_order_release);
+    } catch (...) {
+        // It goes with the group.
+    }
+}
+
+void ShareGroup::deleteWaiting() const noexcept {
+    if (!bAnyWaiting_.load(std::memory_order_acquire) || !isCurrent())
+        return;
+    std::vector<Name> aNames;
+    {
+        std::lock_guard const guard(oLock_);
+        aNames.swap(aWaiting_);
+        bAnyWaiting_.store(false, std::memory_order_release);
+    }
+    std::for_each(aNames.begin(), aNames.end(), &deleteName);
 }
 
 } // namespace ORVO::OGL::Internal

@@ -1,5 +1,6 @@
 // Nodes that keep an image and give it again, in host memory and in textures.
 
+#include "orvo/core/memory/AllocationFailure.h"
 #include "orvo/core/memory/MemoryStatistics.h"
 #include "orvo/image_flow/filters/BufferCPU.h"
 #include "orvo/image_flow/filters/BufferGPU.h"
@@ -184,6 +185,91 @@ TEST_F(BufferCPUTest, aThousandFramesTakeNoMoreMemory) {
     EXPECT_EQ(nImages, Core::MemoryStatistics::blocks(MEMORY_TYPE_IMAGE));
 }
 
+TEST_F(BufferCPUTest, everyAllocationThatFailsLeavesTheNextFrameRight) {
+    run();
+    for (bool const bEmit : {false, true}) {
+        run();
+        std::size_t const nBlocks = Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT);
+        std::size_t const nImages = Core::MemoryStatistics::blocks(MEMORY_TYPE_IMAGE);
+        std::uint64_t n = 1;
+        for (bool bMore = true; bMore && n < 100; ++n) {
+            SCOPED_TRACE(n);
+            if (bEmit)
+                oBuffer_.emit();
+            {
+                Core::AllocationFailure const failure(n);
+                try {
+                    run();
+                } catch (std::bad_alloc const&) {
+                    EXPECT_TRUE(failure.hasFired());
+                }
+                bMore = failure.hasFired();
+            }
+            oController_.flushGraph();
+            // What the buffer held it holds, if the frame brought it nothing else.
+            EXPECT_TRUE(oBuffer_.hasData());
+            EXPECT_EQ(pixels(-2, 1, 6, 5), oBuffer_.bufferDOD());
+            run();
+            EXPECT_EQ(13.0f, result(3, 1));
+            EXPECT_EQ(nBlocks, Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT));
+            EXPECT_EQ(nImages, Core::MemoryStatistics::blocks(MEMORY_TYPE_IMAGE));
+        }
+        EXPECT_LT(n, 100U);
+        // One that passes lets the filter in front make an image.
+        EXPECT_TRUE(bEmit || n > 2);
+    }
+}
+
+TEST_F(BufferCPUTest, everyAllocationThatFailsOnTheWayToABoundImageLeavesTheNextFrameRight) {
+    oSink_.disconnect();
+    oController_.setImageSink(oBuffer_);
+    HostImage target(ImageCPU::PIXEL_FORMAT_LUMINANCE32F, pixels(-3, 0, 9, 9));
+    oBuffer_.setBoundOutputImage(&target.image());
+    run(pixels(-1, 2, 3, 2));
+    std::size_t const nBlocks = Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT);
+    bool bMore = true;
+    for (std::uint64_t n = 1; bMore; ++n) {
+        ASSERT_LT(n, 100U);
+        {
+            Core::AllocationFailure const failure(n);
+            try {
+                run(pixels(-1, 2, 3, 2));
+            } catch (std::bad_alloc const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bMore = failure.hasFired();
+        }
+        oController_.flushGraph();
+        target.set(std::vector<unsigned char>(target.get().size(), 0));
+        run(pixels(-1, 2, 3, 2));
+        EXPECT_EQ(21.0f, target.channel<float>(1, 2, 0));
+        EXPECT_EQ(0.0f, target.channel<float>(2, 2, 0));
+        EXPECT_EQ(nBlocks, Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT));
+    }
+}
+
+/// Makes a node with each allocation failing in turn; how many there are.
+template <typename Make>
+std::uint64_t failWhileMade(Make const& make) {
+    for (std::uint64_t n = 1;; ++n) {
+        std::size_t const nBlocks = Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT);
+        Core::AllocationFailure const failure(n);
+        try {
+            make();
+        } catch (std::bad_alloc const&) {
+            EXPECT_TRUE(failure.hasFired());
+        }
+        EXPECT_EQ(nBlocks, Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT));
+        if (!failure.hasFired())
+            return n - 1;
+    }
+}
+
+TEST_F(BufferCPUTest, isMadeOrNot) {
+    failWhileMade([] { BufferCPU const buffer; });
+    failWhileMade([] { BufferGPU const buffer; });
+}
+
 // In textures
 
 class BufferGPUTest : public ShaderFlowTest {};
@@ -264,6 +350,89 @@ TEST_F(BufferGPUTest, copiesIntoABoundTexture) {
     ImageGPUPtr const upOther = textureImage(pixels(-3, 0, 9, 9), ImageGPU::PIXEL_FORMAT_LUMINANCE8);
     ORVO_EXPECT_PARAMETER(road.runInto(*upOther, world(-1, 2, 4, 3)),
                           "Source and bound output image differ in their channels");
+}
+
+/// A buffer that gives into a bound texture by itself, and what it has to give.
+class BoundBufferGPU {
+public:
+    explicit BoundBufferGPU(OGL::Context const& context)
+        : upInput_(textureOf(randomTexels(pixels(-2, 1, 7, 5), 3), ImageGPU::PIXEL_FORMAT_RGBA8)),
+          upTarget_(textureImage(pixels(-3, 0, 9, 9), ImageGPU::PIXEL_FORMAT_RGBA8)),
+          oRoad_(context, oBuffer_) {
+        oRoad_.setInput(0, *upInput_);
+    }
+
+    /// A frame that passes, or one that emits.
+    void run(bool bEmit) {
+        if (bEmit)
+            oBuffer_.emit();
+        oRoad_.runInto(*upTarget_, world(-1, 2, 4, 3));
+    }
+    /// The next frames of both kinds must be right.
+    void expectRight() {
+        Texels const input(*upInput_);
+        for (bool const bEmit : {false, true}) {
+            writeTexels(*upTarget_, std::vector<unsigned char>(4 * 9 * 9, 7));
+            run(bEmit);
+            Texels const region(pixels(-1, 2, 4, 3));
+            Texels const expected = Texels(upTarget_->positionExtent()).fill([&](int x, int y) {
+                return region.contains(x, y) ? input.at(x, y)
+                                             : Pixel{7 / 255.0, 7 / 255.0, 7 / 255.0, 7 / 255.0};
+            });
+            EXPECT_EQ("",
+                      differences(Texels(*upTarget_), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
+        }
+    }
+
+private:
+    ImageGPUPtr upInput_;
+    ImageGPUPtr upTarget_;
+    OpenBufferGPU oBuffer_;
+    ShaderRoad oRoad_;
+};
+
+TEST_F(BufferGPUTest, everyCallThatFailsOnTheWayToABoundTextureLeavesTheNextFrameRight) {
+    BoundBufferGPU bound(frameContext());
+    for (bool const bEmit : {false, true}) {
+        bound.expectRight();
+        ObjectCounts const before = GLHooks::objects();
+        std::set<std::string> const aFailed = failEveryCall([&] { bound.run(bEmit); },
+                                                            [&] {
+                                                                // None is current where the driver did not
+                                                                // give it back.
+                                                                host().makeCurrent();
+                                                                EXPECT_EQ(0U, drainErrors());
+                                                                bound.expectRight();
+                                                            },
+                                                            {"eglMakeCurrent"});
+        for (char const* pName : {"glFramebufferTexture2D", "glCheckFramebufferStatus"})
+            EXPECT_EQ(1U, aFailed.count(pName)) << pName;
+        EXPECT_EQ(before, GLHooks::objects());
+    }
+}
+
+TEST_F(BufferGPUTest, everyAllocationThatFailsLeavesTheNextFrameRight) {
+    BoundBufferGPU bound(frameContext());
+    for (bool const bEmit : {false, true}) {
+        bound.expectRight();
+        std::size_t const nBlocks = Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT);
+        bool bMore = true;
+        for (std::uint64_t n = 1; bMore; ++n) {
+            ASSERT_LT(n, 100U);
+            {
+                Core::AllocationFailure const failure(n);
+                try {
+                    bound.run(bEmit);
+                } catch (std::bad_alloc const&) {
+                    EXPECT_TRUE(failure.hasFired());
+                }
+                bMore = failure.hasFired();
+            }
+            EXPECT_EQ(GLenum(GL_NO_ERROR), glGetError());
+            bound.expectRight();
+            EXPECT_EQ(nBlocks, Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT));
+        }
+    }
 }
 
 TEST_F(BufferGPUTest, holdsOneTextureHoweverManyFrames) {

@@ -41,27 +41,33 @@ TEST_F(ConstTeeJointGPUTest, BothConsumersShareTheTexture) {
     TextureNode left;
     TextureNode right;
     TextureNode end(2, false);
-    ImageGPUPtr const upImage = textureImage(pixels(0, 0, 4, 3), ImageGPU::PIXEL_FORMAT_RGBA8);
+    std::vector<ImageGPUPtr> aupImages;
+    for (int i = 0; i < 12; ++i)
+        aupImages.push_back(textureImage(pixels(0, 0, 1 + i % 4, 1 + i % 3), ImageGPU::PIXEL_FORMAT_RGBA8));
     DataFlow::Connect(*left.imageInput(0), *tee.imageOutput());
     DataFlow::Connect(*right.imageInput(0), *tee.clonedImageOutput(0));
     feed(end, 0, left);
     feed(end, 1, right);
     ImageGPUInput source;
     feed(tee, 0, source);
-    source.setImageGPUWithNoOwnership(upImage.get());
     NodeScope const scope(tee);
     ImageFlowController controller;
     plant(controller, {&source, &tee, &left, &right, &end}, end);
     controller.setContextGPU(frameContext());
     auto const nTextures = GLHooks::calls("glGenTextures");
-    for (int i = 0; i < 1000 && !HasFailure(); ++i) {
+    std::size_t nBytes = 0;
+    for (std::size_t i = 0; i < 1000 && !HasFailure(); ++i) {
+        ImageGPU& image = *aupImages[i % aupImages.size()];
+        source.setImageGPUWithNoOwnership(&image);
         source.emit();
-        controller.computeRegions(world(0, 0, 4, 3));
+        controller.computeRegions(pixelToWorldSpace(image.positionExtent(), PixelExtentInWorldSpace()));
         controller.process();
-        EXPECT_EQ(upImage.get(), left.pSeen_);
-        EXPECT_EQ(upImage.get(), right.pSeen_);
+        EXPECT_EQ(&image, left.pSeen_);
+        EXPECT_EQ(&image, right.pSeen_);
         EXPECT_FALSE(tee.imageInput(0)->hasData());
+        nBytes = i == 11 ? Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT) : nBytes;
     }
+    EXPECT_EQ(nBytes, Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT));
     EXPECT_EQ(1000, end.nRuns_);
     EXPECT_LE(GLHooks::calls("glGenTextures"), nTextures + 2); // of the two nodes, which the pool reuses
     end.disconnect();
@@ -119,6 +125,48 @@ TEST_F(ConstTeeJointGPUTest, CopiesIntoABoundTexture) {
     expectTexels(Texels(*upTarget), expected, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA16F));
     EXPECT_EQ(upTarget.get(), tee.imageOutput()->data());
     EXPECT_EQ(upTarget.get(), tee.clonedImageOutput(0)->data());
+}
+
+TEST_F(ConstTeeJointGPUTest, EveryFailureOnTheWayToABoundTextureLeavesTheNextFrameRight) {
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 5, 4), 3), ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upTarget = textureImage(pixels(0, 0, 5, 4), ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const input(*upInput);
+    OpenTee tee;
+    ShaderRoad road(frameContext(), tee);
+    road.setInput(0, *upInput);
+    auto const expectRight = [&] {
+        writeTexels(*upTarget, std::vector<unsigned char>(4 * 5 * 4, 7));
+        road.runInto(*upTarget, world(0, 0, 5, 4));
+        EXPECT_EQ("", differences(Texels(*upTarget), input, Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
+        EXPECT_EQ(upTarget.get(), tee.clonedImageOutput(0)->data());
+    };
+    expectRight();
+    std::set<std::string> const aFailed = failEveryCall([&] { road.runInto(*upTarget, world(0, 0, 5, 4)); },
+                                                        [&] {
+                                                            // None is current where the driver did not give
+                                                            // it back.
+                                                            host().makeCurrent();
+                                                            EXPECT_EQ(0U, drainErrors());
+                                                            expectRight();
+                                                        },
+                                                        {"eglMakeCurrent"});
+    EXPECT_EQ(1U, aFailed.count("glCheckFramebufferStatus"));
+    std::size_t const nBlocks = Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT);
+    bool bMore = true;
+    for (std::uint64_t n = 1; bMore; ++n) {
+        ASSERT_LT(n, 100U);
+        {
+            Core::AllocationFailure const failure(n);
+            try {
+                road.runInto(*upTarget, world(0, 0, 5, 4));
+            } catch (std::bad_alloc const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bMore = failure.hasFired();
+        }
+        expectRight();
+        EXPECT_EQ(nBlocks, Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT));
+    }
 }
 
 TEST_F(ConstTeeJointGPUTest, EveryAllocationOfItsConstructionMayFail) {

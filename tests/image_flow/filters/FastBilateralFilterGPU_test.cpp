@@ -351,6 +351,34 @@ TEST_F(FastBilateralFilterGPUTest, BuffersAreKeptWhileTheSizeStays) {
     EXPECT_EQ(2, objects("buffer"));
 }
 
+TEST_F(FastBilateralFilterGPUTest, DestroyedWithoutAContextItLeavesNothingForLong) {
+    ImageGPUPtr const upImage = textureOf(scene(pixels(0, 0, 8, 8), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
+    constexpr char const* aKinds[] = {"buffer", "framebuffer", "program", "shader"};
+    std::map<std::string, long> before;
+    for (char const* kind : aKinds) {
+        before[kind] = objects(kind);
+    }
+    auto upFilter = std::make_unique<FastBilateralFilterGPU>();
+    auto upRoad = std::make_unique<ShaderRoad>(frameContext(), *upFilter);
+    upRoad->setInput(0, *upImage);
+    upRoad->run(world(0, 0, 8, 8));
+    EXPECT_EQ(before["buffer"] + 2, objects("buffer"));
+    EXPECT_LT(before["program"], objects("program"));
+    upRoad.reset();
+    host().release();
+    upFilter.reset();
+    EXPECT_EQ(before["buffer"] + 2, objects("buffer"));
+    // The first context of their group that is made current takes the shared ones along, each context its
+    // own framebuffer.
+    context().makeCurrent();
+    EXPECT_EQ(before["buffer"], objects("buffer"));
+    frameContext().makeCurrent();
+    host().makeCurrent();
+    for (char const* kind : aKinds) {
+        EXPECT_EQ(before[kind], objects(kind)) << kind;
+    }
+}
+
 TEST_F(FastBilateralFilterGPUTest, WhatAHostHasBoundToTheGridsUnitIsNotSeen) {
     PositionExtentInPixelSpace const region = pixels(0, 0, 16, 16);
     ImageGPUPtr const upImage = textureOf(scene(region, 1), ImageGPU::PIXEL_FORMAT_RGBA8);

@@ -8,8 +8,10 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
+#include <utility>
 
 namespace {
 
@@ -215,6 +217,68 @@ TEST_P(SimpleBilateralFilterCPUOf, OutputBeyondTheInputHasATransparentCentre) {
 TEST_P(SimpleBilateralFilterCPUOf, InputWithoutPixelsIsTransparentBlack) {
     Picture const result = applied(Picture(0, 0, 0, 0), Picture(0, 0, 3, 2, float4(0.7F)), 1.0F, 0.3F, true);
     expectNear(result, Picture(0, 0, 3, 2), 0.0F);
+}
+
+/// The result of a region that is computed from no more than its surroundings of so many pixels.
+Picture appliedToPart(Picture const& source, Picture const& place, int margin, float sigma, bool colorize) {
+    int const left = std::max(place.x - margin, source.x);
+    int const top = std::max(place.y - margin, source.y);
+    Picture part(left, top, std::min(place.x + place.width + margin, source.x + source.width) - left,
+                 std::min(place.y + place.height + margin, source.y + source.height) - top);
+    for (int row = 0; row < part.height; ++row) {
+        for (int column = 0; column < part.width; ++column) {
+            part.at(column, row) = source.at(left - source.x + column, top - source.y + row);
+        }
+    }
+    return applied(part, place, sigma, 0.4F, colorize);
+}
+
+/// How many pixels that lie at least `inset` pixels inside the picture differ between the picture as a whole
+/// and its tiles of 9 by 8 pixels.
+std::size_t differingInTiles(Picture const& source, Picture const& whole, int margin, float sigma,
+                             bool colorize, int inset) {
+    std::size_t nDiffering = 0;
+    for (int top = 0; top < source.height; top += 8) {
+        for (int left = 0; left < source.width; left += 9) {
+            Picture const place(source.x + left, source.y + top, std::min(9, source.width - left),
+                                std::min(8, source.height - top));
+            Picture const tile = appliedToPart(source, place, margin, sigma, colorize);
+            for (int row = 0; row < tile.height; ++row) {
+                for (int column = 0; column < tile.width; ++column) {
+                    int const x = left + column;
+                    int const y = top + row;
+                    bool const bInside =
+                        x >= inset && y >= inset && x + inset < source.width && y + inset < source.height;
+                    nDiffering += bInside && !(tile.at(column, row) == whole.at(x, y)) ? 1 : 0;
+                }
+            }
+        }
+    }
+    return nDiffering;
+}
+
+TEST_P(SimpleBilateralFilterCPUOf, TilesAreTheWholePictureButForItsOutermostHalfWindow) {
+    Picture const source = randomPicture(-3, 5, 40, 37, 48);
+    for (bool colorize : {false, true}) {
+        // Half windows of trunc(7 / 2) and trunc(13 / 2) pixels: no more than the sigma that tiles ask for.
+        for (auto const& [sigma, half] : {std::pair(3.0F, 3), std::pair(6.0F, 6)}) {
+            Picture const whole = applied(source, source, sigma, 0.4F, colorize);
+            int const margin = int(std::ceil(sigma));
+            EXPECT_EQ(0U, differingInTiles(source, whole, margin, sigma, colorize, half)) << sigma;
+            // At the edges a tap beyond the picture finds another pixel in a tile than in the whole, and with
+            // less of a margin so do taps at the seams.
+            EXPECT_LT(0U, differingInTiles(source, whole, margin, sigma, colorize, 0)) << sigma;
+            EXPECT_LT(0U, differingInTiles(source, whole, half - 1, sigma, colorize, half)) << sigma;
+        }
+    }
+}
+
+TEST_P(SimpleBilateralFilterCPUOf, TilesOfALargeSigmaNeedMoreThanTheSigma) {
+    // ceil(2.146 * 7) = 16, whose half is 8.
+    Picture const source = randomPicture(0, 0, 31, 29, 49);
+    Picture const whole = applied(source, source, 7.0F, 0.4F, true);
+    EXPECT_LT(0U, differingInTiles(source, whole, 7, 7.0F, true, 8));
+    EXPECT_EQ(0U, differingInTiles(source, whole, 8, 7.0F, true, 8));
 }
 
 TEST_P(SimpleBilateralFilterCPUOf, SigmaBeyondTheImageIsServed) {

@@ -3,12 +3,14 @@
 #include "tests/image_flow/support/Compounds.h"
 #include "tests/image_flow/support/DisplayFilters.h"
 
+#include <algorithm>
 #include <random>
 
 #include "orvo/core/exceptions/SharedException.h"
 #include "orvo/core/memory/MemoryStatistics.h"
 #include "orvo/image_flow/filters/BufferGPU.h"
 #include "orvo/image_flow/filters/ConstTeeJointGPU.h"
+#include "orvo/image_flow/filters/FastBilateralFilterGPU.h"
 #include "orvo/ogl/ScopedContextWrapper.h"
 
 namespace {
@@ -224,30 +226,42 @@ INSTANTIATE_TEST_SUITE_P(, CompoundFilterGPUTest, testing::Bool(),
                              return row.param ? "NestedTwice" : "Once";
                          });
 
-// Random graphs of all of the filters for previews, tee joints, buffers and compounds
+// Random graphs of the bilateral filter, the filters for previews, tee joints, buffers and compounds
+
+/// A filter that draws: those for previews, and behind them the bilateral one.
+std::unique_ptr<ImageFilter> makeDrawingFilter(std::size_t iRow) {
+    if (iRow < std::size(aDisplayFilters))
+        return aDisplayFilters[iRow].pMake_();
+    auto upFilter = std::make_unique<FastBilateralFilterGPU>();
+    upFilter->spatialSigma().setValue(float2(1.5f, 1.0f));
+    upFilter->rangeSigma().setValue(0.4f);
+    upFilter->colorize().setValue(true);
+    return upFilter;
+}
 
 /// Each of the filters once, to be run by itself.
-using ReferenceFilters = std::vector<std::unique_ptr<DisplayFilterGPU>>;
+using ReferenceFilters = std::vector<std::unique_ptr<ImageFilter>>;
 
 /// A chain of nodes at random, each of which is also run by itself on what the one before gave.
 class RandomTextureGraph {
 public:
     RandomTextureGraph(OGL::Context const& context, ReferenceFilters const& aReferences, unsigned seed)
-        : context_(context), aReferences_(aReferences), oRandom_(seed) {
-        Texels picture = randomTexels(oRegion_, seed);
-        for (int y = picture.top(); y < picture.top() + picture.height(); ++y)
-            for (int x = picture.left(); x < picture.left() + picture.width(); ++x)
-                for (double& value : picture.at(x, y))
+        : context_(context),
+          aReferences_(aReferences),
+          oRandom_(seed),
+          oPicture_(randomTexels(oRegion_, seed)) {
+        for (int y = oPicture_.top(); y < oPicture_.top() + oPicture_.height(); ++y)
+            for (int x = oPicture_.left(); x < oPicture_.left() + oPicture_.width(); ++x)
+                for (double& value : oPicture_.at(x, y))
                     value = (value + 0.75) / 2.25;
-        upImage_ = textureOf(picture, ImageGPU::PIXEL_FORMAT_RGBA8);
-        oSource_.setImageGPUWithNoOwnership(upImage_.get());
+        upImage_ = textureOf(oPicture_, ImageGPU::PIXEL_FORMAT_RGBA8);
         oController_.setContextGPU(context);
         oController_.addNode(&oSource_);
         ImageFilter* pLast = &oSource_;
         for (unsigned n = 2 + pick(4); n > 0; --n)
             pLast = &append(*pLast);
         // A buffer goes on holding what it gives, and the sink takes images alone: so a filter comes last.
-        pLast = &keep(aDisplayFilters[0].pMake_(), *pLast, 0);
+        pLast = &keep(makeDrawingFilter(0), *pLast, 0);
         feed(oSink_, 0, *pLast);
         oController_.addNode(&oSink_);
         oController_.setImageSink(oSink_);
@@ -259,20 +273,55 @@ public:
             upNode->disconnect();
     }
 
-    /// A frame of a random region must give what the filters give one after the other.
+    /// A frame of a random region must give what the filters give one after the other, also after one that
+    /// was cancelled, and whatever the picture holds outside of what the frame asks for.
     void frame() {
-        auto const region = pixels(int(pick(4)) - 2, 1 + int(pick(3)), 1 + int(pick(6)), 1 + int(pick(5)));
-        oController_.flushGraph();
-        oSource_.emit();
-        oController_.computeRegions(pixelToWorldSpace(region, PixelExtentInWorldSpace()));
-        oController_.process();
+        // At times beyond the picture, where the bilateral filter has something still.
+        auto const region = pixels(int(pick(10)) - 8, int(pick(7)) - 4, 6 + int(pick(5)), 5 + int(pick(4)));
+        if (pick(3) == 0) {
+            prepare(region);
+            oController_.processAsync();
+            oController_.cancelProcess();
+            EXPECT_TRUE(oController_.wait(60, 0.0005));
+            EXPECT_NO_THROW(oController_.checkException());
+        }
+        prepare(region);
+        if (pick(2) == 0) {
+            oController_.process();
+        } else {
+            oController_.processAsync();
+            EXPECT_TRUE(oController_.wait(60, 0.0005));
+            EXPECT_NO_THROW(oController_.checkException());
+        }
         ASSERT_NE(nullptr, oSink_.getImageGPU());
+        // Two steps of 8 bits: textures between the nodes are larger than those of the references.
         EXPECT_EQ("", differences(Texels(*oSink_.getImageGPU()), stepByStep(region),
-                                  Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
+                                  {4, true, 2.0 / 255.0 + 1e-6, 0}));
     }
+
+    bool has(std::size_t iRow) const { return std::count(aiRows_.begin(), aiRows_.end(), iRow) > 0; }
+
+    static constexpr std::size_t iBilateral = std::size(aDisplayFilters);
 
 private:
     unsigned pick(unsigned n) { return static_cast<unsigned>(oRandom_() % n); }
+
+    void prepare(PositionExtentInPixelSpace const& region) {
+        oController_.flushGraph();
+        oSource_.setImageGPUWithNoOwnership(upImage_.get());
+        oSource_.emit();
+        oController_.computeRegions(pixelToWorldSpace(region, PixelExtentInWorldSpace()));
+        // Other pixels outside of what is asked for, each time.
+        Texels const asked(
+            worldToPixelSpace(oSource_.computeRegionParameter().value(), PixelExtentInWorldSpace()));
+        Texels const other = randomTexels(oRegion_, pick(1000));
+        upSpoiled_ = textureOf(Texels(oRegion_).fill([&](int x, int y) {
+            return asked.contains(x, y) ? oPicture_.at(x, y) : other.at(x, y);
+        }),
+                               ImageGPU::PIXEL_FORMAT_RGBA8);
+        oSource_.setImageGPUWithNoOwnership(upSpoiled_.get());
+        oSource_.emit();
+    }
 
     ImageFilter& keep(std::unique_ptr<ImageFilter> upNode, ImageFilter& producer, std::size_t iRow) {
         feed(*upNode, 0, producer);
@@ -282,7 +331,7 @@ private:
         return *aupNodes_.back();
     }
 
-    static constexpr std::size_t iNone = std::size(aDisplayFilters);
+    static constexpr std::size_t iNone = iBilateral + 1;
 
     ImageFilter& append(ImageFilter& last) {
         std::size_t const iRow = pick(unsigned(iNone) + 2);
@@ -290,36 +339,57 @@ private:
             return keep(std::make_unique<BufferGPU>(), last, iNone);
         if (iRow > iNone) {
             // In a compound, or two.
-            std::size_t const iInner = pick(3);
-            std::unique_ptr<ImageFilter> upInner = aDisplayFilters[iInner].pMake_();
+            std::size_t const iInner = pick(4) == 3 ? iBilateral : pick(3);
+            std::unique_ptr<ImageFilter> upInner = makeDrawingFilter(iInner);
             auto upCompound = pick(2) == 0 ? nestedTwice<TextureRoad>(std::move(upInner))
                                            : std::make_unique<TextureCompound>(std::move(upInner));
             upCompound->setContext(context_);
             return keep(std::move(upCompound), last, iInner);
         }
-        if (std::string(aDisplayFilters[iRow].pName_) != "GamutTestComposite")
-            return keep(aDisplayFilters[iRow].pMake_(), last, iRow);
+        if (iRow == iBilateral || std::string(aDisplayFilters[iRow].pName_) != "GamutTestComposite")
+            return keep(makeDrawingFilter(iRow), last, iRow);
         // One image for both inputs, through a tee joint.
         ImageFilter& tee = keep(std::make_unique<ConstTeeJointGPU>(), last, iNone);
-        ImageFilter& composite = keep(aDisplayFilters[iRow].pMake_(), tee, iRow);
+        ImageFilter& composite = keep(makeDrawingFilter(iRow), tee, iRow);
         DataFlow::Connect(*composite.imageInput(1), *tee.clonedImageOutput(0));
         return composite;
     }
 
-    Texels stepByStep(PositionExtentInPixelSpace const& region) {
-        ImageGPUPtr upPicture;
+    /// What each node of the chain computes: of its domain that which is asked for.
+    std::vector<PositionExtentInPixelSpace> computedRegions(PositionExtentInPixelSpace const& region) const {
+        std::vector<PositionExtentInWorldSpace> aRegions;
+        PositionExtentInWorldSpace domain = pixelToWorldSpace(oRegion_, PixelExtentInWorldSpace());
         for (std::size_t const iRow : aiRows_) {
-            if (iRow == iNone)
+            if (iRow == iBilateral)
+                domain.outset(oReach_);
+            aRegions.push_back(domain);
+        }
+        PositionExtentInWorldSpace asked = pixelToWorldSpace(region, PixelExtentInWorldSpace());
+        std::vector<PositionExtentInPixelSpace> aComputed(aRegions.size());
+        for (std::size_t i = aRegions.size(); i-- > 0;) {
+            aRegions[i].intersect(asked);
+            aComputed[i] = worldToPixelSpace(aRegions[i], PixelExtentInWorldSpace());
+            if (aiRows_[i] == iBilateral)
+                asked.outset(oReach_);
+        }
+        return aComputed;
+    }
+
+    Texels stepByStep(PositionExtentInPixelSpace const& region) {
+        std::vector<PositionExtentInPixelSpace> const aComputed = computedRegions(region);
+        ImageGPUPtr upPicture;
+        for (std::size_t iNode = 0; iNode < aiRows_.size(); ++iNode) {
+            if (aiRows_[iNode] == iNone)
                 continue;
-            DisplayFilterGPU& filter = *aReferences_[iRow];
-            // The first one sees the picture, where cells begin; the others images of just the region.
+            ImageFilter& filter = *aReferences_[aiRows_[iNode]];
+            // The first one sees the picture, where cells begin; the others images of just their regions.
             ImageGPU& input = upPicture ? *upPicture : *upImage_;
-            ImageGPUPtr upNext = textureImage(region, ImageGPU::PIXEL_FORMAT_RGBA8);
+            ImageGPUPtr upNext = textureImage(aComputed[iNode], ImageGPU::PIXEL_FORMAT_RGBA8);
             {
                 ShaderRoad road(context_, filter);
                 for (std::size_t i = 0; i < filter.numberOfImageInputs(); ++i)
                     road.setInput(i, input);
-                road.runInto(*upNext, pixelToWorldSpace(region, PixelExtentInWorldSpace()));
+                road.runInto(*upNext, pixelToWorldSpace(aComputed[iNode], PixelExtentInWorldSpace()));
             }
             upPicture = std::move(upNext);
         }
@@ -327,10 +397,13 @@ private:
     }
 
     PositionExtentInPixelSpace const oRegion_ = pixels(-3, 0, 11, 9);
+    float2 const oReach_{4.0f, 3.0f}; // ceil(2.146 * 1.5), ceil(2.146 * 1)
     OGL::Context const& context_;
     ReferenceFilters const& aReferences_;
     std::minstd_rand oRandom_;
+    Texels oPicture_;
     ImageGPUPtr upImage_;
+    ImageGPUPtr upSpoiled_; // what the source gives in the frame
     ImageFlowController oController_;
     ImageGPUInput oSource_;
     ImageGPUOutput oSink_;
@@ -341,14 +414,17 @@ private:
 
 TEST_F(TextureGraphsTest, EveryFrameGivesWhatTheFiltersGiveOneAfterTheOther) {
     ReferenceFilters aReferences;
-    for (DisplayFilterRow const& row : aDisplayFilters)
-        aReferences.push_back(row.pMake_());
+    for (std::size_t iRow = 0; iRow <= RandomTextureGraph::iBilateral; ++iRow)
+        aReferences.push_back(makeDrawingFilter(iRow));
+    int nWithBilateral = 0;
     for (unsigned seed = 1; seed <= 16 && !HasFailure(); ++seed) {
         SCOPED_TRACE(testing::Message() << "seed " << seed);
         RandomTextureGraph graph(frameContext(), aReferences, seed);
         for (int i = 0; i < 3; ++i)
             graph.frame();
+        nWithBilateral += graph.has(RandomTextureGraph::iBilateral) ? 1 : 0;
     }
+    EXPECT_GT(nWithBilateral, 4);
 }
 
 } // namespace

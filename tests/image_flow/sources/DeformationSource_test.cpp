@@ -1,5 +1,8 @@
 #include "orvo/image_flow/sources/DeformationSource.h"
 
+#include "orvo/core/memory/AllocationFailure.h"
+#include "orvo/core/memory/MemoryStatistics.h"
+#include "orvo/image_runtime/TexturePool.h"
 #include "tests/image_flow/support/ShaderRoad.h"
 
 #include <limits>
@@ -135,6 +138,103 @@ TEST_F(DeformationSourceTest, TakesANewMapAndKeepsTheOldOneIfItCannot) {
     EXPECT_EQ(bytesOf(aOthers), readTexels(*source.image()));
 }
 
+TEST_F(DeformationSourceTest, EveryAllocationThatFailsLeavesTheMapAsItWas) {
+    std::vector<float> const aValues = values(6);
+    DeformationMap map{3, 2, aValues.data()};
+    std::vector<float> const aOthers = values(5 * 4);
+    DeformationMap other{5, 4, aOthers.data()};
+    OpenDeformationSource source("deform", &map);
+    auto const usage = [] {
+        TexturePool::Instance()->clearAll();
+        return std::pair(Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT), GLHooks::objects());
+    };
+    auto const before = usage();
+    std::uint64_t nFailed = 0;
+    for (bool bMore = true; bMore; ++nFailed) {
+        ASSERT_LT(nFailed, 100U);
+        bool bThrown = false;
+        {
+            Core::AllocationFailure const failure(nFailed + 1);
+            try {
+                OpenDeformationSource const second("second", &other); // is made or not
+                source.setDeformationMap(&other);
+            } catch (std::bad_alloc const&) {
+                bThrown = true;
+            }
+            bMore = failure.hasFired();
+        }
+        EXPECT_EQ(bMore, bThrown);
+        EXPECT_EQ(bThrown ? ExtentInPixelSpace(3, 2) : ExtentInPixelSpace(5, 4), source.size());
+        source.internalProcess();
+        EXPECT_EQ(bytesOf(bThrown ? aValues : aOthers), readTexels(*source.image()));
+        source.flushOutputs();
+        if (bThrown) {
+            EXPECT_EQ(before, usage());
+        }
+    }
+    EXPECT_GT(nFailed, 4U); // an image and its texture, twice
+}
+
+TEST_F(DeformationSourceTest, TakesItsMapFromMemoryWhateverBufferTheHostHasBound) {
+    std::vector<float> const aValues = values(6);
+    DeformationMap map{3, 2, aValues.data()};
+    GLuint nBuffer = 0;
+    glGenBuffers(1, &nBuffer);
+    glBindBuffer(GL_PIXEL_UNPACK_BUFFER, nBuffer);
+    glPixelTransferf(GL_RED_SCALE, 0.5f);
+    OpenDeformationSource source("deform", &map);
+    glPixelTransferf(GL_RED_SCALE, 1.0f);
+    glBindBuffer(GL_PIXEL_UNPACK_BUFFER, 0);
+    glDeleteBuffers(1, &nBuffer);
+    source.internalProcess();
+    EXPECT_EQ(bytesOf(aValues), readTexels(*source.image()));
+}
+
+TEST_F(DeformationSourceTest, EveryFailureOfAFrameIntoABoundTextureLeavesTheNextRight) {
+    std::vector<float> const aValues = values(3 * 2);
+    DeformationMap map{3, 2, aValues.data()};
+    OpenDeformationSource source("deform", &map);
+    ImageGPUPtr const upTarget = textureImage(pixels(0, 0, 3, 2), ImageGPU::PIXEL_FORMAT_LUMINANCE_ALPHA32F);
+    source.setBoundOutputImage(upTarget.get());
+    ImageFlowController controller;
+    plant(controller, {&source}, source);
+    controller.setContextGPU(frameContext());
+    auto const run = [&] {
+        controller.flushGraph();
+        source.emit();
+        controller.computeRegions(world(0, 0, 3, 2));
+        controller.process();
+    };
+    auto const expectRight = [&] {
+        writeTexels(*upTarget, bytesOf(std::vector<float>(12, 7.0f)));
+        run();
+        EXPECT_EQ(bytesOf(aValues), readTexels(*upTarget));
+    };
+    expectRight();
+    std::set<std::string> const aFailed = failEveryCall(run,
+                                                        [&] {
+                                                            host().makeCurrent();
+                                                            EXPECT_EQ(0U, drainErrors());
+                                                            expectRight();
+                                                        },
+                                                        {"eglMakeCurrent"});
+    EXPECT_EQ(1U, aFailed.count("glCheckFramebufferStatus"));
+    bool bMore = true;
+    for (std::uint64_t n = 1; bMore; ++n) {
+        ASSERT_LT(n, 100U);
+        {
+            Core::AllocationFailure const failure(n);
+            try {
+                run();
+            } catch (std::bad_alloc const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bMore = failure.hasFired();
+        }
+        expectRight();
+    }
+}
+
 TEST_F(DeformationSourceTest, CopiesIntoABoundTexture) {
     std::vector<float> aValues(2 * 7 * 5);
     for (std::size_t i = 0; i < aValues.size(); ++i)
@@ -164,10 +264,23 @@ TEST_F(DeformationSourceTest, AThousandMapsLeaveNothingBehind) {
     std::vector<float> const aValues = values(7 * 5);
     DeformationMap map{1, 1, aValues.data()};
     OpenDeformationSource source("deform", &map);
+    TextureNode end(1, false);
+    feed(end, 0, source);
+    ImageFlowController controller;
+    plant(controller, {&source, &end}, end);
+    controller.setContextGPU(frameContext());
+    std::size_t nBytes = 0;
     for (std::uint32_t i = 0; i < 1000; ++i) {
         DeformationMap next{1 + i % 7, 1 + i % 5, aValues.data()};
+        controller.flushGraph();
         source.setDeformationMap(&next);
+        source.emit();
+        controller.computeRegions(world(0, 0, float(next.width), float(next.height)));
+        controller.process();
+        nBytes = i == 69 ? Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT) : nBytes;
     }
+    EXPECT_EQ(1000, end.nRuns_);
+    EXPECT_EQ(nBytes, Core::MemoryStatistics::bytes(MEMORY_TYPE_OBJECT));
     EXPECT_LE(GLHooks::objects()["texture"], 37L); // one for each size, the pool's and the one that is held
 }
 

@@ -322,13 +322,14 @@ TEST_F(ImageGPUTest, OutlivesTheLibrary) {
     auto pWithout = std::make_unique<ImageGPU>(rectangle(31, 20), eRGBA8, oUnit_, true);
     stopLibrary();
     pWith.reset();
-    // Without a context the object goes, and leaves its name to the end of the share group.
+    // Without a context the object goes, and leaves its name until another one is made in the share group.
     GLuint const nName = pWithout->texture()->objectID();
     host().release();
     pWithout.reset();
     host().makeCurrent();
     EXPECT_TRUE(glIsTexture(nName));
-    glDeleteTextures(1, &nName);
+    { OGL::Texture2D const next(OGL::Texture::INTERNAL_FORMAT_RGBA8, 1, 1, false, nullptr); }
+    EXPECT_FALSE(glIsTexture(nName));
     ORVO_EXPECT_INTERNAL(ImageGPU(rectangle(3, 2), eRGBA8, oUnit_, true), "Enforce pvDeviceObject_ != NULL");
 }
 
