@@ -8,6 +8,7 @@
 #include "orvo/ogl/Texture.h"
 
 #include <cstddef>
+#include <cstdint>
 #include <memory>
 
 namespace ORVO {
@@ -171,6 +172,10 @@ private:
     OGL::Texture2D* storageGL_ = nullptr;
     unsigned char* storageCPU_ = nullptr;
     std::size_t nStorageCPUSize_ = 0;
+
+    friend class Tiles;
+    /// Bytes that stand for this tile in the ledger of its grid.
+    std::int64_t nBookedSize_ = 0;
 };
 
 } // namespace Utility
