@@ -71,6 +71,7 @@ void readColors(unsigned nBuffer, ExtentInPixelSpace const& extent) {
     glPixelStorei(GL_PACK_ROW_LENGTH, 0);
     glPixelStorei(GL_PACK_SKIP_ROWS, 0);
     glPixelStorei(GL_PACK_SKIP_PIXELS, 0);
+    glPixelStorei(GL_PACK_SWAP_BYTES, GL_FALSE);
     OGL::Internal::ScopedBufferBinding const binding(GL_PIXEL_PACK_BUFFER, nBuffer);
     glReadBuffer(GL_COLOR_ATTACHMENT0);
     glReadPixels(0, 0, extent.width(), extent.height(), GL_RGB, GL_FLOAT, nullptr);
