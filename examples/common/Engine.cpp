@@ -10,6 +10,7 @@ ContextPtr makeContext() {
 
 Engine::Engine(ContextPtr (*makeContextOrNone)()) : context(makeContextOrNone()) {
     ORVO::FilterGraph::insertStandardFilters();
+    ORVO::FilterGraph::Library::insertORVOFilters();
 }
 
 std::string describe(std::exception const& failure) {

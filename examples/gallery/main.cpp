@@ -76,6 +76,11 @@ Sample sampleOf(std::string const& name, Picture const& photograph, ORVO::OGL::C
         colorize->as<bool>().setValue(true);
     if (auto* const source = filter->parameter("srcProfile"))
         source->as<int>().setValue(static_cast<int>(ORVO::ColourEngine::profileCode("sRGB")));
+    if (auto* const opacity = filter->parameter("opacity")) {
+        // Without these, the marks of what lies outside a gamut are transparent.
+        opacity->as<float>().setValue(1.0F);
+        filter->parameter("color")->as<ORVO::float4>().setValue(ORVO::float4(0.0F, 0.0F, 1.0F, 1.0F));
+    }
     for (auto const& [from, to] : {std::pair(Depth::uint8, Depth::uint8),
                                    {Depth::uint8, Depth::float32},
                                    {Depth::float32, Depth::uint8}}) {

@@ -101,6 +101,7 @@ for line in 'FastBilateralBlur  (Motion Loft, Norvane Works, version 1)' \
     'premultiply  (ORVO, Norvane, version 1)' 'runs on cpu' 'runs on gl' \
     'MirelCheckerBoardGPU  (ImageFlow, Norvane, version 1)' 'checkerSize  float2  default 16,16' \
     'MirelGamutComposite  (ImageFlow, Norvane, version 1)' 'input GamutTestResultInputImage' \
+    'VantleFilterGPU  (ImageFlow, Norvane, version 1)' \
     'MirelToneMappingGPU  (ImageFlow, Norvane, version 1)' 'exposure  float  default 0  from -20 to 20'; do
     grep -qF "$line" "$scratch/stdout" || fail "no \"$line\" in the list"
 done

@@ -76,6 +76,15 @@ public:
     BoundOnUnit0& operator=(BoundOnUnit0 const&) = delete;
 };
 
+/// Bytes of a pixel whose channels have the type; more than three are four.
+std::size_t bytesOfPixel(std::size_t nChannel, OGL::Texture::Type eType) {
+    std::size_t const nCopied = nChannel >= 1 && nChannel <= 3 ? nChannel : 4;
+    if (eType == OGL::Texture::TYPE_UNSIGNED_BYTE) {
+        return nCopied;
+    }
+    return nCopied * (eType == OGL::Texture::TYPE_UNSIGNED_SHORT ? 2 : 4);
+}
+
 void checkInside(ImageBase const& image, OGL::Texture2D const& texture) {
     ORVO_CHECK_PARAMETER(image.width() <= texture.width(0) && image.height() <= texture.height(0),
                          "The rectangle lies outside the texture");
@@ -327,8 +336,10 @@ void ImageWrapper::storageGL2CPU(OGL::Texture2D const* storageGL, unsigned char*
         return;
     }
     BoundOnUnit0 const bound(storageGL);
-    std::size_t const nRow = image().width() * image().numBytesPerPixel();
-    std::size_t const nTextureRow = storageGL->width(0) * image().numBytesPerPixel();
+    // Not always the image's own: channels of some types are copied as bytes.
+    std::size_t const nPixel = bytesOfPixel(image().imageDescriptor().format().nChannel, textureTypeToUse());
+    std::size_t const nRow = image().width() * nPixel;
+    std::size_t const nTextureRow = storageGL->width(0) * nPixel;
     if (nRow == nTextureRow && image().height() == storageGL->height(0)) {
         storageGL->getPixelData(storageCPU, 0, formatOfPixels(), textureTypeToUse(), 1);
         return;

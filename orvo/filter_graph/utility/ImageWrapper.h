@@ -8,6 +8,7 @@
 #include "orvo/ogl/Texture.h"
 
 #include <cstddef>
+#include <cstdint>
 #include <memory>
 
 namespace ORVO {
@@ -128,14 +129,18 @@ public:
     /// @throws InternalException "storageGL_ != 0", "storageCPU_ != 0"; else as below.
     void storageGL2CPU();
 
-    /// Copies `storageSize()` bytes of pixels, rows without padding, into a texture. Pixels of channel types
-    /// that `textureTypeToUse` has no own type for are copied as bytes.
+    /// Copies the image's pixels, rows without padding, into the top left part of a texture. The channels in
+    /// memory are of the type `textureTypeToUse`: `storageSize()` bytes in all, but for channel types that
+    /// this has no own type for. Of types 3 and 4 they are single bytes from 0 to 255, half of
+    /// `storageSize()`, rows just as close; of type 1, which no storage of a wrapper has, twice as much.
+    ///
+    /// They go up by `TextureUpload` alone: there is no work-around for drivers from before OpenGL 2 that
+    /// would rather have a direct upload.
     /// @throws InternalException "storageGL != 0"; ParameterException "The rectangle lies outside the
     /// texture" if the texture is smaller than the image; as `TextureUpload::asyncUpload`.
     void storageCPU2GL(unsigned char const* storageCPU, OGL::Texture2D* storageGL);
 
-    /// The opposite: the top left part of the texture, as large as the image. Leaves texture unit 0 active,
-    /// with no 2D texture bound.
+    /// The opposite, with as many bytes. Leaves texture unit 0 active, with no 2D texture bound.
     /// @throws InternalException "storageGL != 0"; ParameterException "The rectangle lies outside the
     /// texture"; ExceptionOGL.
     void storageGL2CPU(OGL::Texture2D const* storageGL, unsigned char* storageCPU);
@@ -171,6 +176,10 @@ private:
     OGL::Texture2D* storageGL_ = nullptr;
     unsigned char* storageCPU_ = nullptr;
     std::size_t nStorageCPUSize_ = 0;
+
+    friend class Tiles;
+    /// Bytes that stand for this tile in the ledger of its grid.
+    std::int64_t nBookedSize_ = 0;
 };
 
 } // namespace Utility

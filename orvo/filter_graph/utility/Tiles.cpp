@@ -106,10 +106,16 @@ void Tiles::reorderTilesAsSerpentine() {
     }
 }
 
-void Tiles::book(std::int64_t nBytes) {
+std::int32_t Tiles::memoryUseGPU() const {
     std::int64_t const nLargest = std::numeric_limits<std::int32_t>::max();
-    nMemoryUseGPU_ =
-        static_cast<std::int32_t>(std::clamp<std::int64_t>(nMemoryUseGPU_ + nBytes, 0, nLargest));
+    return static_cast<std::int32_t>(std::min(nMemoryUseGPU_, nLargest));
+}
+
+std::int64_t Tiles::takeOffBooks(ImageWrapper& tile) {
+    std::int64_t const nBytes = std::exchange(tile.nBookedSize_, 0);
+    // A tile that the host took from another grid was booked there.
+    nMemoryUseGPU_ = std::max<std::int64_t>(nMemoryUseGPU_ - nBytes, 0);
+    return nBytes;
 }
 
 ImageWrapper* Tiles::createTileAt(int index, PositionExtentInPixelSpace const& rect) {
@@ -119,17 +125,16 @@ ImageWrapper* Tiles::createTileAt(int index, PositionExtentInPixelSpace const& r
     std::shared_ptr<ImageWrapper>& spPlace = vspTiles_[static_cast<std::size_t>(index)];
     std::int64_t nOldSize = 0;
     if (spPlace) {
-        nOldSize = bytesOf(*spDescriptor_, spPlace->image().rect());
-        book(-nOldSize);
+        nOldSize = takeOffBooks(*spPlace);
         // Off the books already: the cleanup must not come to it.
         spPlace.reset();
     }
-    std::int64_t const nNewSize = bytesOf(*spDescriptor_, rect);
-    if (nNewSize > nOldSize) {
+    spNew->nBookedSize_ = bytesOf(*spDescriptor_, rect);
+    if (spNew->nBookedSize_ > nOldSize) {
         cleanupGPU(static_cast<std::size_t>(std::max(nGPUMemoryLimit_, 0)));
     }
+    nMemoryUseGPU_ += spNew->nBookedSize_;
     spPlace = std::move(spNew);
-    book(nNewSize);
     return spPlace.get();
 }
 
@@ -147,9 +152,8 @@ void Tiles::cleanupGPU(std::size_t limit) {
 void Tiles::cleanupTileStorage(ImageWrapper* pTile) {
     ORVO_ENFORCE(pTile);
     if (pTile->imageHasPixelStorage()) {
-        std::size_t const nSize = pTile->storageSize();
         pTile->releaseStorage();
-        book(-static_cast<std::int64_t>(nSize));
+        takeOffBooks(*pTile);
     }
 }
 

@@ -32,8 +32,10 @@ class ImageWrapper;
 /// A filter that looks at a neighbourhood needs more of its input than the tile: ask an embedded processor
 /// for the region of interest of its source.
 ///
-/// `memoryUseGPU` is a ledger of what `createTileAt` and the cleanups have booked, in bytes, and no
-/// measurement: tiles from the constructors are not in it.
+/// `memoryUseGPU` is a ledger of what `createTileAt` has booked and the cleanups have taken off again, in
+/// bytes, and no measurement: tiles from the constructors are not in it, and a tile that the host frees or
+/// drops by itself stays in it. Each tile is taken off once, so the limit holds however often the places are
+/// made anew.
 ///
 /// Threads: as `ImageWrapper`.
 class ORVO_API Tiles {
@@ -70,8 +72,8 @@ public:
 
     ImageDescriptor const& descriptor() const { return *spDescriptor_; }
 
-    /// Bytes, never negative.
-    std::int32_t memoryUseGPU() const { return nMemoryUseGPU_; }
+    /// Bytes, never negative; 2^31 - 1 where it is more.
+    std::int32_t memoryUseGPU() const;
 
     /// Whether the tiles are visited from the back to the front: then `cleanupGPU` begins at the front.
     void setReverseTraversal(bool bReverse) { bReverseTraversal_ = bReverse; }
@@ -85,17 +87,18 @@ public:
     /// three tiles stay in their order.
     void reorderTilesAsSerpentine();
 
-    /// Puts a new tile, without storage, into a place, and books its bytes; before that, if it is larger than
-    /// the one there, frees others down to the limit. The pointer is valid as long as the tile stands there.
+    /// Puts a new tile, without storage, into a place, and books its bytes; before that, if these are more
+    /// than what is booked for the one there (nothing, if its storage was freed by a cleanup), frees others
+    /// down to the limit. The pointer is valid as long as the tile stands there.
     /// @throws ParameterException "index >= 0 && index < tiles().size()"; as `ImageWrapper`. The tiles are
     /// then as they were.
     ImageWrapper* createTileAt(int index, PositionExtentInPixelSpace const& rect);
 
     /// While more than `limit` bytes are booked, frees the storage of tiles, those that the traversal reaches
-    /// last first, and takes it off the books.
+    /// last first, and takes off the books what is booked for them.
     void cleanupGPU(std::size_t limit);
 
-    /// Frees the storage of one tile, if its image has it, and takes it off the books.
+    /// Frees the storage of one tile, if its image has it, and takes off the books what is booked for it.
     /// @throws InternalException "Enforce pTile != NULL".
     void cleanupTileStorage(ImageWrapper* pTile);
 
@@ -104,13 +107,14 @@ public:
 
 private:
     void createTiles(ExtentInPixelSpace const& tileSize);
-    void book(std::int64_t nBytes);
+    /// Answers what was booked for the tile, in bytes, which is nothing from then on.
+    std::int64_t takeOffBooks(ImageWrapper& tile);
 
     std::shared_ptr<ImageDescriptor> spDescriptor_;
     PositionExtentInPixelSpace oRect_;
     std::vector<std::shared_ptr<ImageWrapper>> vspTiles_;
     bool bReverseTraversal_ = false;
-    std::int32_t nMemoryUseGPU_ = 0;
+    std::int64_t nMemoryUseGPU_ = 0;
     std::int32_t nGPUMemoryLimit_ = 0x7fffffff;
 };
 

@@ -12,11 +12,12 @@
 #include "orvo/ogl/ExceptionOGL.h"
 #include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/Framebuffer.h"
-#include "orvo/ogl/FunctionTable.h"
+#include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/Texture2D.h"
 #include "orvo/ogl/TextureState.h"
 #include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/GL.h"
+#include "orvo/ogl/internal/ScopedFramebufferBindings.h"
 
 #include <algorithm>
 #include <cmath>
@@ -28,6 +29,7 @@ namespace ORVO {
 namespace {
 
 using ImageFlow::bilateral::PixelBuffer;
+using ImageFlow::bilateral::ScopedPlainDrawing;
 using ImageFlow::bilateral::ScopedTarget;
 
 /// Cells of the grid beyond those of the image: four at either end, and one.
@@ -107,6 +109,14 @@ FastBilateralFilterGPU::FastBilateralFilterGPU()
         compilePrograms();
     } catch (...) {
         bRunInHardware_ = false;
+        if (OGL::NativeContext::currentHandle() != nullptr) {
+            // Nobody asked for what failed here: the next frame in the context must not find it.
+            OGL::Internal::clearErrors();
+        }
+    }
+    if (!bRunInHardware_) {
+        // Programs may be missing: without a framebuffer no frame begins.
+        pFramebuffer_.reset();
     }
 }
 
@@ -122,17 +132,11 @@ void FastBilateralFilterGPU::probeFloatTargets() {
         return;
     }
     constexpr unsigned nSize = 16;
-    GLint nBound = 0;
-    glGetIntegerv(GL_FRAMEBUFFER_BINDING, &nBound);
-    auto const restore = [&] { manager.table()->glBindFramebuffer(GL_FRAMEBUFFER, GLuint(nBound)); };
-    try {
+    {
+        OGL::Internal::ScopedFramebufferBindings const bindings;
         OGL::Texture2D texture(OGL::Texture::INTERNAL_FORMAT_RGB16F, nSize, nSize, false, nullptr);
         ScopedTarget const target(*pFramebuffer_, &texture);
-    } catch (...) {
-        restore();
-        throw;
     }
-    restore();
     ORVO_OGL_THROW_ON_ERROR("The driver refuses a texture of floats to draw to");
 }
 
@@ -196,6 +200,7 @@ void FastBilateralFilterGPU::internalProcess() {
         enableInputUnit(states);
         // A frame that failed may have left a program behind, if the driver took its context away.
         glUseProgram(0);
+        ScopedPlainDrawing const plain;
         readParameters();
         setUpOutput(input);
         setUpQuad(input);

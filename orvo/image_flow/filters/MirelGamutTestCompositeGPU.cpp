@@ -1,6 +1,7 @@
 #include "orvo/image_flow/filters/MirelGamutTestCompositeGPU.h"
 
 #include "orvo/core/Check.h"
+#include "orvo/image_runtime/images/ImageGPU.h"
 #include "orvo/ogl/Program.h"
 #include "orvo/ogl/TextureState.h"
 
@@ -28,6 +29,36 @@ void main() {
     gl_FragColor = bg * g + (1.0 - g) * (bg * (1.0 - opacity) + color * opacity);
 }
 )";
+
+/// One direction of an image: where it begins and how long its texture is, in its pixels, and their size.
+struct MaskSpan {
+    int nPosition_;
+    int nCapacity_;
+    float pixelExtent_;
+};
+
+/// How texture coordinates of one image become those of another: (coordinate - offset) * delta.
+struct MaskMapping {
+    float offset_ = 0.0F;
+    float delta_ = 1.0F;
+};
+
+MaskMapping maskMappingOf(MaskSpan const& from, MaskSpan const& to) {
+    if (from.nCapacity_ <= 0 || to.nCapacity_ <= 0) {
+        return {};
+    }
+    double const dScale = double(from.pixelExtent_) / double(to.pixelExtent_);
+    return {static_cast<float>((to.nPosition_ / dScale - from.nPosition_) / from.nCapacity_),
+            static_cast<float>(from.nCapacity_ * dScale / to.nCapacity_)};
+}
+
+MaskSpan columnsOf(ImageGPU const& image) {
+    return {image.position().x(), image.capacityExtent().width(), image.pixelExtent().width()};
+}
+
+MaskSpan rowsOf(ImageGPU const& image) {
+    return {image.position().y(), image.capacityExtent().height(), image.pixelExtent().height()};
+}
 
 } // namespace
 
@@ -68,15 +99,19 @@ void MirelGamutTestCompositeGPU::setUniforms(OGL::Program& program) {
     float4 const color = oColor_.value();
     program.setUniform("color", color.x, color.y, color.z, color.w);
     program.setUniform("opacity", oOpacity_.value());
-    // Whole images: the place of the tile in the world is the texture's own.
+    // Whole images: the place of the tile in the world is that in the first one's texture. In the second
+    // one's it is the same, where both have the same rectangle and textures of the same size.
+    ImageGPU const& result = *oGamutTestResult_;
+    MaskMapping const x = maskMappingOf(columnsOf(inputImage()), columnsOf(result));
+    MaskMapping const y = maskMappingOf(rowsOf(inputImage()), rowsOf(result));
     program.setUniform("_outOffset", 0.0F, 0.0F);
     program.setUniform("_outPixelExtent", 1.0F, 1.0F);
     program.setUniform("src_offset", 0.0F, 0.0F);
     program.setUniform("src_delta", 1.0F, 1.0F);
-    program.setUniform("gamutResult_offset", 0.0F, 0.0F);
-    program.setUniform("gamutResult_delta", 1.0F, 1.0F);
+    program.setUniform("gamutResult_offset", x.offset_, y.offset_);
+    program.setUniform("gamutResult_delta", x.delta_, y.delta_);
     program.setUniformSampler2D("src_sampler", 0);
-    program.setUniformSampler2D("gamutResult_sampler", oGamutTestResult_.get()->boundTexUnit());
+    program.setUniformSampler2D("gamutResult_sampler", result.boundTexUnit());
 }
 
 } // namespace ORVO

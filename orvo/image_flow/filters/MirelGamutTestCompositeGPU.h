@@ -16,9 +16,10 @@ namespace ORVO {
 ///
 ///     result = source * g + (1 - g) * (source * (1 - opacity) + color * opacity)
 ///
-/// for all four channels alike, g being the second image's. Both images are read at the same texture
-/// coordinates: they cover the same rectangle, with textures of the same size, as where both come out of one
-/// graph. The texture of the second one is bound to unit 1.
+/// for all four channels alike, g being the second image's. Both images cover the rectangle that is drawn.
+/// Each pixel is read with that at the same place in the world, wherever the images begin and however large
+/// their textures are: what filters make has textures of the pool, with room to spare. The texture of the
+/// second one is bound to unit 1.
 ///
 /// Threads: as DisplayFilterGPU.
 class ORVO_API MirelGamutTestCompositeGPU : public DisplayFilterGPU {

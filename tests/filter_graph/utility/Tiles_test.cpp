@@ -8,6 +8,7 @@
 #include "tests/support/CoreLayer.h"
 #include "tests/support/Expect.h"
 
+#include <algorithm>
 #include <limits>
 #include <new>
 
@@ -269,7 +270,7 @@ TEST_F(TilesTest, PassesTilesWithoutStorageWhenItFrees) {
     EXPECT_EQ(tiles.memoryUseGPU(), 300);
 }
 
-TEST_F(TilesTest, NeverBooksLessThanNothing) {
+TEST_F(TilesTest, TakesOffTheBooksOnlyWhatIsBookedForATile) {
     // Tiles of the constructor have storage that was never booked.
     Tiles tiles(rgb8(), rectangle(0, 0, 60, 20), ExtentInPixelSpace(20, 20));
     for (auto const& spTile : tiles.tiles()) {
@@ -281,9 +282,21 @@ TEST_F(TilesTest, NeverBooksLessThanNothing) {
     tiles.cleanupGPU(0);
     EXPECT_EQ(haveStorage(tiles), (std::vector<bool>{false, true, true}));
     tiles.createTileAt(0, rectangle(0, 0, 10, 10))->initializeStorage(); // 300 bytes on the books
-    tiles.cleanupGPU(299);                                               // the last tile has 1200
+    tiles.cleanupTileStorage(tiles.tiles()[2].get());                    // 1200 bytes that are not
+    EXPECT_EQ(tiles.memoryUseGPU(), 300);
+    tiles.cleanupGPU(299); // comes past the second tile, which does not count
     EXPECT_EQ(tiles.memoryUseGPU(), 0);
-    EXPECT_EQ(haveStorage(tiles), (std::vector<bool>{true, true, false}));
+    EXPECT_EQ(haveStorage(tiles), (std::vector<bool>{false, false, false}));
+    ImageWrapper other(rgb8(), rectangle(0, 0, 10, 10));
+    other.initializeStorage();
+    fill(tiles);
+    tiles.cleanupTileStorage(&other);
+    EXPECT_FALSE(other.imageHasPixelStorage());
+    EXPECT_EQ(tiles.memoryUseGPU(), 900);
+    // An image that has another size by now was booked with that of its tile.
+    (*tiles.tiles()[1])->setRect(rectangle(0, 0, 50, 50));
+    tiles.cleanupTileStorage(tiles.tiles()[1].get());
+    EXPECT_EQ(tiles.memoryUseGPU(), 600);
 }
 
 TEST_F(TilesTest, FreesOneTile) {
@@ -324,12 +337,79 @@ TEST_F(TilesTest, DoesNotFreeWhatItReplacesTwice) {
     EXPECT_EQ(tiles.memoryUseGPU(), 1200);
 }
 
-TEST_F(TilesTest, BooksAtMostWhatItsCounterHolds) {
-    Tiles tiles(rgb8(), rectangle(0, 0, 30000, 20000), 3);
+TEST_F(TilesTest, KeepsToTheLimitInEveryPass) {
+    // Ten tiles of 300 bytes, of which two may stand beside the one that is made.
+    for (bool const bReverse : {false, true}) {
+        Tiles tiles(rgb8(), rectangle(0, 0, 100, 10), 10);
+        tiles.setReverseTraversal(bReverse);
+        tiles.setGPUMemoryLimit(600);
+        std::size_t const nBefore = Core::MemoryStatistics::blocks(MEMORY_TYPE_IMAGE);
+        for (int step = 0; step < 40; ++step) {
+            int const index = bReverse ? 9 - step % 10 : step % 10;
+            tiles.createTileAt(index, rectangle(10 * index, 0, 10, 10))->initializeStorage();
+            std::vector<bool> const aStorage = haveStorage(tiles);
+            EXPECT_TRUE(aStorage[static_cast<std::size_t>(index)]) << step;
+            // The first two of a pass stay; the third place is that of the newest.
+            EXPECT_EQ(std::count(aStorage.begin(), aStorage.end(), true), std::min(step + 1, 3)) << step;
+            EXPECT_EQ(tiles.memoryUseGPU(), 300 * std::min(step + 1, 3)) << step;
+            EXPECT_EQ(Core::MemoryStatistics::blocks(MEMORY_TYPE_IMAGE),
+                      nBefore + static_cast<std::size_t>(std::min(step + 1, 3)))
+                << step;
+        }
+    }
+}
+
+TEST_F(TilesTest, KeepsToTheLimitInPlacesOfTheConstructorsTiles) {
+    Tiles tiles(rgb8(), rectangle(0, 0, 100, 20), ExtentInPixelSpace(20, 20)); // 1200 bytes each
+    tiles.setGPUMemoryLimit(1200);
+    for (int step = 0; step < 15; ++step) {
+        int const index = step % 5;
+        tiles.createTileAt(index, rectangle(20 * index, 0, 20, 20))->initializeStorage();
+        EXPECT_EQ(tiles.memoryUseGPU(), 1200 * std::min(step + 1, 2)) << step;
+        std::vector<bool> const aStorage = haveStorage(tiles);
+        EXPECT_EQ(std::count(aStorage.begin(), aStorage.end(), true), std::min(step + 1, 2)) << step;
+    }
+}
+
+TEST_F(TilesTest, KeepsOnTheBooksWhatAHostDrops) {
+    Tiles tiles(rgb8(), rectangle(0, 0, 30, 10), 1);
+    for (int i = 1; i <= 3; ++i) {
+        tiles.createTileAt(0, rectangle(0, 0, 10, 10));
+        EXPECT_EQ(tiles.memoryUseGPU(), 300 * i);
+        tiles.tiles()[0].reset();
+    }
+    // A tile of another grid takes its own bytes with it, and no more than there are.
+    Tiles other(rgb8(), rectangle(0, 0, 30, 10), 1);
+    other.createTileAt(0, rectangle(0, 0, 30, 20))->initializeStorage(); // 1800 bytes
+    tiles.cleanupTileStorage(other.tiles()[0].get());
+    EXPECT_EQ(tiles.memoryUseGPU(), 0);
+    EXPECT_EQ(other.memoryUseGPU(), 1800);
+}
+
+TEST_F(TilesTest, CountsBeyondWhatItAnswers) {
+    Tiles tiles(rgb8(), rectangle(0, 0, 30000, 20000), 4);
     EXPECT_EQ(tiles.createTileAt(0, rectangle(0, 0, 20000, 20000))->storageSize(), 1200000000U);
     EXPECT_EQ(tiles.memoryUseGPU(), 1200000000);
     tiles.createTileAt(1, rectangle(0, 0, 20000, 20000));
     EXPECT_EQ(tiles.memoryUseGPU(), std::numeric_limits<std::int32_t>::max());
+    tiles.createTileAt(2, rectangle(0, 0, 20000, 20000));
+    EXPECT_EQ(tiles.memoryUseGPU(), std::numeric_limits<std::int32_t>::max());
+    // 3.6e9 bytes, less two tiles, plus 2 * 3 bytes.
+    tiles.createTileAt(0, rectangle(0, 0, 1, 1));
+    EXPECT_EQ(tiles.memoryUseGPU(), std::numeric_limits<std::int32_t>::max());
+    tiles.createTileAt(1, rectangle(0, 0, 1, 1));
+    EXPECT_EQ(tiles.memoryUseGPU(), 1200000006);
+}
+
+TEST_F(TilesTest, KeepsToTheLargestLimit) {
+    // Two tiles of 1.2e9 bytes pass 2^31 - 1: the small one, which has storage, goes.
+    Tiles tiles(rgb8(), rectangle(0, 0, 30000, 20000), 4);
+    tiles.createTileAt(0, rectangle(0, 0, 10, 10))->initializeStorage();
+    tiles.createTileAt(1, rectangle(0, 0, 20000, 20000));
+    tiles.createTileAt(2, rectangle(0, 0, 20000, 20000));
+    EXPECT_TRUE(tiles.tiles()[0]->imageHasPixelStorage());
+    tiles.createTileAt(3, rectangle(0, 0, 1, 1));
+    EXPECT_FALSE(tiles.tiles()[0]->imageHasPixelStorage());
 }
 
 TEST_F(TilesTest, StaysAsItWasWithoutMemory) {

@@ -14,11 +14,41 @@ namespace {
 
 using namespace Test;
 
+/// Two for each pixel of the pictures, and more.
+std::array<float, 256> aGenericVertices{};
+
+/// One setting of a host that points, sums or what is read back would show.
+struct HostPointState {
+    char const* pName_;
+    void (*pSet_)();
+};
+
+constexpr HostPointState aPointStates[] = {
+    {"blend equation", [] { glBlendEquationSeparate(GL_FUNC_REVERSE_SUBTRACT, GL_MIN); }},
+    {"blend equation of colours", [] { glBlendEquation(GL_MAX); }},
+    {"swapped bytes", [] { glPixelStorei(GL_PACK_SWAP_BYTES, GL_TRUE); }},
+    {"point sprites",
+     [] {
+         glActiveTexture(GL_TEXTURE0);
+         glTexEnvi(GL_POINT_SPRITE, GL_COORD_REPLACE, GL_TRUE);
+         glEnable(GL_POINT_SPRITE);
+         glActiveTexture(GL_TEXTURE1);
+     }},
+    {"generic array 0",
+     [] {
+         glVertexAttribPointer(0, 2, GL_FLOAT, GL_FALSE, 0, aGenericVertices.data());
+         glEnableVertexAttribArray(0);
+         glVertexAttribPointer(3, 2, GL_FLOAT, GL_FALSE, 0, aGenericVertices.data());
+         glEnableVertexAttribArray(3);
+     }},
+};
+
 class HostContextFramesTest : public ShaderFlowTest {
 protected:
     /// Sets all that a pass sets to something else.
     void makeStateOdd() {
         glPushAttrib(GL_ALL_ATTRIB_BITS);
+        glPushClientAttrib(GL_CLIENT_ALL_ATTRIB_BITS);
         glGenFramebuffers(2, aFramebuffers_.data());
         glBindFramebuffer(GL_DRAW_FRAMEBUFFER, aFramebuffers_[0]);
         glBindFramebuffer(GL_READ_FRAMEBUFFER, aFramebuffers_[1]);
@@ -51,10 +81,13 @@ protected:
         glClearColor(0.1f, 0.2f, 0.3f, 0.4f);
         glColor4f(0.5f, 0.25f, 0.75f, 1.0f);
         glPointSize(5.0f);
+        glEnable(GL_VERTEX_PROGRAM_POINT_SIZE);
+        for (HostPointState const& state : aPointStates) {
+            state.pSet_();
+        }
         std::array<double, 4> const aNothing{0.0, 0.0, 0.0, -1.0};
         glClipPlane(GL_CLIP_PLANE3, aNothing.data());
         glEnable(GL_CLIP_PLANE3);
-        glPushClientAttrib(GL_CLIENT_VERTEX_ARRAY_BIT);
         glEnableClientState(GL_NORMAL_ARRAY);
         glVertexPointer(3, GL_FLOAT, 12, aVertices_.data());
         char const* pText = "void main() { gl_FragColor = vec4(1.0); }";
@@ -138,6 +171,59 @@ TEST_F(HostContextFramesTest, TheBilateralFilterSeesNothingOfTheHostsStateAndPut
     EXPECT_EQ(aMatrix, textureMatrix());
     makeStateNormal();
     EXPECT_EQ(0.0, gpuBilateral::largestDifference(Texels(*pResult), plain, false));
+}
+
+TEST_F(HostContextFramesTest, TheBilateralFiltersPointsAreThoseOfEveryHost) {
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 9, 7), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
+    FastBilateralFilterGPU filter;
+    filter.spatialSigma().setValue(float2(2.0f, 2.0f));
+    filter.colorize().setValue(true);
+    ShaderRoad road(context(), filter);
+    road.setInput(0, *upInput);
+    Texels const plain(*road.run(world(0, 0, 9, 7)));
+    for (HostPointState const& state : aPointStates) {
+        SCOPED_TRACE(state.pName_);
+        glPushAttrib(GL_ALL_ATTRIB_BITS);
+        glPushClientAttrib(GL_CLIENT_ALL_ATTRIB_BITS);
+        glActiveTexture(GL_TEXTURE1);
+        state.pSet_();
+        GLState const before = GLState::capture();
+        ImageGPU const* const pResult = road.run(world(0, 0, 9, 7));
+        EXPECT_EQ("", before.differencesTo(GLState::capture()));
+        glPopClientAttrib();
+        glPopAttrib();
+        EXPECT_EQ(0.0, gpuBilateral::largestDifference(Texels(*pResult), plain, false));
+    }
+}
+
+TEST_F(HostContextFramesTest, ABilateralFilterThatFailsPutsTheHostsStateBack) {
+    ImageGPUPtr const upInput = textureOf(randomTexels(pixels(0, 0, 9, 7), 1), ImageGPU::PIXEL_FORMAT_RGBA8);
+    FastBilateralFilterGPU filter;
+    filter.spatialSigma().setValue(float2(2.0f, 2.0f));
+    ShaderRoad road(context(), filter);
+    road.setInput(0, *upInput);
+    Texels const plain(*road.run(world(0, 0, 9, 7)));
+    bool bMore = true;
+    for (std::uint64_t n = 1; bMore; ++n) {
+        ASSERT_LT(n, 200U);
+        makeStateOdd();
+        GLState const before = GLState::capture();
+        std::string sFailed;
+        {
+            GLCallFailure const failure(n);
+            try {
+                road.run(world(0, 0, 9, 7));
+            } catch (OGL::ExceptionOGL const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bMore = failure.hasFired();
+            sFailed = failure.name();
+        }
+        EXPECT_EQ("", before.differencesTo(GLState::capture())) << sFailed;
+        makeStateNormal();
+        Texels const after(*road.run(world(0, 0, 9, 7)));
+        EXPECT_EQ(0.0, gpuBilateral::largestDifference(after, plain, false)) << sFailed;
+    }
 }
 
 } // namespace

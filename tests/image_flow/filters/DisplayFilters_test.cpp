@@ -26,7 +26,10 @@ class DisplayFiltersTest : public ShaderFlowTest {
 protected:
     /// A frame of the whole image in 32-bit floats.
     Texels run(ImageFilter& filter, std::vector<ImageGPU*> const& vpInputs) {
-        PositionExtentInPixelSpace const region = vpInputs.front()->positionExtent();
+        return run(filter, vpInputs, vpInputs.front()->positionExtent());
+    }
+    Texels run(ImageFilter& filter, std::vector<ImageGPU*> const& vpInputs,
+               PositionExtentInPixelSpace const& region) {
         ImageGPUPtr const upTarget = textureImage(region, ImageGPU::PIXEL_FORMAT_RGBA32F);
         ShaderRoad road(frameContext(), filter);
         for (std::size_t i = 0; i < vpInputs.size(); ++i)
@@ -223,6 +226,57 @@ TEST_F(DisplayFiltersTest, OneImageServesBothInputs) {
     // p * p + (1 - p) * 1
     EXPECT_EQ((Pixel{0.8125, 0.75, 0.8125, 1}), run(filter, {upInput.get(), upInput.get()}).at(0, 0));
     EXPECT_EQ(-1, upInput->boundTexUnit());
+}
+
+TEST_F(DisplayFiltersTest, TheGamutIsThatOfThePlaceWhateverTheTexturesSizes) {
+    // The mask is 1 in the columns and rows where both are odd.
+    auto const isInside = [](int x, int y) { return x % 2 != 0 && y % 2 != 0; };
+    PositionExtentInPixelSpace const drawn = pixels(2, 1, 5, 3);
+    struct Case {
+        PositionExtentInPixelSpace input_;
+        bool bInputExact_;
+        PositionExtentInPixelSpace mask_;
+        bool bMaskExact_;
+    };
+    for (Case const& c : {Case{drawn, true, drawn, false}, Case{drawn, false, drawn, true},
+                          Case{pixels(-3, -2, 11, 8), true, drawn, true},
+                          Case{drawn, false, pixels(-40, -1, 100, 7), true}}) {
+        ImageGPUPtr const upInput = textureOf(Texels(c.input_).fill([](int x, int y) {
+            return Pixel{x / 8.0, y / 8.0, 0.5, 1};
+        }),
+                                              ImageGPU::PIXEL_FORMAT_RGBA32F, c.bInputExact_);
+        ImageGPUPtr const upMask = textureOf(Texels(c.mask_).fill([&](int x, int y) {
+            return isInside(x, y) ? Pixel{1, 1, 1, 1} : Pixel{};
+        }),
+                                             ImageGPU::PIXEL_FORMAT_RGBA8, c.bMaskExact_);
+        EXPECT_NE(upInput->capacityExtent(), upMask->capacityExtent());
+        MirelGamutTestCompositeGPU filter;
+        filter.color().setValue(float4(1, 0.25F, 0.75F, 0.5F));
+        filter.opacity().setValue(1.0F);
+        Texels const result = run(filter, {upInput.get(), upMask.get()}, drawn);
+        for (int y = 1; y < 4; ++y) {
+            for (int x = 2; x < 7; ++x) {
+                Pixel const inside{x / 8.0, y / 8.0, 0.5, 1};
+                Pixel const outside{1, 0.25, 0.75, 0.5};
+                EXPECT_EQ(isInside(x, y) ? inside : outside, result.at(x, y)) << x << ", " << y;
+            }
+        }
+    }
+}
+
+TEST_F(DisplayFiltersTest, TheGamutMayHaveAnotherPixelGrid) {
+    // Pixels of the mask are two by one of the image's: 1 in every second column.
+    Texels mask(pixels(-1, 0, 6, 4), PixelExtentInWorldSpace(2.0F, 1.0F));
+    mask.fill([](int x, int) { return x % 2 != 0 ? Pixel{1, 1, 1, 1} : Pixel{}; });
+    ImageGPUPtr const upMask = textureOf(mask, ImageGPU::PIXEL_FORMAT_RGBA8);
+    ImageGPUPtr const upInput = plain({0.25, 0.5, 0.75, 1}, pixels(0, 0, 8, 2));
+    MirelGamutTestCompositeGPU filter;
+    filter.color().setValue(float4(1, 1, 1, 1));
+    filter.opacity().setValue(1.0F);
+    Texels const result = run(filter, {upInput.get(), upMask.get()});
+    for (int x = 0; x < result.width(); ++x) {
+        EXPECT_EQ(x / 2 % 2 != 0 ? 0.25 : 1.0, result.at(result.left() + x, result.top())[0]) << x;
+    }
 }
 
 TEST_F(DisplayFiltersTest, KeepTheFormatOfTheirInputAndObeyTheHint) {

@@ -35,6 +35,11 @@ constexpr Query aQueries[] = {
     QUERY(GL_COLOR_WRITEMASK, 4),
     QUERY(GL_BLEND_SRC, 1),
     QUERY(GL_BLEND_DST, 1),
+    QUERY(GL_BLEND_SRC_ALPHA, 1),
+    QUERY(GL_BLEND_DST_ALPHA, 1),
+    QUERY(GL_BLEND_EQUATION_RGB, 1),
+    QUERY(GL_BLEND_EQUATION_ALPHA, 1),
+    QUERY(GL_POINT_SIZE, 1),
     QUERY(GL_CURRENT_PROGRAM, 1),
     QUERY(GL_DRAW_FRAMEBUFFER_BINDING, 1),
     QUERY(GL_READ_FRAMEBUFFER_BINDING, 1),
@@ -66,7 +71,8 @@ constexpr Query aEnables[] = {QUERY(GL_BLEND, 0),        QUERY(GL_DEPTH_TEST, 0)
                               QUERY(GL_LIGHTING, 0),     QUERY(GL_FOG, 0),
                               QUERY(GL_VERTEX_ARRAY, 0), QUERY(GL_COLOR_ARRAY, 0),
                               QUERY(GL_DITHER, 0),       QUERY(GL_MULTISAMPLE, 0),
-                              QUERY(GL_NORMAL_ARRAY, 0), QUERY(GL_TEXTURE_COORD_ARRAY, 0)};
+                              QUERY(GL_NORMAL_ARRAY, 0), QUERY(GL_TEXTURE_COORD_ARRAY, 0),
+                              QUERY(GL_POINT_SPRITE, 0), QUERY(GL_VERTEX_PROGRAM_POINT_SIZE, 0)};
 
 #undef QUERY
 
@@ -106,8 +112,17 @@ GLState GLState::capture() {
         GLint nMode = 0;
         glGetTexEnviv(GL_TEXTURE_ENV, GL_TEXTURE_ENV_MODE, &nMode);
         values.push_back(nMode);
+        GLint nReplaced = 0;
+        glGetTexEnviv(GL_POINT_SPRITE, GL_COORD_REPLACE, &nReplaced);
+        values.push_back(nReplaced);
     }
     glActiveTexture(nActive);
+    auto& arrays = state.aValues_["generic arrays"];
+    for (GLuint i = 0; i < static_cast<GLuint>(integerOf(GL_MAX_VERTEX_ATTRIBS)); ++i) {
+        GLint nEnabled = 0;
+        glGetVertexAttribiv(i, GL_VERTEX_ATTRIB_ARRAY_ENABLED, &nEnabled);
+        arrays.push_back(nEnabled);
+    }
     return state;
 }
 

@@ -8,7 +8,8 @@
 namespace ORVO::Test {
 
 /// The state that the engine touches: bindings and enables of every unit, viewport, scissor, matrices, clear
-/// and current colours, blending, pixel store, active unit, program, framebuffer, buffers.
+/// and current colours, blending, points, generic arrays, pixel store, active unit, program, framebuffer,
+/// buffers.
 class GLState {
 public:
     /// The current context's state.
