@@ -59,19 +59,25 @@ TEST_F(ColourFramesCPU, FramesOnManyThreadsShareATransform) {
     }
     auto const before = engineStatistics();
     std::atomic<int> nReady{0};
+    std::atomic<int> nFailed{0};
     std::vector<std::thread> aThreads;
     aThreads.reserve(kThreads);
     for (auto const& upGraph : aGraphs) {
-        aThreads.emplace_back([&nReady, &graph = *upGraph] {
+        aThreads.emplace_back([&nReady, &nFailed, &graph = *upGraph] {
             ++nReady;
             while (nReady < kThreads)
                 std::this_thread::yield();
-            for (int i = 0; i < kFrames; ++i)
-                graph.spProcessor_->processFrame(cpuOptions());
+            try {
+                for (int i = 0; i < kFrames; ++i)
+                    graph.spProcessor_->processFrame(cpuOptions());
+            } catch (...) {
+                ++nFailed;
+            }
         });
     }
     for (std::thread& thread : aThreads)
         thread.join();
+    EXPECT_EQ(0, nFailed);
     EXPECT_EQ(before.nTransforms + 1, engineStatistics().nTransforms);
     for (auto const& upGraph : aGraphs) {
         EXPECT_EQ(transformed(upGraph->oInput_.pixels(), UnevenProfile::kCode, PROFILE_BT_2020),
