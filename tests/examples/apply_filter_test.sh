@@ -84,6 +84,14 @@ for target in cpu gl; do
 done
 accepted --filter ColorspaceTransformer --set srcProfile=sRGB --set dstProfile=P3 "$photograph" "$scratch/p3.png"
 cmp -s "$photograph" "$scratch/p3.png" && fail "sRGB to P3 changes nothing"
+# The profile that stands in a file is the source where none is named, and the default is where none stands there.
+for picture in astronaut coffee; do
+    accepted --filter ColorspaceTransformer --set dstProfile=sRGB "$data/$picture.png" "$scratch/own_$picture.png"
+    accepted --filter ColorspaceTransformer --set srcProfile=0x41533938 --set dstProfile=sRGB \
+        "$data/$picture.png" "$scratch/named_$picture.png"
+done
+cmp -s "$scratch/own_astronaut.png" "$scratch/named_astronaut.png" && fail "the profile in the file changes nothing"
+cmp -s "$scratch/own_coffee.png" "$scratch/named_coffee.png" || fail "a file without a profile has another source"
 refused 2 'is a colour space, which "nonsense" is not' --filter ColorspaceTransformer --set srcProfile=nonsense \
     "$photograph" "$scratch/out.png"
 refused 1 'Cannot make src profile from code' --filter ColorspaceTransformer --set srcProfile=none \

@@ -54,6 +54,12 @@ public:
         shader_ = {};
     }
 
+    /// The engine's end: it no longer knows what it gave out, and nobody is to drop it.
+    static void loseAll() {
+        nTransforms_ = 0;
+        nShaders_ = 0;
+    }
+
     /// How often an operation was called, by its selector.
     static std::uint64_t calls(std::string const& sSelector) { return aCalls_[rowOf(sSelector)]; }
     /// All calls of the interface of shaders.

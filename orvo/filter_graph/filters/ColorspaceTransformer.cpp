@@ -24,6 +24,8 @@ namespace ORVO::FilterGraph::Internal::Filters {
 
 namespace {
 
+constexpr char const* pNodeName = "VantleFilterGPU";
+
 Filter::OwnedParameter profileParameter(char const* name, char const* description) {
     DataFlow::Parameter<int> const source(static_cast<int>(ColourEngine::PROFILE_WIDE_GAMUT), name,
                                           description);
@@ -32,7 +34,7 @@ Filter::OwnedParameter profileParameter(char const* name, char const* descriptio
 
 template <class Node>
 std::shared_ptr<Filter> makeTransformNode(TargetPlatform target) {
-    IFilter::Identifier const identifier("VantleFilterGPU", ImageFlow::Library::imageFlowNamespace(),
+    IFilter::Identifier const identifier(pNodeName, ImageFlow::Library::imageFlowNamespace(),
                                          ImageFlow::Library::norvaneVendor(), 1);
     return {ORVO_NEW ImageFlowFilter<Node>(identifier, target), ORVODeleter<Filter>()};
 }
@@ -98,6 +100,44 @@ VantleTransform* makeOptimizedTransform(std::uint32_t sourceCode, std::uint32_t 
     return pOptimized;
 }
 
+/// Whether a filter of the compiler's graph is a colour transform, unfolded or not.
+bool isTransform(IFilter const& filter) {
+    return dynamic_cast<ColorspaceTransformer const*>(&filter) != nullptr ||
+           filter.identifier().name() == pNodeName;
+}
+
+/// The channels of the sink that a filter's result comes to; 0 if another transform is on the way, or if the
+/// sink does not say.
+std::size_t channelsOfSink(Filter const& filter) {
+    Output const* pOutput = filter.output();
+    while (pOutput != nullptr && pOutput->numConsumerInputs() > 0) {
+        Input const* const pInput = *pOutput->consumerInputs();
+        if (pInput->nChannel() != 0) {
+            return pInput->nChannel();
+        }
+        IFilter const& consumer = *pInput->parentFilter();
+        pOutput = isTransform(consumer) ? nullptr : consumer.output();
+    }
+    return 0;
+}
+
+/// The channels of the source behind a filter's first input; 0 if it does not say.
+std::size_t channelsOfSource(Filter const& filter) {
+    IFilter const* pFilter = &filter;
+    while (pFilter != nullptr && pFilter->nChannel() == 0) {
+        InputConstIterator const iInput = pFilter->inputs();
+        pFilter = iInput.isValid() ? (*iInput)->producerFilter() : nullptr;
+    }
+    return pFilter != nullptr ? pFilter->nChannel() : 0;
+}
+
+/// Whether a node of the CPU would write a picture of one or two channels in this filter's place.
+bool hasGreyResult(Filter const& filter) {
+    std::size_t const nSink = channelsOfSink(filter);
+    std::size_t const nChannels = nSink != 0 ? nSink : channelsOfSource(filter);
+    return nChannels == 1 || nChannels == 2;
+}
+
 } // namespace
 
 ColorspaceTransformer::ColorspaceTransformer() {
@@ -135,6 +175,7 @@ std::shared_ptr<ParameterForwarder> ColorspaceTransformer::unFold(OptimizationOp
         vantleNode_g = makeTransformNode<VantleFilterGPU>(ORVO_TARGET_GL);
         vantleNode_g->initialize();
         ORVO_CHECK(vantleNode_g->isInitialized());
+        vantleNode_g->parameter("Grey Result")->as<bool>().setValue(hasGreyResult(*this));
     } else {
         vantleNode_c = makeTransformNode<VantleFilterCPU>(ORVO_TARGET_CPU);
         vantleNode_c->initialize();
@@ -169,12 +210,15 @@ ColorspaceTransformer::Forwarder::~Forwarder() = default;
 
 void ColorspaceTransformer::Forwarder::forwardStuff() {
     ColorspaceTransformer const& transformer = *pTransformer_;
+    // First, so that no transform is made that nobody takes.
+    Filter* const pNode = transformer.node();
+    ORVO_ENFORCE(pNode, "vantleNode_g");
+    FilterGraph::ParameterBase* const pParameter = pNode->parameter("Transform");
+    ORVO_ENFORCE(pParameter);
     auto const code = [&](char const* name) {
         return static_cast<std::uint32_t>(transformer.parameter(name)->as<int>().value());
     };
     VantleTransform* const pTransform = makeOptimizedTransform(code("srcProfile"), code("dstProfile"));
-    FilterGraph::ParameterBase* const pParameter = transformer.node()->parameter("Transform");
-    ORVO_ENFORCE(pParameter);
     pParameter->as<void*>().setValue(pTransform);
     forwardChildren();
 }

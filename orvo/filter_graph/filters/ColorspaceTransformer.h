@@ -14,7 +14,10 @@ namespace ORVO::FilterGraph::Internal::Filters {
 /// replaced by the node that suits the options.
 ///
 /// On the CPU images have 8-bit or 16-bit channels in R, G, B, A order or grey; on OpenGL any that frames
-/// take.
+/// take. Grey goes through a transform as equal parts of red, green and blue, and a grey result is the green
+/// one: on the CPU where the image that is written has one or two channels, on OpenGL, where images between
+/// filters have at least three, where the image has them that the graph ends in or, with another transform on
+/// the way there, the one that comes in.
 ///
 /// Threads: as Filter.
 class ORVO_API ColorspaceTransformer : public Filter {
@@ -23,7 +26,8 @@ public:
 
     /// Identifier: name "ColorspaceTransformer", nameSpace "com.norvane.orvo", vendor "Norvane", version 1.
     ColorspaceTransformer();
-    /// Copies the filter's interface and values, without connections; a node stays that of both.
+    /// Copies the filter's interface and values, without connections; a node stays that of both, until one of
+    /// them is unfolded again.
     ColorspaceTransformer(ColorspaceTransformer const& other);
     ~ColorspaceTransformer() override;
 
@@ -31,7 +35,8 @@ public:
 
     /// Puts the node filter "VantleFilterGPU", which for CPU_PROCESSING is one of the CPU, between this
     /// filter's producer and its consumers, and leaves this filter without connections; it keeps the node
-    /// filter alive.
+    /// filter alive. On OpenGL "Grey Result" of the node is set by the channels of the adapters that are
+    /// connected.
     /// @return a Forwarder, for which this filter has to stay alive.
     /// @throws InternalException "producer" if the input has no producer, "vantleNode_g->isInitialized()",
     ///         "vantleNode_c->isInitialized()", "Enforce output != NULL".
@@ -53,7 +58,7 @@ private:
 /// Threads: as ParameterForwarder.
 class ORVO_API ColorspaceTransformer::Forwarder : public ParameterForwarder {
 public:
-    /// @param transformer unfolded; not owned, has to outlive this object.
+    /// @param transformer not owned, has to outlive this object.
     explicit Forwarder(ColorspaceTransformer& transformer);
     ~Forwarder() override;
 
@@ -61,10 +66,11 @@ public:
     /// node; then runs the children. The pairs of parameters are not run. The reference on the transform goes
     /// on to the node as a plain pointer and is never dropped: the engine gives the same transform for the
     /// same codes.
-    /// @throws InternalException "Cannot make src profile from code" for a source that the engine does not
-    ///         know, and where there is no engine; "Cannot make dst profile from code"; "Cannot transform
-    ///         from source colorspace to destination colorspace"; "Cannot optimize the colorspace
-    ///         transformation". The node then keeps the transform that it has.
+    /// @throws InternalException "Enforce vantleNode_g != NULL" for a transformer that was never unfolded,
+    ///         before the engine is asked for anything; "Cannot make src profile from code" for a source that
+    ///         the engine does not know, and where there is no engine; "Cannot make dst profile from code";
+    ///         "Cannot transform from source colorspace to destination colorspace"; "Cannot optimize the
+    ///         colorspace transformation". The node then keeps the transform that it has.
     void forwardStuff() override;
 
 private:

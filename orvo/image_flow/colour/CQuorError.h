@@ -18,7 +18,8 @@ public:
     /// Takes a reference on the object; its text comes from the engine's `GetErrorMessage`. Null or an object
     /// that the engine does not know has the text "Invalid CQuorError".
     explicit CQuorError(ORVO::QuorError* pError);
-    /// A failure of the binding itself, with no object: "Missing Interface".
+    /// A failure of the binding itself, with no object: "Missing Interface". The layer has one more text of
+    /// this kind, "Memory Copy Error", for clients that copy memory by its procedures; none here does.
     explicit CQuorError(char const* pText);
     CQuorError(CQuorError const& other);
     CQuorError& operator=(CQuorError const& other);

@@ -40,6 +40,8 @@ constinit ImageFlow::VantleGuard oVantle(oVantleTable);
 
 bool CVantle::isAvailable() noexcept { return oVantle.isAvailable(); }
 
+ImageFlow::QuorTable const& CVantle::table() noexcept { return oVantleTable; }
+
 VantleResult CVantle::ProfileFromCode(VantleProfile** pOut, std::uint32_t code) {
     return oVantle.procedure<VantleProfileFromCodeProc>(VANTLE_PROFILE_FROM_CODE)(pOut, code);
 }

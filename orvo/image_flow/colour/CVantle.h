@@ -2,6 +2,7 @@
 
 #include "orvo/colour_engine/VantleProcedures.h"
 #include "orvo/core/Export.h"
+#include "orvo/image_flow/colour/QuorTable.h"
 
 #include <cstdint>
 
@@ -11,7 +12,8 @@ namespace ORVO {
 /// the names that the engine gives them, each behind a guard. The operations return the engine's result: 0 or
 /// an error handle, which `Quor_T_MT::checkQuorResult` turns into an exception.
 ///
-/// Every operation throws `TrelException` "couldn't init CVantle" where no engine can be reached.
+/// Every operation but isAvailable() and table() throws `TrelException` "couldn't init CVantle" where no
+/// engine can be reached.
 ///
 /// Threads: any.
 class ORVO_API CVantle {
@@ -20,6 +22,9 @@ public:
 
     /// Whether the engine can be reached now, without throwing.
     static bool isAvailable() noexcept;
+
+    /// The table behind the operations, of 150 slots: for whoever binds or serves the interface by slots.
+    static ImageFlow::QuorTable const& table() noexcept;
 
     /// Makes a profile from a four-character or numeric code.
     static VantleResult ProfileFromCode(VantleProfile** pOut, std::uint32_t code);

@@ -32,6 +32,8 @@ constinit ImageFlow::VantleGuard oVantleShader(oShaderTable);
 
 } // namespace
 
+ImageFlow::QuorTable const& CVantleShader::table() noexcept { return oShaderTable; }
+
 VantleResult CVantleShader::NewShader(std::uint32_t family, VantleTransform* pTransform,
                                       _t_Vantle_Options const* pOptions, VantleShader** pOut) {
     return oVantleShader.procedure<VantleNewShaderProc>(VANTLE_SHADER_NEW_SHADER)(family, pTransform,

@@ -2,6 +2,7 @@
 
 #include "orvo/colour_engine/VantleProcedures.h"
 #include "orvo/core/Export.h"
+#include "orvo/image_flow/colour/QuorTable.h"
 
 #include <cstdint>
 
@@ -15,6 +16,9 @@ namespace ORVO {
 class ORVO_API CVantleShader {
 public:
     CVantleShader() = delete;
+
+    /// The table behind the operations, of 6 slots.
+    static ImageFlow::QuorTable const& table() noexcept;
 
     /// `family` is VANTLE_SHADER_FAMILY. The caller drops the shader with `release`.
     static VantleResult NewShader(std::uint32_t family, VantleTransform* pTransform,

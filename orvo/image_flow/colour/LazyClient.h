@@ -31,7 +31,7 @@ private:
 };
 
 /// A client class with something to initialise once the binding stands: an entry of one static list for the
-/// life of the object.
+/// life of the object. The binding is live while it initialises, so it may call the engine.
 ///
 /// Threads: made and destroyed while no binding starts or stops.
 class ORVO_API LazyClient {

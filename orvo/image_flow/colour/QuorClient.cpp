@@ -39,6 +39,8 @@ int QuorClient::start(QuorGetAddressProc pProc) {
         return 0;
     }
     bStrict.store(true, std::memory_order_release);
+    // Live before the initialisers, not after them: a table is refreshed for a live client only, so that
+    // otherwise an initialiser that calls the engine would find none.
     bLive.store(true, std::memory_order_release);
     try {
         Quor_T_MT::LazyClient::initializeAll();

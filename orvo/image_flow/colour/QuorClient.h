@@ -22,9 +22,10 @@ public:
     /// Binds the layer behind an address procedure; 1 on success, also where one is bound already, which is
     /// then kept. 0 where the procedure is null, where one of the five core procedures is missing or the
     /// address of the counter is refused, or where one of the base interfaces (container, error, string,
-    /// memory, in this order) is incomplete; nothing is bound then. Afterwards the strict mode is on, the
-    /// registered `LazyClient`s are initialised in the order of their registration, and the client is live.
-    /// What an initialiser throws comes out, and nothing is bound then.
+    /// memory, in this order) is incomplete; nothing is bound then. Afterwards the strict mode is on and the
+    /// client is live, and then the registered `LazyClient`s are initialised in the order of their
+    /// registration: they may call the engine. What an initialiser throws comes out, and nothing is bound
+    /// then.
     static int start(QuorGetAddressProc pProc);
 
     /// Finishes what was begun since the start, the latest first, and forgets the address procedure. Does
@@ -33,7 +34,7 @@ public:
 
     /// The address procedure that is bound, null if none is.
     static QuorGetAddressProc addressProc() noexcept;
-    /// Whether a start succeeded and no stop came since.
+    /// Whether a start succeeded, or is initialising its clients, and no stop came since.
     static bool isLive() noexcept;
     /// Whether a table that lacks a procedure throws (true) or reports (false) at its load.
     static bool isStrict() noexcept;

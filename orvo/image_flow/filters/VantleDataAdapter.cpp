@@ -56,26 +56,21 @@ void store(Textures& textures, std::string const& sName, ScopedTexture* pTexture
     static_cast<void>(scoped.release());
 }
 
-/// What OpenGL's numbers in a record stand for.
+/// What OpenGL's numbers in a record stand for. Wrap modes are apart: those of the dimensions that a table
+/// does not have may be any numbers.
 struct TableFormat {
     explicit TableFormat(Record const& record)
         : internalFormat_(Texture::GL2InternalFormat(record.internalFormat)),
           minFilter_(Texture::GL2Filter(record.minFilter)),
           magFilter_(Texture::GL2Filter(record.magFilter)),
           type_(Texture::GL2Type(record.type)),
-          format_(Texture::GL2Format(record.format)),
-          wrapR_(Texture::GL2WrapMode(record.wrapR)),
-          wrapS_(Texture::GL2WrapMode(record.wrapS)),
-          wrapT_(Texture::GL2WrapMode(record.wrapT)) {}
+          format_(Texture::GL2Format(record.format)) {}
 
     Texture::InternalFormat internalFormat_;
     Texture::Filter minFilter_;
     Texture::Filter magFilter_;
     Texture::Type type_;
     Texture::Format format_;
-    Texture::WrapMode wrapR_;
-    Texture::WrapMode wrapS_;
-    Texture::WrapMode wrapT_;
 };
 
 /// Float formats of one set of channels, and the formats that they stand in for.
@@ -150,6 +145,7 @@ void VantleDataAdapter::buildShaderString(std::ostream& stream) {
            << "_sampler, (gl_TexCoord[0].xy*_outPixelExtent+_outOffset-" << S << "_offset)*" << S
            << "_delta);\n"
            << sEntryPoint << "(inputColor);\n"
+           << (bGreyResult_ ? "   inputColor.rgb = inputColor.ggg;\n" : "")
            << "   (gl_FragData[0]) = inputColor;\n"
            << "}\n";
 }
@@ -256,6 +252,7 @@ ScopedTexture1D* VantleDataAdapter::constructTexture1DFromData(Record const& par
                "Vantle is requesting an unsupported texture target for 1D textures");
     ORVO_ENFORCE(parameterData.data);
     TableFormat const table(parameterData);
+    Texture::WrapMode const wrapS = Texture::GL2WrapMode(parameterData.wrapS);
     ScopedPtr<ScopedTexture1D> pScoped(ORVO_NEW ScopedTexture1D(
         parameterData.width,
         escalateInternalFormat1D(table.internalFormat_, table.type_, table.minFilter_, table.magFilter_)));
@@ -264,7 +261,7 @@ ScopedTexture1D* VantleDataAdapter::constructTexture1DFromData(Record const& par
     states.push_back(ORVO_NEW ScopedTexture1DEnablerWithActivation(unit));
     states.push_back(ORVO_NEW ScopedTexture1DBindUnbindWithActivation(unit, pTexture));
     pTexture->setFilter(table.minFilter_, table.magFilter_);
-    pTexture->setWrap(table.wrapS_);
+    pTexture->setWrap(wrapS);
     pTexture->subImage(parameterData.level, 0, parameterData.width, table.format_, table.type_,
                        parameterData.data, OGL::PixelUnpackParameters());
     ORVO_OGL_THROW_ON_ERROR("A table of a colour transform could not be uploaded");
@@ -276,6 +273,8 @@ ScopedTexture2D* VantleDataAdapter::constructTexture2DFromData(Record const& par
                "Vantle is requesting an unsupported texture target for 2D textures");
     ORVO_ENFORCE(parameterData.data);
     TableFormat const table(parameterData);
+    Texture::WrapMode const wrapS = Texture::GL2WrapMode(parameterData.wrapS);
+    Texture::WrapMode const wrapT = Texture::GL2WrapMode(parameterData.wrapT);
     ScopedPtr<ScopedTexture2D> pScoped(ORVO_NEW ScopedTexture2D(
         parameterData.width, parameterData.height,
         escalateInternalFormat2D(table.internalFormat_, table.type_, table.minFilter_, table.magFilter_)));
@@ -284,7 +283,7 @@ ScopedTexture2D* VantleDataAdapter::constructTexture2DFromData(Record const& par
     states.push_back(ORVO_NEW ScopedTexture2DEnablerWithActivation(unit));
     states.push_back(ORVO_NEW ScopedTexture2DBindUnbindWithActivation(unit, pTexture));
     pTexture->setFilter(table.minFilter_, table.magFilter_);
-    pTexture->setWrap(table.wrapS_, table.wrapT_);
+    pTexture->setWrap(wrapS, wrapT);
     pTexture->subImage(parameterData.level, 0, 0, parameterData.width, parameterData.height, table.format_,
                        table.type_, parameterData.data, OGL::PixelUnpackParameters());
     ORVO_OGL_THROW_ON_ERROR("A table of a colour transform could not be uploaded");
@@ -296,6 +295,9 @@ ScopedTexture3D* VantleDataAdapter::constructTexture3DFromData(Record const& par
                "Vantle is requesting an unsupported texture target for 3D textures");
     ORVO_ENFORCE(parameterData.data);
     TableFormat const table(parameterData);
+    Texture::WrapMode const wrapS = Texture::GL2WrapMode(parameterData.wrapS);
+    Texture::WrapMode const wrapT = Texture::GL2WrapMode(parameterData.wrapT);
+    Texture::WrapMode const wrapR = Texture::GL2WrapMode(parameterData.wrapR);
     ScopedPtr<ScopedTexture3D> pScoped(ORVO_NEW ScopedTexture3DFromPool(
         parameterData.width, parameterData.height, parameterData.depth,
         escalateInternalFormat3D(table.internalFormat_, table.type_, table.minFilter_, table.magFilter_)));
@@ -304,7 +306,7 @@ ScopedTexture3D* VantleDataAdapter::constructTexture3DFromData(Record const& par
     states.push_back(ORVO_NEW ScopedTexture3DEnablerWithActivation(unit));
     states.push_back(ORVO_NEW ScopedTexture3DBindUnbindWithActivation(unit, pTexture));
     pTexture->setFilter(table.minFilter_, table.magFilter_);
-    pTexture->setWrap(table.wrapS_, table.wrapT_, table.wrapR_);
+    pTexture->setWrap(wrapS, wrapT, wrapR);
     pTexture->subImage(parameterData.level, 0, 0, 0, parameterData.width, parameterData.height,
                        parameterData.depth, table.format_, table.type_, parameterData.data,
                        OGL::PixelUnpackParameters());

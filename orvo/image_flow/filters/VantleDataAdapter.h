@@ -24,6 +24,8 @@ struct _t_Vantle_ShaderParameterData;
 /// adapter that is not valid it is another one, which draws a red diagonal over the input: it reads the
 /// sampler `InputImage` at gl_TexCoord[0], which then has to address the input's texture.
 ///
+/// A program for a grey result hands its green result on in all three channels of colour.
+///
 /// Operations throw what the shader adapter throws.
 ///
 /// Threads: the one that draws; what makes or drops textures needs a context of the image runtime current,
@@ -37,6 +39,9 @@ public:
     VantleDataAdapter& operator=(VantleDataAdapter const&) = delete;
     /// Gives the textures back to the pool.
     virtual ~VantleDataAdapter();
+
+    /// Whether programs that are built from now on are for a grey result; they are not at first.
+    void setGreyResult(bool bGrey) noexcept { bGreyResult_ = bGrey; }
 
     /// The text of the fragment program. Speaks to the engine alone.
     std::string buildGLObjects();
@@ -111,6 +116,7 @@ private:
     std::map<std::string, std::vector<float>> mat4_;
     std::string sInputSamplerName_;
     std::string sShaderCode_;
+    bool bGreyResult_ = false;
 };
 
 } // namespace ORVO

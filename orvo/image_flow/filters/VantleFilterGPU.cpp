@@ -57,10 +57,14 @@ VantleFilterGPU::VantleFilterGPU()
       vantleOptions_(
           DataFlow::Parameter<void*>::create(nullptr, "Vantle Options", "Options of the colour engine")),
       pLastTransform_(nullptr),
+      greyResult_(DataFlow::Parameter<bool>::create(false, "Grey Result", "Hands green on in all channels")),
+      bLastGreyResult_(false),
+      bDescribed_(false),
       nPopulatedFrom_(0) {
     addInput("InputImage");
     addParameter(vantleTransform_);
     addParameter(vantleOptions_);
+    addParameter(greyResult_);
 }
 
 VantleFilterGPU::~VantleFilterGPU() = default;
@@ -80,6 +84,8 @@ std::shared_ptr<DataFlow::Parameter<void*>> VantleFilterGPU::options() const {
     return vantleOptions_;
 }
 
+std::shared_ptr<DataFlow::Parameter<bool>> VantleFilterGPU::greyResult() const { return greyResult_; }
+
 std::string VantleFilterGPU::initVantle(VantleTransform* transform) {
     nPopulatedFrom_ = 0;
     spDataAdapter_.reset();
@@ -88,16 +94,32 @@ std::string VantleFilterGPU::initVantle(VantleTransform* transform) {
     auto const spDataAdapter = std::make_shared<VantleDataAdapter>(spShaderAdapter_.get());
     bCompiled_ = VantleDataAdapter::canCreateGLObjectsAsRequested(*spShaderAdapter_);
     pLastTransform_ = this->transform()->value();
+    bLastGreyResult_ = greyResult_->value();
+    bDescribed_ = spShaderAdapter_->isValid();
+    spDataAdapter->setGreyResult(bLastGreyResult_);
     std::string sText = spDataAdapter->buildGLObjects();
     spDataAdapter_ = spDataAdapter;
     return sText;
 }
 
-void VantleFilterGPU::followTransform() {
+bool VantleFilterGPU::isUpToDate() const {
     void* const pTransform = transform()->value();
-    if (spDataAdapter_ && pTransform == pLastTransform_) {
+    if (!spDataAdapter_ || pTransform != pLastTransform_ || greyResult_->value() != bLastGreyResult_) {
+        return false;
+    }
+    if (bDescribed_) {
+        return spShaderAdapter_->isValid();
+    }
+    // The engine had no shader. Interfaces go and come under a running system, and without a reference on it
+    // the same address may be another engine's transform by now.
+    return !VantleShaderAdapter(static_cast<VantleTransform*>(pTransform), nullptr).isValid();
+}
+
+void VantleFilterGPU::followTransform() {
+    if (isUpToDate()) {
         return;
     }
+    void* const pTransform = transform()->value();
     oProgram_.removeAllShaders();
     try {
         std::string const sText = initVantle(static_cast<VantleTransform*>(pTransform));
@@ -140,7 +162,7 @@ void VantleFilterGPU::internalProcess() {
         OGL::Program& program = *lock.getProgram();
         program.enable();
         apStateStack->push_back(ORVO_NEW ScopedActiveTextureUnitRestore());
-        if (spShaderAdapter_->isValid()) {
+        if (bDescribed_) {
             bindTables(*apStateStack, program);
             setMatrices(program);
         } else {

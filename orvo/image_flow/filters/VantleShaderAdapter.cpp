@@ -5,6 +5,7 @@
 #include "orvo/image_flow/colour/CQuorError.h"
 #include "orvo/image_flow/colour/CVantle.h"
 #include "orvo/image_flow/colour/CVantleShader.h"
+#include "orvo/image_flow/colour/QuorClient.h"
 #include "orvo/image_flow/colour/TrelException.h"
 
 #include <algorithm>
@@ -63,9 +64,10 @@ private:
 
 } // namespace
 
-VantleShaderAdapter::VantleShaderAdapter() = default;
+VantleShaderAdapter::VantleShaderAdapter() : iGeneration_(ImageFlow::QuorClient::generation()) {}
 
-VantleShaderAdapter::VantleShaderAdapter(VantleTransform* transform, _t_Vantle_Options const* options) {
+VantleShaderAdapter::VantleShaderAdapter(VantleTransform* transform, _t_Vantle_Options const* options)
+    : iGeneration_(ImageFlow::QuorClient::generation()) {
     if (transform == nullptr) {
         return;
     }
@@ -89,24 +91,29 @@ VantleShaderAdapter::VantleShaderAdapter(VantleTransform* transform, _t_Vantle_O
 VantleShaderAdapter::~VantleShaderAdapter() { release(); }
 
 void VantleShaderAdapter::release() noexcept {
-    if (vantleShader_ != nullptr) {
-        CVantleShader::release(vantleShader_);
-        vantleShader_ = nullptr;
+    VantleShader* const pShader = std::exchange(vantleShader_, nullptr);
+    VantleTransform* const pTransform = std::exchange(vantleTransform_, nullptr);
+    if (iGeneration_ != ImageFlow::QuorClient::generation()) {
+        return; // The handles of one engine say nothing to another one.
     }
+    CVantleShader::release(pShader);
     try {
-        if (vantleTransform_ != nullptr) {
-            CVantle::UnReferenceTransform(vantleTransform_);
+        if (pTransform != nullptr) {
+            CVantle::UnReferenceTransform(pTransform);
         }
     } catch (...) { // The engine is gone, and the transform with it.
-        vantleTransform_ = nullptr;
+        return;
     }
-    vantleTransform_ = nullptr;
 }
 
-bool VantleShaderAdapter::isValid() { return vantleShader_ != nullptr; }
+bool VantleShaderAdapter::isBound() const noexcept {
+    return vantleShader_ != nullptr && iGeneration_ == ImageFlow::QuorClient::generation();
+}
+
+bool VantleShaderAdapter::isValid() { return isBound(); }
 
 void VantleShaderAdapter::getShaderInfo(std::string& entryPoint, std::string& code) {
-    ORVO_CHECK(vantleShader_ != nullptr, "vantleShader_ != NULL");
+    ORVO_CHECK(isBound(), "vantleShader_ != NULL");
     EngineString entryPointString;
     EngineString codeString;
     checkQuorResult(CVantleShader::Strings(vantleShader_, entryPointString.out(), codeString.out()));
@@ -117,7 +124,7 @@ void VantleShaderAdapter::getShaderInfo(std::string& entryPoint, std::string& co
 }
 
 _t_Vantle_ShaderParameterData VantleShaderAdapter::getParameter(unsigned index, std::string& name) {
-    ORVO_CHECK(vantleShader_ != nullptr, "vantleShader_ != NULL");
+    ORVO_CHECK(isBound(), "vantleShader_ != NULL");
     _t_Vantle_ShaderParameterData parameter{};
     checkQuorResult(CVantleShader::Parameter(vantleShader_, index, &parameter));
     EngineString const nameString(parameter.name);
@@ -127,7 +134,7 @@ _t_Vantle_ShaderParameterData VantleShaderAdapter::getParameter(unsigned index, 
 }
 
 void VantleShaderAdapter::copyMatrixData(float* target, unsigned index, unsigned& size) {
-    ORVO_CHECK(vantleShader_ != nullptr, "vantleShader_ != NULL");
+    ORVO_CHECK(isBound(), "vantleShader_ != NULL");
     std::uint32_t nBytes = 0;
     checkQuorResult(CVantleShader::CopyData(vantleShader_, index, nullptr, &nBytes));
     if (nBytes <= nMaximumMatrixBytes) {
@@ -137,7 +144,7 @@ void VantleShaderAdapter::copyMatrixData(float* target, unsigned index, unsigned
 }
 
 unsigned VantleShaderAdapter::numParameters() {
-    ORVO_CHECK(vantleShader_ != nullptr, "vantleShader_ != NULL");
+    ORVO_CHECK(isBound(), "vantleShader_ != NULL");
     std::uint32_t nCount = 0;
     checkQuorResult(CVantleShader::NumParameters(vantleShader_, &nCount));
     return nCount;

@@ -4,19 +4,23 @@
 #include "orvo/colour_engine/VantleShaderParameterData.h"
 #include "orvo/core/Export.h"
 
+#include <cstdint>
 #include <string>
 
 namespace ORVO {
 
 /// The colour engine's description of a transform as a shader: the text of an entry function, and the tables
-/// and matrices that it reads. Holds one reference on the transform and one on the engine's shader object.
+/// and matrices that it reads. Holds one reference on the transform and one on the engine's shader object,
+/// both of them the engine's that was bound when the adapter was made.
 ///
 ///     VantleShaderAdapter adapter(pTransform, nullptr);
 ///     if (adapter.isValid())
 ///         adapter.getShaderInfo(sEntryPoint, sCode);
 ///
 /// On an adapter that is not valid every operation but isValid() throws InternalException "vantleShader_ !=
-/// NULL". What the engine refuses is thrown as Quor_T_MT::CQuorError, its absence as TrelException.
+/// NULL". What the engine refuses is thrown as Quor_T_MT::CQuorError, its absence as TrelException. An
+/// adapter that outlives the binding is not valid from the next start of a binding on: what it holds is never
+/// handed to another engine.
 ///
 /// Threads: one at a time.
 class ORVO_API VantleShaderAdapter {
@@ -29,10 +33,11 @@ public:
     VantleShaderAdapter(VantleTransform* transform, _t_Vantle_Options const* options);
     VantleShaderAdapter(VantleShaderAdapter const&) = delete;
     VantleShaderAdapter& operator=(VantleShaderAdapter const&) = delete;
-    /// Drops both references. Nothing leaves it, also where the engine is gone.
+    /// Drops both references, or lets them go where the engine that they came from is no longer bound.
+    /// Nothing leaves it.
     virtual ~VantleShaderAdapter();
 
-    /// Whether the engine delivered a shader.
+    /// Whether the engine delivered a shader and no other binding was started since.
     virtual bool isValid();
     /// The name of the entry function and the text that holds it. Both stay as they were if it throws.
     virtual void getShaderInfo(std::string& entryPoint, std::string& code);
@@ -49,8 +54,10 @@ public:
     virtual unsigned numParameters();
 
 private:
+    bool isBound() const noexcept;
     void release() noexcept;
 
+    std::uint32_t iGeneration_; ///< of the binding that both handles belong to
     VantleTransform* vantleTransform_ = nullptr;
     VantleShader* vantleShader_ = nullptr;
 };

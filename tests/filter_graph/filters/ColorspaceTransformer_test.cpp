@@ -102,6 +102,42 @@ TEST_F(ColorspaceTransformerTest, CloneCarriesValuesAndNoConnections) {
     DisconnectAll(spFilter.get());
 }
 
+TEST_F(ColorspaceTransformerTest, ACloneSharesTheNodesThatItsOriginalHas) {
+    ColorspaceTransformer filter;
+    setCodes(filter, PROFILE_SRGB, PROFILE_DISPLAY_P3);
+    auto const spForwarder = unfold(filter, cpuOptions());
+    std::shared_ptr<Internal::Filter> const spClone = filter.clone();
+    // What the clone forwards reaches the original's node.
+    ColorspaceTransformer::Forwarder forwarder(dynamic_cast<ColorspaceTransformer&>(*spClone));
+    EXPECT_EQ(nullptr, transformOfNode());
+    forwarder.forwardStuff();
+    void* const pTransform = transformOfNode();
+    EXPECT_NE(nullptr, pTransform);
+    spForwarder->forwardStuff();
+    EXPECT_EQ(pTransform, transformOfNode());
+    // For OpenGL alike; the codes are the clone's own.
+    ColorspaceTransformer other;
+    DisconnectAll(spProducer_.get());
+    auto const spOtherForwarder = unfold(other, OptimizationOptions());
+    std::shared_ptr<Internal::Filter> const spOtherClone = other.clone();
+    setCodes(*spOtherClone, PROFILE_SRGB, PROFILE_DISPLAY_P3);
+    ColorspaceTransformer::Forwarder(dynamic_cast<ColorspaceTransformer&>(*spOtherClone)).forwardStuff();
+    EXPECT_EQ(pTransform, transformOfNode());
+}
+
+TEST_F(ColorspaceTransformerTest, AForwarderOfAFoldedTransformerAsksTheEngineForNothing) {
+    ColorspaceTransformer filter;
+    auto const before = engineStatistics();
+    ColorspaceTransformer::Forwarder forwarder(filter);
+    for (std::uint32_t const source : {PROFILE_SRGB, kUnknown}) {
+        setCodes(filter, source, PROFILE_WIDE_GAMUT);
+        ORVO_EXPECT_INTERNAL(forwarder.forwardStuff(), "Enforce vantleNode_g != NULL");
+    }
+    EXPECT_EQ(0U, RecordingEngine::calls("ProfileFromCode"));
+    EXPECT_EQ(before.nTransforms, engineStatistics().nTransforms);
+    EXPECT_EQ(before.nReferences, engineStatistics().nReferences);
+}
+
 TEST_F(ColorspaceTransformerTest, UnfoldsIntoTheNodeOfTheTarget) {
     for (auto const& [options, target] :
          {std::pair(OptimizationOptions(), ORVO_TARGET_GL), {cpuOptions(), ORVO_TARGET_CPU}}) {
@@ -136,7 +172,7 @@ TEST_F(ColorspaceTransformerTest, RefusesToUnfoldWithoutAProducer) {
 
 TEST_F(ColorspaceTransformerTest, ForwarderMakesATransformOnEachFrame) {
     ColorspaceTransformer filter;
-    setCodes(filter, PROFILE_SRGB, PROFILE_WIDE_GAMUT);
+    setCodes(filter, PROFILE_GRAY, PROFILE_LINEAR_SRGB); // which no other test asks for
     auto const spForwarder = unfold(filter, cpuOptions());
     EXPECT_EQ(nullptr, transformOfNode());
     auto const before = engineStatistics();
@@ -207,27 +243,6 @@ TEST_F(ColorspaceTransformerTest, ForwarderNamesTheSourceBeforeTheDestination) {
         EXPECT_EQ(before.nTransforms, engineStatistics().nTransforms);
     }
 }
-
-/// source -> transformers -> sink, on the CPU.
-template <typename T>
-struct CPUColourGraph {
-    CPUColourGraph(int width, int height, std::vector<FilterPtr> const& aFilters)
-        : aFilters_(aFilters), oInput_(width, height), oOutput_(width, height) {
-        spSource_->setImage(oInput_.handle());
-        spSink_->setImage(oOutput_.handle());
-        Connect(spSource_, aFilters_.front());
-        for (std::size_t i = 1; i < aFilters_.size(); ++i)
-            Connect(aFilters_[i - 1], aFilters_[i]);
-        Connect(aFilters_.back(), spSink_);
-    }
-
-    std::vector<FilterPtr> aFilters_;
-    PackedImage<T> oInput_;
-    PackedImage<T> oOutput_;
-    SourcePtr spSource_ = createInputAdapter(IAdapter::REGION_SYNC_FROM_IMAGE);
-    SinkPtr spSink_ = createOutputAdapter(IAdapter::REGION_SYNC_FROM_IMAGE);
-    std::shared_ptr<IProcessor> spProcessor_ = createProcessor(spSink_, nullptr);
-};
 
 template <typename T>
 void expectTheEnginesResult() {

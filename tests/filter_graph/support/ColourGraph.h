@@ -1,4 +1,4 @@
-/// A graph of one source, colour transformers and a sink, on images of R, G, B and A.
+/// A graph of one source, colour transformers and a sink, on images of R, G, B and A, or of other channels.
 #pragma once
 
 #include <cstdint>
@@ -34,13 +34,13 @@ inline FilterPtr makeTransformer(std::uint32_t source, std::uint32_t destination
     return spFilter;
 }
 
-/// A client image of four channels in host memory, without padding: bytes, or words from 0 to 32768.
+/// A client image in host memory, without padding: bytes, or words from 0 to 32768.
 template <typename T>
 class PackedImage {
 public:
-    PackedImage(int width, int height)
-        : aPixels_(4 * static_cast<std::size_t>(width) * static_cast<std::size_t>(height)),
-          oHandle_(FilterGraph::ImageDescriptorCPU({4, kType}, PixelExtentInWorldSpace()),
+    PackedImage(int width, int height, std::size_t nChannels = 4)
+        : aPixels_(nChannels * static_cast<std::size_t>(width) * static_cast<std::size_t>(height)),
+          oHandle_(FilterGraph::ImageDescriptorCPU({nChannels, kType}, PixelExtentInWorldSpace()),
                    PositionExtentInPixelSpace(PositionInPixelSpace(0, 0), ExtentInPixelSpace(width, height)),
                    reinterpret_cast<unsigned char const*>(aPixels_.data()), 0) {}
     PackedImage(PackedImage const&) = delete;
@@ -94,6 +94,28 @@ std::vector<T> transformed(std::vector<T> const& aPixels, std::uint32_t source, 
     CVantle::UnReferenceProfile(pDestination);
     return aResult;
 }
+
+/// source -> transformers -> sink, on the CPU.
+template <typename T>
+struct CPUColourGraph {
+    CPUColourGraph(int width, int height, std::vector<FilterPtr> const& aFilters, std::size_t nInput = 4,
+                   std::size_t nOutput = 4)
+        : aFilters_(aFilters), oInput_(width, height, nInput), oOutput_(width, height, nOutput) {
+        spSource_->setImage(oInput_.handle());
+        spSink_->setImage(oOutput_.handle());
+        FilterGraph::Connect(spSource_, aFilters_.front());
+        for (std::size_t i = 1; i < aFilters_.size(); ++i)
+            FilterGraph::Connect(aFilters_[i - 1], aFilters_[i]);
+        FilterGraph::Connect(aFilters_.back(), spSink_);
+    }
+
+    std::vector<FilterPtr> aFilters_;
+    PackedImage<T> oInput_;
+    PackedImage<T> oOutput_;
+    SourcePtr spSource_ = FilterGraph::createInputAdapter(IAdapter::REGION_SYNC_FROM_IMAGE);
+    SinkPtr spSink_ = FilterGraph::createOutputAdapter(IAdapter::REGION_SYNC_FROM_IMAGE);
+    std::shared_ptr<FilterGraph::IProcessor> spProcessor_ = FilterGraph::createProcessor(spSink_, nullptr);
+};
 
 /// The largest difference between values at the same place.
 template <typename T>

@@ -1,5 +1,7 @@
 #include "orvo/image_flow/colour/QuorClient.h"
 
+#include "orvo/image_flow/colour/CVantle.h"
+#include "orvo/image_flow/colour/CVantleShader.h"
 #include "orvo/image_flow/colour/LazyClient.h"
 #include "orvo/image_flow/colour/QuorInterfaces.h"
 #include "orvo/image_flow/colour/ScopedQuorInitializer.h"
@@ -76,6 +78,70 @@ TEST_F(QuorClientTest, FetchesTheCoreProceduresAndThenTheBaseInterfacesInOrder) 
     EXPECT_EQ(7u, quorMemoryInterface().loadCount());
 }
 
+/// An entry of an interface: where it stands and how it is asked for.
+struct Slot {
+    std::size_t number_;
+    char const* pSelector_;
+    char const* pProcName_;
+};
+
+/// The table holds the engine's procedures at these slots, and nothing at any other.
+void expectSlots(QuorTable const& table, std::size_t nSlots, std::vector<Slot> const& aSlots) {
+    std::vector<void*> aExpected(nSlots, nullptr);
+    for (Slot const& slot : aSlots) {
+        aExpected.at(slot.number_) =
+            FakeEngine::address(table.interfaceName(), slot.pSelector_, slot.pProcName_);
+        EXPECT_NE(nullptr, aExpected.at(slot.number_)) << slot.pSelector_;
+    }
+    for (std::size_t i = 0; i < nSlots; ++i) {
+        EXPECT_EQ(aExpected[i], table.procedure(i)) << table.interfaceName() << " " << i;
+    }
+}
+
+TEST_F(QuorClientTest, ProceduresStandAtTheSlotsOfTheirInterfaces) {
+    EXPECT_EQ(1, QuorClient::start(&FakeEngine::address));
+    expectSlots(quorContainerInterface(), 16,
+                {{3, "AddRef", "QuorAddRefProc"},
+                 {4, "Release", "QuorReleaseProc"},
+                 {9, "GetMethod", "QuorGetMethodV3Proc"}});
+    expectSlots(quorErrorInterface(), 8,
+                {{0, "NewError", "QuorNewErrorProc"},
+                 {2, "AddRef", "QuorErrorAddRefProc"},
+                 {3, "Release", "QuorErrorReleaseProc"},
+                 {4, "GetErrorMessage", "QuorGetErrorMessageProc"},
+                 {5, "GetComponent", "QuorGetComponentProc"}});
+    expectSlots(quorStringInterface(), 4,
+                {{0, "NewStringAtom", "QuorNewStringAtomProc"},
+                 {1, "DeleteStringAtom", "QuorDeleteStringAtomProc"},
+                 {2, "GetCString", "QuorGetCStringProc"},
+                 {3, "AddRef", "QuorStringAtomAddRefProc"}});
+    expectSlots(quorMemoryInterface(), 4,
+                {{0, "Alloc", "QuorAllocProc"},
+                 {1, "Realloc", "QuorReallocProc"},
+                 {2, "Free", "QuorFreeProc"},
+                 {3, "GetBlockSize", "QuorGetBlockSizeProc"}});
+    ASSERT_TRUE(CVantle::isAvailable());
+    expectSlots(CVantle::table(), 150,
+                {{18, "ProfileFromCode", "Vantle_ProfileFromCodeProc2"},
+                 {32, "UnReferenceProfile", "Vantle_UnReferenceProfileProc2"},
+                 {50, "UnReferenceString", "Vantle_UnReferenceStringProc2"},
+                 {51, "StringASCII", "Vantle_StringASCIIProc2"},
+                 {53, "MakeColorTransform", "Vantle_MakeColorTransformProc2"},
+                 {55, "ReferenceTransform", "Vantle_ReferenceTransformProc2"},
+                 {56, "UnReferenceTransform", "Vantle_UnReferenceTransformProc2"},
+                 {62, "ApplyGeneral", "Vantle_ApplyGeneralProc2"},
+                 {67, "OptimizeTransform", "Vantle_OptimizeTransformProc2"}});
+    std::uint32_t nFamily = 0;
+    EXPECT_EQ(0u, CVantleShader::Family(nullptr, &nFamily)); // the table is loaded on first use
+    expectSlots(CVantleShader::table(), 6,
+                {{0, "NewShader", "VantleNewShaderProc"},
+                 {1, "Family", "VantleFamilyProc"},
+                 {2, "Strings", "VantleStringsProc"},
+                 {3, "NumParameters", "VantleNumParametersProc"},
+                 {4, "Parameter", "VantleParameterProc"},
+                 {5, "CopyData", "VantleCopyDataProc"}});
+}
+
 TEST_F(QuorClientTest, ASecondStartKeepsWhatIsBound) {
     EXPECT_EQ(1, QuorClient::start(&FakeEngine::address));
     FakeEngine::asked().clear();
@@ -118,6 +184,8 @@ TEST_F(QuorClientTest, InitialisesClientsInOrderAndFinishesInTheOpposite) {
     Quor_T_MT::LazyClient const first([] {
         aEvents.emplace_back("first");
         EXPECT_TRUE(QuorClient::isStrict());
+        EXPECT_TRUE(QuorClient::isLive());
+        EXPECT_TRUE(CVantle::isAvailable()) << "an initialiser may call the engine";
         oFirst.add();
         oFirst.add();
     });

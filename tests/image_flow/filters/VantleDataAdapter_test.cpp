@@ -130,6 +130,18 @@ TEST_F(VantleDataAdapterTest, WritesTheProgramAroundTheEnginesText) {
               adapter.buildGLObjects());
 }
 
+TEST_F(VantleDataAdapterTest, HandsGreenOnInAllChannelsWhereTheResultIsGrey) {
+    StatedShader shader;
+    VantleDataAdapter adapter(&shader);
+    std::string const sColour = adapter.buildGLObjects();
+    adapter.setGreyResult(true);
+    std::string sExpected = sColour;
+    sExpected.insert(sExpected.find("   (gl_FragData[0])"), "   inputColor.rgb = inputColor.ggg;\n");
+    EXPECT_EQ(sExpected, adapter.buildGLObjects());
+    adapter.setGreyResult(false);
+    EXPECT_EQ(sColour, adapter.buildGLObjects());
+}
+
 TEST_F(VantleDataAdapterTest, WritesARedDiagonalWithoutAShader) {
     VantleShaderAdapter shader;
     VantleDataAdapter adapter(&shader);
@@ -224,6 +236,31 @@ TEST_F(VantleDataAdapterTest, SetsFiltersAndWrapModes) {
             EXPECT_EQ(expected, value) << row.target_ << " " << token;
         }
         glBindTexture(row.target_, 0);
+    }
+}
+
+TEST_F(VantleDataAdapterTest, ReadsTheWrapModesOfItsDimensionsAlone) {
+    StatedShader shader;
+    shader.aTables_ = {table1D(), table2D()};
+    shader.aTables_[0].record_.wrapT = 0; // no wrap mode of OpenGL's
+    for (ShaderTable& stated : shader.aTables_)
+        stated.record_.wrapR = 0;
+    VantleDataAdapter adapter(&shader);
+    adapter.populateGLObjects(2);
+    EXPECT_EQ(1U, adapter.textures1D().size());
+    EXPECT_EQ(1U, adapter.textures2D().size());
+    // Those that a table has are looked at.
+    std::pair<ShaderTable, std::vector<std::uint32_t Record::*>> const aRows[] = {
+        {table1D(), {&Record::wrapS}},
+        {table2D(), {&Record::wrapS, &Record::wrapT}},
+        {table3D(), {&Record::wrapS, &Record::wrapT, &Record::wrapR}}};
+    for (auto const& [stated, aWraps] : aRows) {
+        for (auto const wrap : aWraps) {
+            shader.aTables_ = {stated};
+            shader.aTables_[0].record_.*wrap = 0;
+            VantleDataAdapter refusing(&shader);
+            EXPECT_THROW(refusing.populateGLObjects(2), OGL::ExceptionOGL);
+        }
     }
 }
 

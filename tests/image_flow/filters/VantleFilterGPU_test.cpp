@@ -3,6 +3,7 @@
 #include "tests/image_flow/support/ShaderRoad.h"
 
 #include "orvo/image_flow/colour/CQuorError.h"
+#include "orvo/image_flow/colour/QuorClient.h"
 #include "orvo/image_flow/filters/VantleDataAdapter.h"
 #include "orvo/image_flow/filters/VantleShaderAdapter.h"
 #include "orvo/image_runtime/TexturePool.h"
@@ -20,6 +21,7 @@ public:
     using BasicGLShaderFilter::bCompiled_;
     using BasicGLShaderFilter::sFragmentSource_;
     using BasicGLShaderFilter::texUnitCount_;
+    using VantleFilterGPU::initVantle;
     using VantleFilterGPU::pLastTransform_;
     using VantleFilterGPU::spDataAdapter_;
     using VantleFilterGPU::spShaderAdapter_;
@@ -85,8 +87,8 @@ ShaderText everyKind() {
         makeTable("three", Record::KIND_TEXTURE_3D, GL_TEXTURE_3D, 1, 2, {0.5F, 0.625F, 0.375F, 0.0F}),
         // By columns: (x, y, z) becomes (y, z, x).
         makeMatrix("small", Record::KIND_MATRIX_3X3, {0, 0, 1, 1, 0, 0, 0, 1, 0}),
-        // Half of the colour, and alpha as it is.
-        makeMatrix("large", Record::KIND_MATRIX_4X4, {.5F, 0, 0, 0, 0, .5F, 0, 0, 0, 0, .5F, 0, 0, 0, 0, 1}),
+        // By columns, too: (x, y, z, a) becomes (y / 2, z / 2, x / 2, a).
+        makeMatrix("large", Record::KIND_MATRIX_4X4, {0, 0, .5F, 0, .5F, 0, 0, 0, 0, .5F, 0, 0, 0, 0, 0, 1}),
     };
     return text;
 }
@@ -96,7 +98,7 @@ Pixel mixedAll(Pixel const& c) {
     double const one = upper(0) ? 0.25 : 0.125;
     double const two = upper(1) ? (upper(0) ? 1.0 : 0.25) : (upper(0) ? 0.75 : 0.5);
     double const three = upper(2) ? (upper(0) ? 0.0 : 0.375) : (upper(0) ? 0.625 : 0.5);
-    return {two / 2, three / 2, one / 2, c[3]};
+    return {three / 2, one / 2, two / 2, c[3]};
 }
 
 class VantleFilterGPUTest : public ShaderFlowTest {
@@ -141,6 +143,8 @@ TEST_F(VantleFilterGPUTest, HasItsInputAndParameters) {
     EXPECT_EQ(filter.parameter("Vantle Options"), filter.options().get());
     EXPECT_EQ(nullptr, filter.transform()->value());
     EXPECT_EQ(nullptr, filter.options()->value());
+    EXPECT_EQ(filter.parameter("Grey Result"), filter.greyResult().get());
+    EXPECT_FALSE(filter.greyResult()->value());
     EXPECT_TRUE(filter.willRunInHardware());
     EXPECT_EQ("", filter.sFragmentSource_);
     filter.vantleTransform_.reset();
@@ -296,14 +300,71 @@ TEST_F(VantleFilterGPUTest, TriesAgainAfterWhatTheEngineRefused) {
         expectMixed(road, input);
         EXPECT_EQ(0, RecordingEngine::strings());
     }
-    // An engine that has no shader at all is answered with the diagonal.
-    RecordingEngine::fail("NewShader");
+}
+
+TEST_F(VantleFilterGPUTest, ShowsTheDiagonalUntilTheEngineHasAShader) {
+    Texels const input = picture();
+    ImageGPUPtr const upInput = textureOf(input, ImageGPU::PIXEL_FORMAT_RGBA8);
+    for (char const* pSelector : {"NewShader", "ReferenceTransform"}) {
+        OpenVantleFilter filter;
+        setTransform(filter, RecordingEngine::ownTransform());
+        ShaderRoad road(frameContext(), filter);
+        road.setInput(0, *upInput);
+        RecordingEngine::fail(pSelector);
+        auto nLinks = GLHooks::calls("glLinkProgram");
+        for (int i = 0; i < 3; ++i) {
+            EXPECT_EQ((Pixel{1, 0, 0, 1}), Texels(*road.run(world(0, 0, 9, 5))).at(0, 0)) << pSelector;
+            EXPECT_EQ(0, RecordingEngine::transforms()) << pSelector;
+        }
+        EXPECT_EQ(nLinks + 1, GLHooks::calls("glLinkProgram")) << "asking again links nothing";
+        RecordingEngine::failNothing();
+        expectMixed(road, input);
+        auto const nShaderCalls = RecordingEngine::shaderCalls();
+        expectMixed(road, input);
+        EXPECT_EQ(nShaderCalls, RecordingEngine::shaderCalls()) << "a shader is not asked for again";
+    }
+}
+
+TEST_F(VantleFilterGPUTest, AsksTheEngineOfANewBinding) {
+    Texels const input = picture();
+    ImageGPUPtr const upInput = textureOf(input, ImageGPU::PIXEL_FORMAT_RGBA8);
     OpenVantleFilter filter;
     setTransform(filter, RecordingEngine::ownTransform());
     ShaderRoad road(frameContext(), filter);
     road.setInput(0, *upInput);
-    EXPECT_EQ((Pixel{1, 0, 0, 1}), Texels(*road.run(world(0, 0, 9, 5))).at(0, 0));
-    RecordingEngine::failNothing();
+    expectMixed(road, input);
+    // Another engine, whose transform stands at the same address and does something else.
+    ImageFlow::QuorClient::stop();
+    RecordingEngine::loseAll();
+    ASSERT_EQ(1, ImageFlow::QuorClient::start(GetQuorGetAddressProc()));
+    RecordingEngine::shader() = {"turn", "void turn(inout vec4 c) { c = c.gbra; }\n", {}};
+    Texels const turned = Texels(input.region()).fill([&](int x, int y) {
+        Pixel const c = input.at(x, y);
+        return Pixel{c[1], c[2], c[0], c[3]};
+    });
+    EXPECT_EQ("", differences(Texels(*road.run(world(0, 0, 9, 5))), turned,
+                              Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
+    EXPECT_EQ(1, RecordingEngine::transforms());
+    EXPECT_EQ(1, RecordingEngine::shaders());
+}
+
+TEST_F(VantleFilterGPUTest, HandsGreenOnWhereTheResultIsGrey) {
+    Texels const input = picture();
+    ImageGPUPtr const upInput = textureOf(input, ImageGPU::PIXEL_FORMAT_RGBA8);
+    Texels const grey = Texels(input.region()).fill([&](int x, int y) {
+        Pixel const c = mixedAll(input.at(x, y));
+        return Pixel{c[1], c[1], c[1], c[3]};
+    });
+    OpenVantleFilter filter;
+    setTransform(filter, RecordingEngine::ownTransform());
+    ShaderRoad road(frameContext(), filter);
+    road.setInput(0, *upInput);
+    expectMixed(road, input);
+    filter.greyResult()->setValue(true);
+    EXPECT_EQ("", differences(Texels(*road.run(world(0, 0, 9, 5))), grey,
+                              Precision::of(ImageGPU::PIXEL_FORMAT_RGBA8)));
+    filter.greyResult()->setValue(false);
+    expectMixed(road, input);
 }
 
 TEST_F(VantleFilterGPUTest, TriesAgainAfterATextThatDoesNotCompile) {
@@ -389,6 +450,32 @@ TEST_F(VantleFilterGPUTest, SaysWhetherATransformRunsHere) {
     RecordingEngine::fail("NewShader");
     EXPECT_FALSE(VantleFilterGPU::isCompatible(RecordingEngine::ownTransform()));
     RecordingEngine::failNothing();
+    for (char const* pSelector : {"NumParameters", "Parameter", "StringASCII"}) {
+        RecordingEngine::fail(pSelector);
+        EXPECT_THROW(VantleFilterGPU::isCompatible(RecordingEngine::ownTransform()), Quor_T_MT::CQuorError)
+            << pSelector;
+        RecordingEngine::failNothing();
+        EXPECT_EQ(0, RecordingEngine::transforms()) << pSelector;
+    }
+}
+
+TEST_F(VantleFilterGPUTest, SaysThatItRunsInHardwareOnceCompiled) {
+    Texels const input = picture();
+    ImageGPUPtr const upInput = textureOf(input, ImageGPU::PIXEL_FORMAT_RGBA8);
+    OpenVantleFilter filter;
+    ShaderRoad road(frameContext(), filter);
+    road.setInput(0, *upInput);
+    frameContext().makeCurrent();
+    EXPECT_NE("", filter.initVantle(RecordingEngine::ownTransform()));
+    EXPECT_TRUE(filter.willRunInHardware());
+    OGL::ExtensionManager::Instance()->overrideSupport(OGL::EXTENSION_SGIS_TEXTURE_EDGE_CLAMP, false);
+    EXPECT_NE("", filter.initVantle(RecordingEngine::ownTransform()));
+    EXPECT_FALSE(filter.willRunInHardware());
+    host().makeCurrent();
+    // A frame runs what the driver compiles, whatever it says of itself.
+    setTransform(filter, RecordingEngine::ownTransform());
+    expectMixed(road, input);
+    EXPECT_TRUE(filter.willRunInHardware());
 }
 
 TEST_F(VantleFilterGPUTest, SurvivesEveryFailingCall) {

@@ -2,11 +2,14 @@
 
 #include <gtest/gtest.h>
 
+#include <memory>
 #include <numeric>
 #include <vector>
 
 #include "orvo/image_flow/colour/CQuorError.h"
+#include "orvo/image_flow/colour/QuorClient.h"
 #include "orvo/image_flow/colour/TrelException.h"
+#include "tests/image_flow/colour/FakeEngine.h"
 #include "tests/support/Expect.h"
 #include "tests/support/ImageFlowLayers.h"
 #include "tests/support/RecordingEngine.h"
@@ -14,6 +17,8 @@
 namespace ORVO {
 namespace {
 
+using ImageFlow::QuorClient;
+using Test::FakeEngine;
 using Test::RecordingEngine;
 using Lines = std::vector<std::string>;
 
@@ -197,6 +202,58 @@ TEST(VantleShaderAdapterWithoutEngineTest, IsNotValid) {
     ImageFlow::AutoInitializer const imageFlow(false);
     VantleShaderAdapter adapter(RecordingEngine::ownTransform(), nullptr);
     EXPECT_FALSE(adapter.isValid());
+}
+
+/// An adapter over an engine that records all calls, without any layer.
+class VantleShaderAdapterBindingTest : public testing::Test {
+protected:
+    VantleShaderAdapterBindingTest() {
+        FakeEngine::reset();
+        EXPECT_EQ(1, QuorClient::start(&FakeEngine::address));
+        apAdapter_ = std::make_unique<VantleShaderAdapter>(FakeEngine::handle<VantleTransform>(5), nullptr);
+        EXPECT_TRUE(apAdapter_->isValid());
+        EXPECT_EQ((Lines{"ReferenceTransform 5", "NewShader 1935763059 5 0"}), FakeEngine::calls());
+        FakeEngine::calls().clear();
+    }
+    ~VantleShaderAdapterBindingTest() override { QuorClient::stop(); }
+
+    std::unique_ptr<VantleShaderAdapter> apAdapter_;
+};
+
+TEST_F(VantleShaderAdapterBindingTest, DropsItsHandlesWhereTheyCameFrom) {
+    apAdapter_.reset();
+    // The engine's shaders are numbered 4000.
+    EXPECT_EQ((Lines{"Release 4000", "UnReferenceTransform 5"}), FakeEngine::calls());
+}
+
+TEST_F(VantleShaderAdapterBindingTest, LetsItsHandlesGoAfterTheEnd) {
+    QuorClient::stop();
+    EXPECT_THROW(apAdapter_->numParameters(), TrelException);
+    apAdapter_.reset();
+    EXPECT_EQ(Lines(), FakeEngine::calls());
+}
+
+TEST_F(VantleShaderAdapterBindingTest, HandsNothingToAnotherEngine) {
+    QuorClient::stop();
+    FakeEngine::reset();
+    ASSERT_EQ(1, QuorClient::start(&FakeEngine::address));
+    EXPECT_FALSE(apAdapter_->isValid());
+    std::string sText;
+    float value = 0.0F;
+    unsigned size = 0;
+    constexpr char const* pMessage = "vantleShader_ != NULL";
+    ORVO_EXPECT_INTERNAL(apAdapter_->getShaderInfo(sText, sText), pMessage);
+    ORVO_EXPECT_INTERNAL(apAdapter_->getParameter(0, sText), pMessage);
+    ORVO_EXPECT_INTERNAL(apAdapter_->copyMatrixData(&value, 0, size), pMessage);
+    ORVO_EXPECT_INTERNAL(apAdapter_->numParameters(), pMessage);
+    apAdapter_.reset();
+    EXPECT_EQ(Lines(), FakeEngine::calls());
+    // The engine that is bound now is asked for what is made now.
+    apAdapter_ = std::make_unique<VantleShaderAdapter>(FakeEngine::handle<VantleTransform>(6), nullptr);
+    apAdapter_.reset();
+    EXPECT_EQ(
+        (Lines{"ReferenceTransform 6", "NewShader 1935763059 6 0", "Release 4000", "UnReferenceTransform 6"}),
+        FakeEngine::calls());
 }
 
 } // namespace
