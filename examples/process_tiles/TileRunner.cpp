@@ -102,7 +102,9 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
     TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter),
                         frame.memoryUse(), memory);
-    ORVO::Core::setImageStorageLimit(plan.frameMemory());
+    // Half as much again as one frame takes: tiles at the edges are smaller than others, and would take the
+    // place of what the next tile needs.
+    ORVO::Core::setImageStorageLimit(plan.frameMemory() / 2 * 3);
 
     std::vector<Row> const rows = rowsOf(plan, frame);
     reader.start(bandsOf(rows), depth);

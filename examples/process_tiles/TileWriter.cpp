@@ -9,8 +9,6 @@ namespace example {
 
 namespace {
 
-constexpr std::size_t jobsThatWait = 2;
-
 bool isExr(std::string const& path) { return extensionOf(path) == ".exr"; }
 
 bool isTiff(std::string const& path) {
@@ -104,7 +102,7 @@ Picture TileWriter::spare() {
 
 void TileWriter::write(Rectangle const& tile, Rectangle const& computed, Picture picture) {
     std::unique_lock lock(mutex_);
-    changed_.wait(lock, [this] { return jobs_.size() < jobsThatWait || failure_; });
+    changed_.wait(lock, [this] { return jobs_.empty() || failure_; });
     if (failure_)
         std::rethrow_exception(failure_);
     jobs_.push_back({tile, computed, std::move(picture)});

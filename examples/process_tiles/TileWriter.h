@@ -43,7 +43,7 @@ public:
 
     /// Hands over a picture of the rectangle `computed`, of which the tile is written: in the file's
     /// channels, or as colour for grey, or with an alpha that the file has not. The tile begins on the edges
-    /// of file tiles, and ends there or at the edge of the picture. Waits while two are waiting. Throws
+    /// of file tiles, and ends there or at the edge of the picture. Waits while one is waiting. Throws
     /// PictureError if an earlier one could not be written.
     void write(Rectangle const& tile, Rectangle const& computed, Picture picture);
 
