@@ -28,6 +28,8 @@ OIIO::ImageSpec specOf(std::string const& path, TileFileFormat const& format) {
         // Without this, tiles wait in memory for those that come before them in the file.
         spec["openexr:lineOrder"] = "randomY";
     } else {
+        // One thread writes: at the level that is usual it takes five times as long, for files 3 % smaller.
+        spec["tiff:zipquality"] = 4;
         if (alpha)
             spec["oiio:UnassociatedAlpha"] = 1;
         if (spec.image_bytes(true) > 0xf0000000U)
