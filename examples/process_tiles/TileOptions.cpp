@@ -1,5 +1,9 @@
 #include "process_tiles/TileOptions.h"
 
+#include <limits>
+#include <string>
+#include <vector>
+
 namespace example {
 
 char const tileUsageText[] = R"(Usage: process_tiles --filter NAME [options] INPUT OUTPUT
@@ -20,48 +24,28 @@ A progress bar is shown on a terminal. Ctrl-C ends the work; then, and after a f
 
 namespace {
 
-void applyOption(TileOptions& options, std::string const& option, std::string const& value) {
-    if (option == "--filter")
-        options.filter = value;
-    else if (option == "--set")
-        options.values.push_back(assignment(value));
-    else if (option == "--target")
-        options.target = targetNamed(value);
-    else if (option == "--tile")
-        options.tile = positive<int>(option, value);
-    else if (option == "--memory-limit")
-        options.memoryLimit = positive<std::size_t>(option, value);
-    else if (option == "--threads")
-        options.threads = positive<std::size_t>(option, value);
-    else
-        throw UsageError("Unknown option " + option);
+// A number of MiB that is a number of bytes, too.
+std::size_t memoryLimitOf(std::string const& text) {
+    std::string const option = "--memory-limit";
+    auto const mebibytes = positive<std::size_t>(option, text);
+    if (mebibytes > std::numeric_limits<std::size_t>::max() >> 20U)
+        throw UsageError(option + " is too large: " + text);
+    return mebibytes;
 }
 
 } // namespace
 
 TileOptions parseTileOptions(int argc, char const* const* argv) {
     TileOptions options;
-    std::vector<std::string> files;
-    for (int i = 1; i < argc; ++i) {
-        std::string const argument = argv[i];
-        if (argument == "--help") {
-            options.help = true;
-        } else if (argument.rfind("--", 0) == 0) {
-            if (i + 1 == argc)
-                throw UsageError(argument + " needs a value");
-            applyOption(options, argument, argv[++i]);
-        } else {
-            files.push_back(argument);
-        }
-    }
-    if (options.help)
-        return options;
-    if (options.filter.empty())
-        throw UsageError("--filter is missing (apply_filter --list shows the filters)");
-    if (files.size() != 2)
-        throw UsageError("An input and an output file are needed");
-    options.input = files[0];
-    options.output = files[1];
+    CommandLine commandLine;
+    addFilterOptions(commandLine, options);
+    commandLine.addNumber("--tile", options.tile);
+    commandLine.addOption("--memory-limit", [&options](std::string const& value) {
+        options.memoryLimit = memoryLimitOf(value);
+    });
+    std::vector<std::string> const files = commandLine.read(argc, argv);
+    if (!options.help)
+        takeFiles(options, files, "apply_filter --list");
     return options;
 }
 

@@ -1,9 +1,8 @@
 #include "process_tiles/TileRunner.h"
 
-#include "apply_filter/FilterList.h"
-#include "apply_filter/FilterValues.h"
 #include "apply_filter/FrameRunner.h"
 #include "apply_filter/Interrupt.h"
+#include "apply_filter/RequestedFilter.h"
 #include "common/Picture.h"
 #include "orvo/core/memory/ImageStorage.h"
 #include "orvo/filter_graph/FilterGraph.h"
@@ -14,7 +13,6 @@
 #include "process_tiles/TileWriter.h"
 
 #include <algorithm>
-#include <cstdio>
 #include <memory>
 #include <utility>
 #include <vector>
@@ -26,18 +24,10 @@ namespace {
 using FilterPtr = std::shared_ptr<ORVO::FilterGraph::IFilter>;
 
 FilterPtr filterOf(TileOptions const& options, ORVO::OGL::Context const* context) {
-    FilterPtr filter = createFilterNamed(options.filter);
-    if (!filter)
-        throw UsageError("There is no filter \"" + options.filter +
-                         "\" (apply_filter --list shows the filters)");
-    for (auto const& [name, value] : options.values) {
-        std::string const warning = setValue(*filter, name, value);
-        if (!warning.empty())
-            std::fprintf(stderr, "process_tiles: warning: %s\n", warning.c_str());
-    }
+    constexpr ProgramName program = {"process_tiles", "apply_filter --list"};
+    FilterPtr filter = requestedFilter(options, program);
     if (!runsOn(context, filter) && !Interrupt::requested())
-        throw UsageError("The filter \"" + options.filter + "\" does not run on " + (context ? "gl" : "cpu") +
-                         " (apply_filter --list shows the targets)");
+        throw doesNotRun(options, program);
     return filter;
 }
 

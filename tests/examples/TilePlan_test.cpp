@@ -143,10 +143,13 @@ TEST(TileOptions, RefusesWithOneLine) {
     EXPECT_EQ(tileRefusal({"in", "out"}), "--filter is missing (apply_filter --list shows the filters)");
     EXPECT_EQ(tileRefusal({"--filter", "F", "in"}), "An input and an output file are needed");
     EXPECT_EQ(tileRefusal({"--filter"}), "--filter needs a value");
-    EXPECT_EQ(tileRefusal({"--wrong", "1"}), "Unknown option --wrong");
+    EXPECT_EQ(tileRefusal({"--wrong", "1"}), "Unknown option --wrong (--help shows the options)");
     EXPECT_EQ(tileRefusal({"--tile", "0"}), "--tile needs a whole number of 1 or more, not \"0\"");
     EXPECT_EQ(tileRefusal({"--memory-limit", "x"}),
               "--memory-limit needs a whole number of 1 or more, not \"x\"");
+    EXPECT_EQ(tileRefusal({"--filter", "F", "--memory-limit", "17592186044415", "in", "out"}), "accepted");
+    EXPECT_EQ(tileRefusal({"--memory-limit", "17592186044416"}),
+              "--memory-limit is too large: 17592186044416");
     EXPECT_EQ(tileRefusal({"--threads", "-1"}), "--threads needs a whole number of 1 or more, not \"-1\"");
     EXPECT_EQ(tileRefusal({"--target", "gpu"}), "--target is cpu or gl, not \"gpu\"");
     EXPECT_EQ(tileRefusal({"--set", "a"}), "--set needs NAME=VALUE, not \"a\"");
