@@ -4,8 +4,8 @@
 
 namespace example {
 
-/// While one lives, Ctrl-C, a polite kill and the end of the terminal are noted instead of ending the program,
-/// but for those that it was started to ignore. One may live inside the life of another.
+/// While one lives, Ctrl-C, a polite kill and the end of the terminal are noted instead of ending the
+/// program, but for those that it was started to ignore. One may live inside the life of another.
 class Interrupt {
 public:
     Interrupt();

@@ -2,11 +2,14 @@
 #include "common/PictureIO.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <cmath>
 #include <cstdint>
 #include <filesystem>
 #include <system_error>
 
+#include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 namespace example {
@@ -43,6 +46,8 @@ std::string firstLine(std::string const& text) { return text.substr(0, text.find
 std::unique_ptr<OIIO::ImageInput> openForReading(std::string const& path) {
     if (!fs::exists(path))
         throw PictureError("Cannot read " + path + ": no such file");
+    if (fs::is_directory(path))
+        throw PictureError("Cannot read " + path + ": it is a folder");
     OIIO::ImageSpec hints;
     hints["oiio:UnassociatedAlpha"] = 1;
     auto input = OIIO::ImageInput::open(path, &hints);
@@ -180,14 +185,26 @@ Picture readPicture(std::string const& path, Depth depth) {
 }
 
 void checkWritable(std::string const& path) {
-    static_cast<void>(outputFor(path));
+    auto const refuse = [&path](std::string const& reason) {
+        throw PictureError("Cannot write " + path + ": " + reason);
+    };
     fs::path const folder = fs::path(path).parent_path();
     if (fs::is_directory(path))
-        throw PictureError("Cannot write " + path + ": it is a folder");
+        refuse("it is a folder");
+    static_cast<void>(outputFor(path));
+    if (fs::exists(path) && !fs::is_regular_file(path))
+        refuse("it is a device");
     if (!folder.empty() && !fs::is_directory(folder))
-        throw PictureError("Cannot write " + path + ": no such folder");
+        refuse("no such folder");
     if (::access(folder.empty() ? "." : folder.c_str(), W_OK) != 0)
-        throw PictureError("Cannot write " + path + ": the folder is not writable");
+        refuse("the folder is not writable");
+    // Some folders that look writable are not: those of the system, those on a medium that is full.
+    std::string const temporary = temporaryBeside(path);
+    int const file = ::open(temporary.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR);
+    if (file < 0)
+        refuse("no file can be made beside it (" + std::generic_category().message(errno) + ")");
+    ::close(file);
+    ::unlink(temporary.c_str());
 }
 
 void writePicture(std::string const& path, Picture const& picture) {

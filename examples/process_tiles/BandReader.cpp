@@ -20,8 +20,14 @@ struct BandReader::File {
     OIIO::ImageSpec spec;
 
     [[nodiscard]] bool isTiled() const { return spec.tile_width > 0; }
-    /// Rows are read in multiples of this, counted from the top.
-    [[nodiscard]] int rowUnit() const { return isTiled() ? spec.tile_height : 1; }
+    /// Rows are read in multiples of this, counted from the top: as they are stored, where that is not much
+    /// at a time. Parts of strips of doubles come as zeros from OpenImageIO.
+    [[nodiscard]] int rowUnit() const {
+        if (isTiled())
+            return spec.tile_height;
+        int const strip = std::clamp(spec.get_int_attribute("tiff:RowsPerStrip", 1), 1, spec.height);
+        return strip <= rowsAtATime || spec.format == OIIO::TypeDesc::DOUBLE ? strip : 1;
+    }
 
     void read(int first, int end, OIIO::TypeDesc const& type, unsigned char* pixels) {
         // As the file has them, and converted here: OpenImageIO converts by way of a buffer that is larger
@@ -85,6 +91,8 @@ Depth BandReader::depth() const { return depthOf(file_->spec.format); }
 std::string BandReader::compression() const {
     return file_->spec.get_string_attribute("compression", "none");
 }
+
+int BandReader::rowUnit() const { return file_->rowUnit(); }
 
 void BandReader::start(std::vector<Rows> bands, Depth depth) {
     bands_ = std::move(bands);

@@ -59,8 +59,10 @@ std::size_t areaOf(Rectangle const& rectangle) {
 }
 
 // The frame is counted twice, for what is kept from one for the next.
-std::size_t bytesNeeded(Rectangle const& window, int width, MemoryUse const& use) {
-    auto const rows = static_cast<std::size_t>(window.extent().height());
+std::size_t bytesNeeded(Rectangle const& window, Rectangle const& picture, MemoryUse const& use) {
+    int const width = picture.extent().width();
+    auto const rows = static_cast<std::size_t>(
+        std::min(window.extent().height() + use.rowUnit - 1, picture.extent().height()));
     return 2 * rows * static_cast<std::size_t>(width) * use.file +
            areaOf(window) * (resultsInFlight * use.result + 2 * use.work);
 }
@@ -140,7 +142,7 @@ TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, 
         int const bottom = longestTile(height, tileHeight) + 3 * reach.marginY + reach.stepY;
         return commonPart(rectangleBetween(0, 0, right, bottom), picture());
     };
-    auto const needed = [&] { return use.fixed + bytesNeeded(window(), width, use); };
+    auto const needed = [&] { return use.fixed + bytesNeeded(window(), picture(), use); };
     auto const shorten = [&](int& side, int least) {
         while (needed() > memory && side > std::max(least, fileTile_))
             side -= fileTile_;

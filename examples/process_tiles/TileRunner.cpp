@@ -90,8 +90,9 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     // Filters compute in 8 bits or in floats.
     Depth const depth = reader.depth() == Depth::uint8 ? Depth::uint8 : Depth::float32;
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
-    TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter),
-                        frame.memoryUse(), memory);
+    MemoryUse use = frame.memoryUse();
+    use.rowUnit = reader.rowUnit();
+    TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter), use, memory);
     // Half as much again as one frame takes: tiles at the edges are smaller than others, and would take the
     // place of what the next tile needs.
     ORVO::Core::setImageStorageLimit(plan.frameMemory() / 2 * 3);

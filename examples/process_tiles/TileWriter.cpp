@@ -2,7 +2,7 @@
 
 #include "common/PictureIO.h"
 
-#include <cstdint>
+#include <filesystem>
 #include <utility>
 
 namespace example {
@@ -64,9 +64,9 @@ struct TileWriter::File {
 };
 
 void checkTilesWritable(std::string const& path) {
-    checkWritable(path);
-    if (!isExr(path) && !isTiff(path))
+    if (!isExr(path) && !isTiff(path) && !std::filesystem::is_directory(path))
         throw PictureError("Cannot write " + path + ": tiles go into TIFF and EXR files");
+    checkWritable(path);
 }
 
 TileWriter::TileWriter(std::string const& path, TileFileFormat const& format)

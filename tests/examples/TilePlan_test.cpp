@@ -107,6 +107,11 @@ TEST(TilePlan, ShortensTilesUntilTheyFitIntoMemory) {
     MemoryUse const costly = {0, 3, 16, 400};
     TilePlan const plan(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), costly, std::size_t(1600) << 20U);
     EXPECT_EQ(plan.tiles().front().extent(), ORVO::ExtentInPixelSpace(1280, 1024));
+    // Read by 256 rows, 255 more have to be held twice: 44 MiB, for which 1600 do not suffice.
+    MemoryUse const byTiles = {0, 3, 16, 400, 256};
+    TilePlan const planByTiles(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), byTiles,
+                               std::size_t(1600) << 20U);
+    EXPECT_EQ(planByTiles.tiles().front().extent(), ORVO::ExtentInPixelSpace(1024, 1024));
     try {
         heightWith(141);
         FAIL() << "141 MiB suffice";

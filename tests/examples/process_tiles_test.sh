@@ -17,6 +17,12 @@ done
 accepted "${bilateral[@]}" --tile 128 "$photograph" "$scratch/out.exr"
 accepted "${bilateral[@]}" --tile 128 "$scratch/out.exr" "$scratch/again.TIFF"
 accepted --filter premultiply --target gl --tile 200 "$photograph" "$scratch/gl.tif"
+cp "$photograph" "$scratch/-c.png"
+(cd "$scratch" && accepted --filter=FastBilateralBlur --tile=128 -- -c.png -c.tif && [ -s ./-c.tif ]) || fail "files with a dash"
+# The input is its own output.
+cp "$scratch/reference.tif" "$scratch/self.tif"
+accepted "${bilateral[@]}" "$scratch/self.tif" "$scratch/self.tif"
+cmp -s "$scratch/reference.tif" "$scratch/self.tif" && fail "the file is as it was"
 accepted --help
 grep -q '^Usage: process_tiles' "$scratch/stdout" || fail "no usage in --help"
 
@@ -30,7 +36,12 @@ refused 1 'no such file' "${bilateral[@]}" "$scratch/none.png" "$output"
 refused 1 'Cannot read' "${bilateral[@]}" "$0" "$output"
 refused 1 'no such folder' "${bilateral[@]}" "$photograph" "$scratch/none/out.tif"
 refused 1 'tiles go into TIFF and EXR files' "${bilateral[@]}" "$photograph" "$scratch/out.png"
-refused 1 'Cannot write' "${bilateral[@]}" "$photograph" "$scratch/out.nonsense"
+refused 1 'tiles go into TIFF and EXR files' "${bilateral[@]}" "$photograph" "$scratch/out"
+refused 1 'it is a folder' "${bilateral[@]}" "$photograph" "$scratch"
+refused 1 'it is a folder' "${bilateral[@]}" "$scratch" "$output"
+refused 1 "Cannot write /proc/out.tif: " "${bilateral[@]}" "$photograph" /proc/out.tif
+mkfifo "$scratch/pipe.tif"
+refused 1 'it is a device' "${bilateral[@]}" "$photograph" "$scratch/pipe.tif"
 
 # A file that ends too early.
 head -c 300000 "$scratch/reference.tif" > "$scratch/short.tif"
