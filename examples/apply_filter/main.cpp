@@ -56,7 +56,10 @@ bool applyFilter(example::Options const& options, ORVO::OGL::Context const* cont
     example::Picture result(source.width, source.height, source.channels, source.depth);
     if (!runFramesOfFilter(filter, options, source, result, context))
         return false;
-    example::writePicture(options.output, file.channels < 3 ? example::reducedToGrey(result) : result);
+    if (file.channels < 3)
+        result = example::reducedToGrey(result);
+    result.profile = example::profileOfResult(*filter, file);
+    example::writePicture(options.output, result);
     return true;
 }
 

@@ -50,8 +50,8 @@ public:
 [[nodiscard]] Picture readPicture(std::string const& path, Depth depth);
 
 /// Writes through a temporary file beside path, which takes its place at the end: after a failure path is as
-/// it was. The file holds the depth nearest to the picture's that its format knows. A format without alpha
-/// (JPEG) gets the picture over black. Throws PictureError.
+/// it was. The file holds the depth nearest to the picture's that its format knows, and the picture's profile
+/// (in EXR there are none). A format without alpha (JPEG) gets the picture over black. Throws PictureError.
 void writePicture(std::string const& path, Picture const& picture);
 
 /// Throws PictureError if writePicture would refuse path for its format or its folder, before any work is

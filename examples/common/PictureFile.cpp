@@ -143,9 +143,6 @@ void TemporaryFile::takePlace() {
         throw PictureError("Cannot write " + target_ + ": " + failure.message());
 }
 
-namespace {
-
-// The ICC profile that stands in the file.
 std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec) {
     auto const* attribute = spec.find_attribute("ICCProfile");
     if (!attribute || attribute->type().basetype != OIIO::TypeDesc::UINT8)
@@ -154,7 +151,14 @@ std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec) {
     return {bytes, bytes + attribute->datasize()};
 }
 
-} // namespace
+void setProfile(OIIO::ImageSpec& spec, std::vector<unsigned char> const& profile) {
+    // The header of a profile names the colours that it is for behind 16 bytes of other things.
+    constexpr std::ptrdiff_t colours = 16;
+    std::string const wanted = spec.nchannels < 3 ? "GRAY" : "RGB ";
+    if (profile.size() > 128 && std::equal(wanted.begin(), wanted.end(), profile.begin() + colours))
+        spec.attribute("ICCProfile", OIIO::TypeDesc(OIIO::TypeDesc::UINT8, static_cast<int>(profile.size())),
+                       profile.data());
+}
 
 bool hasAssociatedAlpha(OIIO::ImageSpec const& spec) {
     bool const hasAlpha = spec.nchannels == 2 || spec.nchannels == 4;
@@ -227,6 +231,8 @@ void writePicture(std::string const& path, Picture const& picture) {
         channels == picture.channels && picture.hasAlpha() ? static_cast<int>(channels) - 1 : -1;
     if (spec.alpha_channel >= 0 && extension != ".exr")
         spec["oiio:UnassociatedAlpha"] = 1;
+    if (extension != ".exr")
+        setProfile(spec, picture.profile);
 
     TemporaryFile temporary(path);
     if (!output->open(temporary.path(), spec) || !output->write_image(OIIO::TypeDesc::FLOAT, values.data()) ||

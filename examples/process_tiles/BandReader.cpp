@@ -92,6 +92,8 @@ std::string BandReader::compression() const {
     return file_->spec.get_string_attribute("compression", "none");
 }
 
+std::vector<unsigned char> BandReader::profile() const { return profileOf(file_->spec); }
+
 int BandReader::rowUnit() const { return file_->rowUnit(); }
 
 void BandReader::start(std::vector<Rows> bands, Depth depth) {

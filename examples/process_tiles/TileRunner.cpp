@@ -1,5 +1,6 @@
 #include "process_tiles/TileRunner.h"
 
+#include "apply_filter/FileProfile.h"
 #include "apply_filter/FrameRunner.h"
 #include "apply_filter/Interrupt.h"
 #include "apply_filter/RequestedFilter.h"
@@ -87,6 +88,9 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     FilterPtr const filter = filterOf(options, context);
     checkTilesWritable(options.output);
     BandReader reader(options.input);
+    Picture file;
+    file.profile = reader.profile();
+    useProfileOfFile(*filter, file, options.values);
     // Filters compute in 8 bits or in floats.
     Depth const depth = reader.depth() == Depth::uint8 ? Depth::uint8 : Depth::float32;
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
@@ -99,8 +103,9 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
 
     std::vector<Row> const rows = rowsOf(plan, frame);
     reader.start(bandsOf(rows), depth);
-    TileWriter writer(options.output, {reader.width(), reader.height(), plan.fileTile(), reader.channels(),
-                                       reader.depth(), compressionFor(options.output, reader)});
+    TileWriter writer(options.output,
+                      {reader.width(), reader.height(), plan.fileTile(), reader.channels(), reader.depth(),
+                       compressionFor(options.output, reader), profileOfResult(*filter, file)});
     Progress progress(pixelsOf(plan.picture()));
     for (Row const& row : rows) {
         Band const& band = reader.next();
