@@ -59,6 +59,7 @@ bool applyFilter(example::Options const& options, ORVO::OGL::Context const* cont
     if (file.channels < 3)
         result = example::reducedToGrey(result);
     result.profile = example::profileOfResult(*filter, file);
+    result.orientation = file.orientation;
     example::writePicture(options.output, result);
     return true;
 }

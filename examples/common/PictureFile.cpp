@@ -151,7 +151,11 @@ std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec) {
     return {bytes, bytes + attribute->datasize()};
 }
 
-void setProfile(OIIO::ImageSpec& spec, std::vector<unsigned char> const& profile) {
+int orientationOf(OIIO::ImageSpec const& spec) { return spec.get_int_attribute("Orientation", 1); }
+
+void setProfileAndOrientation(OIIO::ImageSpec& spec, std::vector<unsigned char> const& profile,
+                              int orientation) {
+    spec["Orientation"] = orientation;
     // The header of a profile names the colours that it is for behind 16 bytes of other things.
     constexpr std::ptrdiff_t colours = 16;
     std::string const wanted = spec.nchannels < 3 ? "GRAY" : "RGB ";
@@ -185,6 +189,7 @@ Picture readPicture(std::string const& path, Depth depth) {
         changeAlpha(values, picture.channels, true);
     floatsToPicture(values, picture);
     picture.profile = profileOf(spec);
+    picture.orientation = orientationOf(spec);
     return picture;
 }
 
@@ -232,7 +237,7 @@ void writePicture(std::string const& path, Picture const& picture) {
     if (spec.alpha_channel >= 0 && extension != ".exr")
         spec["oiio:UnassociatedAlpha"] = 1;
     if (extension != ".exr")
-        setProfile(spec, picture.profile);
+        setProfileAndOrientation(spec, picture.profile, picture.orientation);
 
     TemporaryFile temporary(path);
     if (!output->open(temporary.path(), spec) || !output->write_image(OIIO::TypeDesc::FLOAT, values.data()) ||

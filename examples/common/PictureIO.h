@@ -24,9 +24,13 @@ namespace example {
 /// The ICC profile that stands in the file; empty where there is none.
 [[nodiscard]] std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec);
 
-/// Has the file that is written hold the profile, if it is one for that number of channels. EXR files hold
-/// none.
-void setProfile(OIIO::ImageSpec& spec, std::vector<unsigned char> const& profile);
+/// Has the file that is written hold the profile, if it is one for that number of channels, and the
+/// orientation. Not for EXR files.
+void setProfileAndOrientation(OIIO::ImageSpec& spec, std::vector<unsigned char> const& profile,
+                              int orientation);
+
+/// How viewers turn the picture.
+[[nodiscard]] int orientationOf(OIIO::ImageSpec const& spec);
 
 /// The depth that holds every value of that type.
 [[nodiscard]] Depth depthOf(OIIO::TypeDesc const& type);

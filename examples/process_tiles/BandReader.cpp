@@ -94,6 +94,8 @@ std::string BandReader::compression() const {
 
 std::vector<unsigned char> BandReader::profile() const { return profileOf(file_->spec); }
 
+int BandReader::orientation() const { return orientationOf(file_->spec); }
+
 int BandReader::rowUnit() const { return file_->rowUnit(); }
 
 void BandReader::start(std::vector<Rows> bands, Depth depth) {

@@ -103,9 +103,9 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
 
     std::vector<Row> const rows = rowsOf(plan, frame);
     reader.start(bandsOf(rows), depth);
-    TileWriter writer(options.output,
-                      {reader.width(), reader.height(), plan.fileTile(), reader.channels(), reader.depth(),
-                       compressionFor(options.output, reader), profileOfResult(*filter, file)});
+    TileWriter writer(options.output, {reader.width(), reader.height(), plan.fileTile(), reader.channels(),
+                                       reader.depth(), compressionFor(options.output, reader),
+                                       profileOfResult(*filter, file), reader.orientation()});
     Progress progress(pixelsOf(plan.picture()));
     for (Row const& row : rows) {
         Band const& band = reader.next();

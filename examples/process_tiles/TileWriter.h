@@ -21,9 +21,10 @@ struct TileFileFormat {
     int height = 0;
     int fileTile = 0; ///< width and height of the file's own tiles
     std::size_t channels = 0;
-    Depth depth = Depth::uint8;              ///< what the file is to hold, where its format knows it
-    std::string compression;                 ///< as OpenImageIO names it
-    std::vector<unsigned char> profile = {}; ///< of ICC, for TIFF
+    Depth depth = Depth::uint8;         ///< what the file is to hold, where its format knows it
+    std::string compression;            ///< as OpenImageIO names it
+    std::vector<unsigned char> profile; ///< of ICC; not for EXR
+    int orientation = 1;                ///< as Picture has it; not for EXR
 };
 
 /// Throws PictureError if the writer would refuse the path for its format or its folder.

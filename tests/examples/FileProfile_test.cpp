@@ -112,5 +112,18 @@ TEST_F(FileProfile, IsTheSourceOfATransformThroughTiles) {
     EXPECT_GT(largestDifference(result, throughTiles("ColorspaceTransformer", toP3, colours(3, {}))), 20);
 }
 
+// Not of colours, but kept in the same places.
+TEST_F(FileProfile, GoesWithTheOrientation) {
+    Picture picture = colours(3, {});
+    picture.orientation = 6;
+    for (char const* const name : {"a.tif", "a.jpg"}) {
+        writePicture(file(name), picture);
+        EXPECT_EQ(readPicture(file(name), Depth::uint8).orientation, 6) << name;
+    }
+    EXPECT_EQ(throughTiles("FastBilateralBlur", {{"spatialSigma", "2,2"}}, picture).orientation, 6);
+    picture.orientation = 1;
+    EXPECT_EQ(throughTiles("FastBilateralBlur", {{"spatialSigma", "2,2"}}, picture).orientation, 1);
+}
+
 } // namespace
 } // namespace example
