@@ -18,7 +18,8 @@ unless the filter leads to other colours.
                        colour spaces as four characters or a number: --set srcProfile=sRGB. Where the file
                        has an ICC profile, that is the source unless srcProfile is set
   --tile N             size of a tile in pixels, 2048 by default; tiles are smaller where memory demands
-  --memory-limit MIB   memory that may be used, 512 by default; on gl textures count, too
+  --memory-limit MIB   memory that may be used, 512 by default; on gl textures count, too. A compressed strip
+                       of a TIFF file is held whole, beyond the limit where it is a long one
   --threads N          number of threads that compute; all by default
   --help               this text
 
