@@ -48,6 +48,9 @@ std::unique_ptr<OIIO::ImageInput> openForReading(std::string const& path) {
         throw PictureError("Cannot read " + path + ": no such file");
     if (fs::is_directory(path))
         throw PictureError("Cannot read " + path + ": it is a folder");
+    // A pipe would be waited for, and cannot be gone back in.
+    if (!fs::is_regular_file(path))
+        throw PictureError("Cannot read " + path + ": it is a device");
     OIIO::ImageSpec hints;
     hints["oiio:UnassociatedAlpha"] = 1;
     auto input = OIIO::ImageInput::open(path, &hints);
