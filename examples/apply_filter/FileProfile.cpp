@@ -28,4 +28,8 @@ void useProfileOfFile(ORVO::FilterGraph::IFilter& filter, Picture const& file,
     parameter->as<int>().setValue(static_cast<int>(code));
 }
 
+std::vector<unsigned char> profileOfResult(ORVO::FilterGraph::IFilter& filter, Picture const& file) {
+    return filter.parameter("dstProfile") ? std::vector<unsigned char>() : file.profile;
+}
+
 } // namespace example

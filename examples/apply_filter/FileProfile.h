@@ -19,4 +19,9 @@ namespace example {
 void useProfileOfFile(ORVO::FilterGraph::IFilter& filter, Picture const& file,
                       std::vector<std::pair<std::string, std::string>> const& values);
 
+/// The profile that the result has: that of the file, but none behind a filter that has a "dstProfile", which
+/// leads to other colours.
+[[nodiscard]] std::vector<unsigned char> profileOfResult(ORVO::FilterGraph::IFilter& filter,
+                                                         Picture const& file);
+
 } // namespace example

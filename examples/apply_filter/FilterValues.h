@@ -1,7 +1,8 @@
 #pragma once
 
+#include "common/CommandLine.h"
+
 #include <memory>
-#include <stdexcept>
 #include <string>
 
 namespace ORVO::FilterGraph {
@@ -11,9 +12,10 @@ class ParameterBase;
 
 namespace example {
 
-class ValueError : public std::runtime_error {
+/// A parameter that a filter has not, or text that is no value of it.
+class ValueError : public UsageError {
 public:
-    using std::runtime_error::runtime_error;
+    using UsageError::UsageError;
 };
 
 /// The name of the parameter's type, such as "float2".

@@ -1,9 +1,11 @@
 #pragma once
 
+#include <array>
+
 namespace example {
 
-/// While one lives, Ctrl-C and a polite kill are noted instead of ending the program. One may live inside the
-/// life of another.
+/// While one lives, Ctrl-C, a polite kill and the end of the terminal are noted instead of ending the
+/// program, but for those that it was started to ignore. One may live inside the life of another.
 class Interrupt {
 public:
     Interrupt();
@@ -16,8 +18,7 @@ public:
 private:
     using Handler = void (*)(int);
 
-    Handler onInterrupt_;
-    Handler onTerminate_;
+    std::array<Handler, 3> former_;
 };
 
 } // namespace example

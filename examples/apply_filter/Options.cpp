@@ -33,58 +33,20 @@ Depth depthNamed(std::string const& text) {
     throw UsageError("--precision is 8, 16 or 32f, not \"" + text + "\"");
 }
 
-void applyOption(Options& options, std::string const& option, std::string const& value) {
-    if (option == "--filter")
-        options.filter = value;
-    else if (option == "--set")
-        options.values.push_back(assignment(value));
-    else if (option == "--target")
-        options.target = targetNamed(value);
-    else if (option == "--precision")
-        options.precision = depthNamed(value);
-    else if (option == "--threads")
-        options.threads = positive<std::size_t>(option, value);
-    else if (option == "--repeat")
-        options.repeat = positive<int>(option, value);
-    else
-        throw UsageError("Unknown option " + option);
-}
-
-void checkComplete(Options const& options, std::size_t files) {
-    if (options.list || options.help)
-        return;
-    if (options.filter.empty())
-        throw UsageError("--filter is missing (--list shows the filters)");
-    if (files != 2)
-        throw UsageError("An input and an output file are needed");
-}
-
 } // namespace
 
 Options parseOptions(int argc, char const* const* argv) {
     Options options;
-    std::vector<std::string> files;
-    for (int i = 1; i < argc; ++i) {
-        std::string const argument = argv[i];
-        if (argument == "--list") {
-            options.list = true;
-        } else if (argument == "--async") {
-            options.async = true;
-        } else if (argument == "--help") {
-            options.help = true;
-        } else if (argument.rfind("--", 0) == 0) {
-            if (i + 1 == argc)
-                throw UsageError(argument + " needs a value");
-            applyOption(options, argument, argv[++i]);
-        } else {
-            files.push_back(argument);
-        }
-    }
-    checkComplete(options, files.size());
-    if (files.size() == 2) {
-        options.input = files[0];
-        options.output = files[1];
-    }
+    CommandLine commandLine;
+    addFilterOptions(commandLine, options);
+    commandLine.addOption("--precision",
+                          [&options](std::string const& value) { options.precision = depthNamed(value); });
+    commandLine.addNumber("--repeat", options.repeat);
+    commandLine.addFlag("--async", options.async);
+    commandLine.addFlag("--list", options.list);
+    std::vector<std::string> const files = commandLine.read(argc, argv);
+    if (!options.list && !options.help)
+        takeFiles(options, files, "--list");
     return options;
 }
 

@@ -1,26 +1,22 @@
 // apply_filter: one filter over a picture file. See Options.cpp for the command line.
 #include "apply_filter/FileProfile.h"
 #include "apply_filter/FilterList.h"
-#include "apply_filter/FilterValues.h"
 #include "apply_filter/FrameRunner.h"
 #include "apply_filter/Options.h"
+#include "apply_filter/RequestedFilter.h"
 #include "common/Engine.h"
 #include "common/Picture.h"
+#include "common/Program.h"
 
 #include <cstdio>
 #include <iostream>
 #include <memory>
 #include <set>
 #include <string>
-#include <utility>
 
 namespace {
 
-constexpr int exitFailure = 1;
-constexpr int exitUsage = 2;
-constexpr int exitInterrupted = 130;
-
-example::ContextPtr noContext() { return {}; }
+constexpr example::ProgramName program = {"apply_filter", "--list"};
 
 // The list of filters does without OpenGL where there is none.
 example::ContextPtr contextIfThereIsOne() {
@@ -33,16 +29,15 @@ example::ContextPtr contextIfThereIsOne() {
 
 // A filter that has no code for the target fails like any other; the user is told so in words.
 bool runFramesOfFilter(std::shared_ptr<ORVO::FilterGraph::IFilter> const& filter,
-                       example::Picture const& source, example::Picture& result,
-                       example::FrameSettings const& settings) {
+                       example::Options const& options, example::Picture const& source,
+                       example::Picture& result, ORVO::OGL::Context const* context) {
     try {
-        return example::runFrames(filter, source, result, settings);
+        return example::runFrames(filter, source, result, {context, options.repeat, options.async});
     } catch (std::exception const&) {
         // Asked of another one of its kind: this one's values may be what failed.
-        if (example::runsOn(settings.context, example::createFilterNamed(filter->identifier().name())))
+        if (example::runsOn(context, example::createFilterNamed(options.filter)))
             throw;
-        throw example::UsageError("The filter \"" + filter->identifier().name() + "\" does not run on " +
-                                  (settings.context ? "gl" : "cpu") + " (--list shows the targets)");
+        throw example::doesNotRun(options, program);
     }
 }
 
@@ -52,66 +47,48 @@ example::Depth depthFor(example::Options const& options) {
     return inFloat ? example::Depth::float32 : depth;
 }
 
-int applyFilter(example::Options const& options, ORVO::OGL::Context const* context) {
-    auto const filter = example::createFilterNamed(options.filter);
-    if (!filter)
-        throw example::UsageError("There is no filter \"" + options.filter + "\" (--list shows the filters)");
-    for (auto const& [name, value] : options.values) {
-        std::string const warning = example::setValue(*filter, name, value);
-        if (!warning.empty())
-            std::fprintf(stderr, "apply_filter: warning: %s\n", warning.c_str());
-    }
+bool applyFilter(example::Options const& options, ORVO::OGL::Context const* context) {
+    auto const filter = example::requestedFilter(options, program);
     example::checkWritable(options.output);
     example::Picture const file = example::readPicture(options.input, depthFor(options));
     example::useProfileOfFile(*filter, file, options.values);
     example::Picture const source = example::widenedToColour(file);
     example::Picture result(source.width, source.height, source.channels, source.depth);
-    if (!runFramesOfFilter(filter, source, result, {context, options.repeat, options.async})) {
-        std::fputs("apply_filter: cancelled, nothing was written\n", stderr);
-        return exitInterrupted;
-    }
-    example::writePicture(options.output, file.channels < 3 ? example::reducedToGrey(result) : result);
-    return 0;
+    if (!runFramesOfFilter(filter, options, source, result, context))
+        return false;
+    if (file.channels < 3)
+        result = example::reducedToGrey(result);
+    result.profile = example::profileOfResult(*filter, file);
+    result.orientation = file.orientation;
+    example::writePicture(options.output, result);
+    return true;
 }
 
 void listAll() {
     std::set<std::string> onCPU;
     {
-        example::Engine const withoutContext(noContext);
+        example::Engine const withoutContext(example::noContext);
         onCPU = example::filtersOnCPU();
     }
     example::Engine const engine(contextIfThereIsOne);
     example::listFilters(std::cout, engine.context.get(), onCPU);
 }
 
-int run(example::Options const& options) {
+bool run(example::Options const& options) {
     if (options.help) {
         std::fputs(example::usageText, stdout);
-        return 0;
+        return true;
     }
     if (options.list) {
         listAll();
-        return 0;
+        return true;
     }
-    example::Engine const engine(options.target == example::Target::gl ? example::makeContext : noContext);
-    if (options.threads > 0)
-        ORVO::FilterGraph::setNumberOfThreads(options.threads);
+    example::RequestedEngine const engine(options);
     return applyFilter(options, engine.context.get());
 }
 
 } // namespace
 
 int main(int argc, char** argv) {
-    try {
-        return run(example::parseOptions(argc, argv));
-    } catch (example::UsageError const& failure) {
-        std::fprintf(stderr, "apply_filter: %s\n", failure.what());
-        return exitUsage;
-    } catch (example::ValueError const& failure) {
-        std::fprintf(stderr, "apply_filter: %s\n", failure.what());
-        return exitUsage;
-    } catch (std::exception const& failure) {
-        std::fprintf(stderr, "apply_filter: %s\n", example::describe(failure).c_str());
-        return exitFailure;
-    }
+    return example::runProgram(program.name, [&] { return run(example::parseOptions(argc, argv)); });
 }

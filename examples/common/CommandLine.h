@@ -1,9 +1,13 @@
 #pragma once
 
 #include <charconv>
+#include <cstddef>
+#include <functional>
+#include <map>
 #include <stdexcept>
 #include <string>
 #include <utility>
+#include <vector>
 
 namespace example {
 
@@ -24,15 +28,64 @@ template <typename Number>
 [[nodiscard]] Number positive(std::string const& option, std::string const& text) {
     Number value = 0;
     auto const [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
-    if (error != std::errc() || end != text.data() + text.size() || value < 1)
+    bool const isWhole = end == text.data() + text.size() && text.find('-') == std::string::npos;
+    if (isWhole && error == std::errc::result_out_of_range)
+        throw UsageError(option + " is too large: " + text);
+    if (!isWhole || error != std::errc() || value < 1)
         throw UsageError(option + " needs a whole number of 1 or more, not \"" + text + "\"");
     return value;
 }
 
-/// "cpu" or "gl". Throws UsageError.
-[[nodiscard]] Target targetNamed(std::string const& text);
+/// Reads a command line: options by their names, in any order, and files. "--name value" and "--name=value"
+/// are the same. A lone "-" and all that stands behind "--" are files, whatever they look like.
+class CommandLine {
+public:
+    using Take = std::function<void(std::string const& value)>;
 
-/// NAME=VALUE in two parts. Throws UsageError.
-[[nodiscard]] std::pair<std::string, std::string> assignment(std::string const& text);
+    /// An option that has no value.
+    void addFlag(std::string const& name, bool& flag);
+    /// An option with a value, which is handed to `take`. That may throw UsageError.
+    void addOption(std::string const& name, Take take);
+    /// An option whose value is any text.
+    void addText(std::string const& name, std::string& text);
+    /// An option whose value is a whole number of 1 or more.
+    template <typename Number>
+    void addNumber(std::string const& name, Number& number) {
+        addOption(name,
+                  [name, &number](std::string const& value) { number = positive<Number>(name, value); });
+    }
+
+    /// Reads the arguments behind the name of the program and gives the files. Throws UsageError for unknown
+    /// options, for values that are missing or that an option has not, and what the options' takers throw.
+    [[nodiscard]] std::vector<std::string> read(int argc, char const* const* argv) const;
+
+private:
+    struct Option {
+        bool* flag; ///< null for an option with a value
+        Take take;
+    };
+
+    [[nodiscard]] Option const& named(std::string const& name) const;
+
+    std::map<std::string, Option> options_;
+};
+
+/// What the programs have in common that run a filter over a picture file.
+struct FilterOptions {
+    std::string filter;
+    std::vector<std::pair<std::string, std::string>> values; ///< of --set, in order
+    Target target = Target::cpu;
+    std::size_t threads = 0; ///< 0: as many as the machine has
+    bool help = false;
+    std::string input;
+    std::string output;
+};
+
+/// Adds --filter, --set, --target, --threads and --help.
+void addFilterOptions(CommandLine& commandLine, FilterOptions& options);
+
+/// Takes the two files. `list` is what a user types to see the filters. Throws UsageError where a file or the
+/// filter is missing.
+void takeFiles(FilterOptions& options, std::vector<std::string> const& files, std::string const& list);
 
 } // namespace example

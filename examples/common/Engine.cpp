@@ -8,6 +8,8 @@ ContextPtr makeContext() {
     return context;
 }
 
+ContextPtr noContext() { return {}; }
+
 Engine::Engine(ContextPtr (*makeContextOrNone)()) : context(makeContextOrNone()) {
     ORVO::FilterGraph::insertStandardFilters();
     ORVO::FilterGraph::Library::insertORVOFilters();

@@ -13,6 +13,9 @@ using ContextPtr = std::unique_ptr<ORVO::OGL::ContextOffscreen>;
 /// A context without a window, current on this thread. Throws OGL::ExceptionOGL where there is no OpenGL.
 [[nodiscard]] ContextPtr makeContext();
 
+/// None: the layers come up without OpenGL.
+[[nodiscard]] ContextPtr noContext();
+
 /// The layers of the engine with the filters that come with it, up for the life of one of these, on OpenGL
 /// where a context is given.
 struct Engine {

@@ -22,8 +22,10 @@ struct Picture {
     std::size_t channels = 0;
     Depth depth = Depth::uint8;
     std::vector<unsigned char> pixels;
-    std::vector<unsigned char>
-        profile; ///< the ICC profile that stands in the file; empty where there is none
+    /// The ICC profile that stands in the file; empty where there is none.
+    std::vector<unsigned char> profile;
+    /// How viewers turn the picture of the file: EXIF's number, 1 for not at all.
+    int orientation = 1;
 
     Picture() = default;
     Picture(std::size_t width, std::size_t height, std::size_t channels, Depth depth);
@@ -50,8 +52,9 @@ public:
 [[nodiscard]] Picture readPicture(std::string const& path, Depth depth);
 
 /// Writes through a temporary file beside path, which takes its place at the end: after a failure path is as
-/// it was. The file holds the depth nearest to the picture's that its format knows. A format without alpha
-/// (JPEG) gets the picture over black. Throws PictureError.
+/// it was. The file holds the depth nearest to the picture's that its format knows, and the picture's profile
+/// and orientation (but for EXR). A format without alpha (JPEG) gets the picture over black. Throws
+/// PictureError.
 void writePicture(std::string const& path, Picture const& picture);
 
 /// Throws PictureError if writePicture would refuse path for its format or its folder, before any work is

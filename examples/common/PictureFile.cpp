@@ -2,11 +2,14 @@
 #include "common/PictureIO.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <cmath>
 #include <cstdint>
 #include <filesystem>
 #include <system_error>
 
+#include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 namespace example {
@@ -43,6 +46,11 @@ std::string firstLine(std::string const& text) { return text.substr(0, text.find
 std::unique_ptr<OIIO::ImageInput> openForReading(std::string const& path) {
     if (!fs::exists(path))
         throw PictureError("Cannot read " + path + ": no such file");
+    if (fs::is_directory(path))
+        throw PictureError("Cannot read " + path + ": it is a folder");
+    // A pipe would be waited for, and cannot be gone back in.
+    if (!fs::is_regular_file(path))
+        throw PictureError("Cannot read " + path + ": it is a device");
     OIIO::ImageSpec hints;
     hints["oiio:UnassociatedAlpha"] = 1;
     auto input = OIIO::ImageInput::open(path, &hints);
@@ -138,9 +146,6 @@ void TemporaryFile::takePlace() {
         throw PictureError("Cannot write " + target_ + ": " + failure.message());
 }
 
-namespace {
-
-// The ICC profile that stands in the file.
 std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec) {
     auto const* attribute = spec.find_attribute("ICCProfile");
     if (!attribute || attribute->type().basetype != OIIO::TypeDesc::UINT8)
@@ -149,7 +154,18 @@ std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec) {
     return {bytes, bytes + attribute->datasize()};
 }
 
-} // namespace
+int orientationOf(OIIO::ImageSpec const& spec) { return spec.get_int_attribute("Orientation", 1); }
+
+void setProfileAndOrientation(OIIO::ImageSpec& spec, std::vector<unsigned char> const& profile,
+                              int orientation) {
+    spec["Orientation"] = orientation;
+    // The header of a profile names the colours that it is for behind 16 bytes of other things.
+    constexpr std::ptrdiff_t colours = 16;
+    std::string const wanted = spec.nchannels < 3 ? "GRAY" : "RGB ";
+    if (profile.size() > 128 && std::equal(wanted.begin(), wanted.end(), profile.begin() + colours))
+        spec.attribute("ICCProfile", OIIO::TypeDesc(OIIO::TypeDesc::UINT8, static_cast<int>(profile.size())),
+                       profile.data());
+}
 
 bool hasAssociatedAlpha(OIIO::ImageSpec const& spec) {
     bool const hasAlpha = spec.nchannels == 2 || spec.nchannels == 4;
@@ -176,18 +192,31 @@ Picture readPicture(std::string const& path, Depth depth) {
         changeAlpha(values, picture.channels, true);
     floatsToPicture(values, picture);
     picture.profile = profileOf(spec);
+    picture.orientation = orientationOf(spec);
     return picture;
 }
 
 void checkWritable(std::string const& path) {
-    static_cast<void>(outputFor(path));
+    auto const refuse = [&path](std::string const& reason) {
+        throw PictureError("Cannot write " + path + ": " + reason);
+    };
     fs::path const folder = fs::path(path).parent_path();
     if (fs::is_directory(path))
-        throw PictureError("Cannot write " + path + ": it is a folder");
+        refuse("it is a folder");
+    static_cast<void>(outputFor(path));
+    if (fs::exists(path) && !fs::is_regular_file(path))
+        refuse("it is a device");
     if (!folder.empty() && !fs::is_directory(folder))
-        throw PictureError("Cannot write " + path + ": no such folder");
+        refuse("no such folder");
     if (::access(folder.empty() ? "." : folder.c_str(), W_OK) != 0)
-        throw PictureError("Cannot write " + path + ": the folder is not writable");
+        refuse("the folder is not writable");
+    // Some folders that look writable are not: those of the system, those on a medium that is full.
+    std::string const temporary = temporaryBeside(path);
+    int const file = ::open(temporary.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR);
+    if (file < 0)
+        refuse("no file can be made beside it (" + std::generic_category().message(errno) + ")");
+    ::close(file);
+    ::unlink(temporary.c_str());
 }
 
 void writePicture(std::string const& path, Picture const& picture) {
@@ -210,6 +239,8 @@ void writePicture(std::string const& path, Picture const& picture) {
         channels == picture.channels && picture.hasAlpha() ? static_cast<int>(channels) - 1 : -1;
     if (spec.alpha_channel >= 0 && extension != ".exr")
         spec["oiio:UnassociatedAlpha"] = 1;
+    if (extension != ".exr")
+        setProfileAndOrientation(spec, picture.profile, picture.orientation);
 
     TemporaryFile temporary(path);
     if (!output->open(temporary.path(), spec) || !output->write_image(OIIO::TypeDesc::FLOAT, values.data()) ||

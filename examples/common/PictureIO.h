@@ -21,6 +21,17 @@ namespace example {
 /// Whether the colours of the file come with alpha multiplied in.
 [[nodiscard]] bool hasAssociatedAlpha(OIIO::ImageSpec const& spec);
 
+/// The ICC profile that stands in the file; empty where there is none.
+[[nodiscard]] std::vector<unsigned char> profileOf(OIIO::ImageSpec const& spec);
+
+/// Has the file that is written hold the profile, if it is one for that number of channels, and the
+/// orientation. Not for EXR files.
+void setProfileAndOrientation(OIIO::ImageSpec& spec, std::vector<unsigned char> const& profile,
+                              int orientation);
+
+/// How viewers turn the picture.
+[[nodiscard]] int orientationOf(OIIO::ImageSpec const& spec);
+
 /// The depth that holds every value of that type.
 [[nodiscard]] Depth depthOf(OIIO::TypeDesc const& type);
 

@@ -4,6 +4,7 @@
 #include "apply_filter/FrameRunner.h"
 #include "common/Engine.h"
 #include "common/Picture.h"
+#include "common/Program.h"
 
 #include <algorithm>
 #include <cmath>
@@ -24,8 +25,6 @@ constexpr std::size_t reduction = 3; // pixels of the photograph for one of the 
 constexpr std::size_t gap = 6;
 constexpr std::size_t filtersInARow = 2;
 constexpr unsigned char grey = 225; // where a filter does not run
-
-example::ContextPtr noContext() { return {}; }
 
 /// What a filter makes of the photograph; nothing where it does not run.
 using Sample = std::optional<Picture>;
@@ -162,7 +161,7 @@ void makeGallery(std::string const& photographFile, std::string const& sheetFile
     std::vector<Sample> onCPU;
     {
         // By itself: some types of filters run on OpenGL alone where there is a context.
-        example::Engine const engine(noContext);
+        example::Engine const engine(example::noContext);
         names = namesOfFilters();
         onCPU = samplesOf(names, photograph, nullptr);
     }
@@ -180,11 +179,8 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "Usage: %s PHOTOGRAPH CONTACT_SHEET\n", argv[0]);
         return 2;
     }
-    try {
+    return example::runProgram("gallery", [&] {
         makeGallery(argv[1], argv[2]);
-    } catch (std::exception const& failure) {
-        std::fprintf(stderr, "gallery: %s\n", example::describe(failure).c_str());
-        return 1;
-    }
-    return 0;
+        return true;
+    });
 }

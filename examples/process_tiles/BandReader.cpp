@@ -20,10 +20,40 @@ struct BandReader::File {
     OIIO::ImageSpec spec;
 
     [[nodiscard]] bool isTiled() const { return spec.tile_width > 0; }
-    /// Rows are read in multiples of this, counted from the top.
-    [[nodiscard]] int rowUnit() const { return isTiled() ? spec.tile_height : 1; }
+    /// Rows are read in multiples of this, counted from the top: as they are stored, where that is not much
+    /// at a time. Parts of strips of doubles come as zeros from OpenImageIO.
+    [[nodiscard]] int rowUnit() const {
+        if (isTiled())
+            return spec.tile_height;
+        int const strip = std::clamp(spec.get_int_attribute("tiff:RowsPerStrip", 1), 1, spec.height);
+        return strip <= rowsAtATime || spec.format == OIIO::TypeDesc::DOUBLE ? strip : 1;
+    }
 
-    void read(int first, int end, OIIO::TypeDesc const& type, void* pixels) {
+    void read(int first, int end, OIIO::TypeDesc const& type, unsigned char* pixels) {
+        // As the file has them, and converted here: OpenImageIO converts by way of a buffer that is larger
+        // than any cache, and new for every call. That takes four times as long.
+        if (!spec.channelformats.empty()) {
+            readAs(type, first, end, pixels);
+        } else if (spec.format == type) {
+            readAs(OIIO::TypeDesc::UNKNOWN, first, end, pixels);
+        } else {
+            auto const values =
+                static_cast<std::size_t>(spec.width) * static_cast<std::size_t>(spec.nchannels);
+            auto const rows = static_cast<std::size_t>(end - first);
+            asInFile.resize(rows * values * spec.format.size());
+            readAs(OIIO::TypeDesc::UNKNOWN, first, end, asInFile.data());
+            for (std::size_t row = 0; row < rows; ++row)
+                OIIO::convert_pixel_values(spec.format, asInFile.data() + row * values * spec.format.size(),
+                                           type, pixels + row * values * type.size(),
+                                           static_cast<int>(values));
+        }
+    }
+
+private:
+    std::vector<unsigned char> asInFile;
+
+    // UNKNOWN stands for the type of the file.
+    void readAs(OIIO::TypeDesc const& type, int first, int end, void* pixels) {
         int const top = spec.y + first;
         int const bottom = spec.y + end;
         bool const done = isTiled()
@@ -61,6 +91,12 @@ Depth BandReader::depth() const { return depthOf(file_->spec.format); }
 std::string BandReader::compression() const {
     return file_->spec.get_string_attribute("compression", "none");
 }
+
+std::vector<unsigned char> BandReader::profile() const { return profileOf(file_->spec); }
+
+int BandReader::orientation() const { return orientationOf(file_->spec); }
+
+int BandReader::rowUnit() const { return file_->rowUnit(); }
 
 void BandReader::start(std::vector<Rows> bands, Depth depth) {
     bands_ = std::move(bands);
@@ -152,7 +188,7 @@ void BandReader::readRows(Band& band, int first, int end) const {
         return;
     }
     std::vector<float> values(width * rows * channels());
-    file_->read(first, end, OIIO::TypeDesc::FLOAT, values.data());
+    file_->read(first, end, OIIO::TypeDesc::FLOAT, reinterpret_cast<unsigned char*>(values.data()));
     changeAlpha(values, channels(), true);
     Picture part(width, rows, channels(), depth_);
     floatsToPicture(values, part);

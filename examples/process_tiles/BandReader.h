@@ -41,6 +41,12 @@ public:
     [[nodiscard]] std::size_t channels() const;
     /// The depth that holds every value of the file.
     [[nodiscard]] Depth depth() const;
+    /// The ICC profile that stands in the file; empty where there is none.
+    [[nodiscard]] std::vector<unsigned char> profile() const;
+    /// How viewers turn the picture, as Picture has it.
+    [[nodiscard]] int orientation() const;
+    /// Bands end on multiples of so many rows, or at the end of the picture.
+    [[nodiscard]] int rowUnit() const;
     /// How the file is compressed, as OpenImageIO names it; "none" where it does not say.
     [[nodiscard]] std::string compression() const;
 

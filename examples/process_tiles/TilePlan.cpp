@@ -26,8 +26,8 @@ constexpr int largestStep = 2048;
 // Tiles become smaller than this only where nothing else helps.
 constexpr int comfortableSide = 1024;
 
-// Results that are computed, wait, and are being written.
-constexpr std::size_t resultsInFlight = 4;
+// The result that is computed, the one that waits and the one that is being written.
+constexpr std::size_t resultsInFlight = 3;
 
 int roundedUp(int value, int unit) { return (value + unit - 1) / unit * unit; }
 
@@ -58,11 +58,19 @@ std::size_t areaOf(Rectangle const& rectangle) {
            static_cast<std::size_t>(rectangle.extent().height());
 }
 
-// The frame is counted one and a half times, for what is kept from one for the next.
-std::size_t bytesNeeded(Rectangle const& window, int width, MemoryUse const& use) {
-    auto const rows = static_cast<std::size_t>(window.extent().height());
+// The frame is counted twice, for what is kept from one for the next.
+std::size_t bytesNeeded(Rectangle const& window, Rectangle const& picture, MemoryUse const& use) {
+    int const width = picture.extent().width();
+    auto const rows = static_cast<std::size_t>(
+        std::min(window.extent().height() + use.rowUnit - 1, picture.extent().height()));
     return 2 * rows * static_cast<std::size_t>(width) * use.file +
-           areaOf(window) * (resultsInFlight * use.result + use.work + use.work / 2);
+           areaOf(window) * (resultsInFlight * use.result + 2 * use.work);
+}
+
+// A last strip of fewer than 16 pixels belongs to the tile before it.
+int longestTile(int picture, int tile) {
+    int const strip = picture % tile;
+    return strip < 16 ? tile + strip : tile;
 }
 
 // Every second row of tiles is walked the other way.
@@ -127,14 +135,14 @@ TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, 
       fileTile_(roundedUp(std::min(tileSize, 256), vectorColumns)) {
     int tileWidth = roundedUp(std::min(tileSize, roundedUp(width, fileTile_)), fileTile_);
     int tileHeight = roundedUp(std::min(tileSize, roundedUp(height, fileTile_)), fileTile_);
-    // The worst case: a tile that has taken in a strip, between others, farthest from the grid's corners.
-    // What the frame reads beyond what it computes is less than half the margin.
+    // The worst case: a tile between others, farthest from the grid's corners. What the frame reads beyond
+    // what it computes is less than half the margin.
     auto const window = [&] {
-        int const right = tileWidth + 15 + 2 * reach.marginX + reach.stepX + vectorColumns;
-        int const bottom = tileHeight + 15 + 3 * reach.marginY + reach.stepY;
+        int const right = longestTile(width, tileWidth) + 2 * reach.marginX + reach.stepX + vectorColumns;
+        int const bottom = longestTile(height, tileHeight) + 3 * reach.marginY + reach.stepY;
         return commonPart(rectangleBetween(0, 0, right, bottom), picture());
     };
-    auto const needed = [&] { return use.fixed + bytesNeeded(window(), width, use); };
+    auto const needed = [&] { return use.fixed + bytesNeeded(window(), picture(), use); };
     auto const shorten = [&](int& side, int least) {
         while (needed() > memory && side > std::max(least, fileTile_))
             side -= fileTile_;

@@ -1,9 +1,9 @@
 #include "process_tiles/TileRunner.h"
 
-#include "apply_filter/FilterList.h"
-#include "apply_filter/FilterValues.h"
+#include "apply_filter/FileProfile.h"
 #include "apply_filter/FrameRunner.h"
 #include "apply_filter/Interrupt.h"
+#include "apply_filter/RequestedFilter.h"
 #include "common/Picture.h"
 #include "orvo/core/memory/ImageStorage.h"
 #include "orvo/filter_graph/FilterGraph.h"
@@ -14,7 +14,6 @@
 #include "process_tiles/TileWriter.h"
 
 #include <algorithm>
-#include <cstdio>
 #include <memory>
 #include <utility>
 #include <vector>
@@ -26,18 +25,10 @@ namespace {
 using FilterPtr = std::shared_ptr<ORVO::FilterGraph::IFilter>;
 
 FilterPtr filterOf(TileOptions const& options, ORVO::OGL::Context const* context) {
-    FilterPtr filter = createFilterNamed(options.filter);
-    if (!filter)
-        throw UsageError("There is no filter \"" + options.filter +
-                         "\" (apply_filter --list shows the filters)");
-    for (auto const& [name, value] : options.values) {
-        std::string const warning = setValue(*filter, name, value);
-        if (!warning.empty())
-            std::fprintf(stderr, "process_tiles: warning: %s\n", warning.c_str());
-    }
+    constexpr ProgramName program = {"process_tiles", "apply_filter --list"};
+    FilterPtr filter = requestedFilter(options, program);
     if (!runsOn(context, filter) && !Interrupt::requested())
-        throw UsageError("The filter \"" + options.filter + "\" does not run on " + (context ? "gl" : "cpu") +
-                         " (apply_filter --list shows the targets)");
+        throw doesNotRun(options, program);
     return filter;
 }
 
@@ -97,17 +88,24 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     FilterPtr const filter = filterOf(options, context);
     checkTilesWritable(options.output);
     BandReader reader(options.input);
+    Picture file;
+    file.profile = reader.profile();
+    useProfileOfFile(*filter, file, options.values);
     // Filters compute in 8 bits or in floats.
     Depth const depth = reader.depth() == Depth::uint8 ? Depth::uint8 : Depth::float32;
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
-    TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter),
-                        frame.memoryUse(), memory);
-    ORVO::Core::setImageStorageLimit(plan.frameMemory());
+    MemoryUse use = frame.memoryUse();
+    use.rowUnit = reader.rowUnit();
+    TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter), use, memory);
+    // Half as much again as one frame takes: tiles at the edges are smaller than others, and would take the
+    // place of what the next tile needs.
+    ORVO::Core::setImageStorageLimit(plan.frameMemory() / 2 * 3);
 
     std::vector<Row> const rows = rowsOf(plan, frame);
     reader.start(bandsOf(rows), depth);
     TileWriter writer(options.output, {reader.width(), reader.height(), plan.fileTile(), reader.channels(),
-                                       reader.depth(), compressionFor(options.output, reader)});
+                                       reader.depth(), compressionFor(options.output, reader),
+                                       profileOfResult(*filter, file), reader.orientation()});
     Progress progress(pixelsOf(plan.picture()));
     for (Row const& row : rows) {
         Band const& band = reader.next();

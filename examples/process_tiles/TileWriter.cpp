@@ -2,14 +2,12 @@
 
 #include "common/PictureIO.h"
 
-#include <cstdint>
+#include <filesystem>
 #include <utility>
 
 namespace example {
 
 namespace {
-
-constexpr std::size_t jobsThatWait = 2;
 
 bool isExr(std::string const& path) { return extensionOf(path) == ".exr"; }
 
@@ -30,6 +28,9 @@ OIIO::ImageSpec specOf(std::string const& path, TileFileFormat const& format) {
         // Without this, tiles wait in memory for those that come before them in the file.
         spec["openexr:lineOrder"] = "randomY";
     } else {
+        // One thread writes: at the level that is usual it takes five times as long, for files 3 % smaller.
+        spec["tiff:zipquality"] = 4;
+        setProfileAndOrientation(spec, format.profile, format.orientation);
         if (alpha)
             spec["oiio:UnassociatedAlpha"] = 1;
         if (spec.image_bytes(true) > 0xf0000000U)
@@ -64,9 +65,9 @@ struct TileWriter::File {
 };
 
 void checkTilesWritable(std::string const& path) {
-    checkWritable(path);
-    if (!isExr(path) && !isTiff(path))
+    if (!isExr(path) && !isTiff(path) && !std::filesystem::is_directory(path))
         throw PictureError("Cannot write " + path + ": tiles go into TIFF and EXR files");
+    checkWritable(path);
 }
 
 TileWriter::TileWriter(std::string const& path, TileFileFormat const& format)
@@ -104,7 +105,7 @@ Picture TileWriter::spare() {
 
 void TileWriter::write(Rectangle const& tile, Rectangle const& computed, Picture picture) {
     std::unique_lock lock(mutex_);
-    changed_.wait(lock, [this] { return jobs_.size() < jobsThatWait || failure_; });
+    changed_.wait(lock, [this] { return jobs_.empty() || failure_; });
     if (failure_)
         std::rethrow_exception(failure_);
     jobs_.push_back({tile, computed, std::move(picture)});

@@ -21,8 +21,10 @@ struct TileFileFormat {
     int height = 0;
     int fileTile = 0; ///< width and height of the file's own tiles
     std::size_t channels = 0;
-    Depth depth = Depth::uint8; ///< what the file is to hold, where its format knows it
-    std::string compression;    ///< as OpenImageIO names it
+    Depth depth = Depth::uint8;         ///< what the file is to hold, where its format knows it
+    std::string compression;            ///< as OpenImageIO names it
+    std::vector<unsigned char> profile; ///< of ICC; not for EXR
+    int orientation = 1;                ///< as Picture has it; not for EXR
 };
 
 /// Throws PictureError if the writer would refuse the path for its format or its folder.
@@ -43,7 +45,7 @@ public:
 
     /// Hands over a picture of the rectangle `computed`, of which the tile is written: in the file's
     /// channels, or as colour for grey, or with an alpha that the file has not. The tile begins on the edges
-    /// of file tiles, and ends there or at the edge of the picture. Waits while two are waiting. Throws
+    /// of file tiles, and ends there or at the edge of the picture. Waits while one is waiting. Throws
     /// PictureError if an earlier one could not be written.
     void write(Rectangle const& tile, Rectangle const& computed, Picture picture);
 

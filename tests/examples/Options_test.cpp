@@ -58,7 +58,7 @@ TEST(Options, ListAndHelpNeedNoFiles) {
 }
 
 TEST(Options, RefusesWithOneLine) {
-    EXPECT_EQ(refusal({"--bogus", "1"}), "Unknown option --bogus");
+    EXPECT_EQ(refusal({"--bogus", "1"}), "Unknown option --bogus (--help shows the options)");
     EXPECT_EQ(refusal({"--filter"}), "--filter needs a value");
     EXPECT_EQ(refusal({"in", "out"}), "--filter is missing (--list shows the filters)");
     EXPECT_EQ(refusal({"--filter", "F", "in"}), "An input and an output file are needed");

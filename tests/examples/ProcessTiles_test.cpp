@@ -150,6 +150,49 @@ TEST_F(ProcessTiles, KeepsTheDepthOfTheFile) {
     EXPECT_EQ(depthOfFile(file("out.tif")), Depth::uint15_1);
 }
 
+// A compressed TIFF file of strips, from floats.
+void writeStrips(std::string const& path, Picture const& picture, OIIO::TypeDesc const& type, int rows) {
+    OIIO::ImageSpec spec(static_cast<int>(picture.width), static_cast<int>(picture.height),
+                         static_cast<int>(picture.channels), type);
+    spec["tiff:RowsPerStrip"] = rows;
+    spec["compression"] = "zip";
+    auto const output = OIIO::ImageOutput::create(path);
+    ASSERT_TRUE(output && output->open(path, spec) &&
+                output->write_image(OIIO::TypeDesc::FLOAT, picture.pixels.data()) && output->close());
+}
+
+TEST_F(ProcessTiles, ReadsStripsOfEveryTypeAndHeight) {
+    Picture const picture = scene(97, 133, 3, Depth::float32);
+    TileOptions const what =
+        options("FastBilateralBlur", file("in.tif"), file("out.tif"), {{"spatialSigma", "2,2"}});
+    for (OIIO::TypeDesc const type :
+         {OIIO::TypeDesc::UINT8, OIIO::TypeDesc::UINT16, OIIO::TypeDesc::FLOAT, OIIO::TypeDesc::DOUBLE}) {
+        bool const bytes = type == OIIO::TypeDesc::UINT8;
+        for (int const rows : {1, 7, 32, 133}) {
+            writeStrips(what.input, picture, type, rows);
+            ASSERT_TRUE(processTiles(what, nullptr));
+            Depth const depth = bytes ? Depth::uint8 : Depth::float32;
+            auto const got = pictureToFloats(readPicture(what.output, depth));
+            auto const wanted = pictureToFloats(inOnePiece(what, nullptr, readPicture(what.input, depth)));
+            // A file of 16 bits takes the nearest of its values.
+            float const step = type == OIIO::TypeDesc::UINT16 ? 0.51F / 65535.0F : 0.0F;
+            ASSERT_EQ(got.size(), wanted.size());
+            for (std::size_t i = 0; i < got.size(); ++i)
+                ASSERT_NEAR(got[i], wanted[i], step) << type << " in strips of " << rows << " at " << i;
+        }
+    }
+}
+
+TEST_F(ProcessTiles, TakesPicturesThatAreNarrowerThanATile) {
+    for (auto const& [width, height] : {std::pair(1, 1), {5, 300}, {300, 5}, {17, 16}, {64, 79}}) {
+        Picture const picture =
+            scene(static_cast<std::size_t>(width), static_cast<std::size_t>(height), 3, Depth::uint8);
+        TileOptions const what = options("FastBilateralBlur", "", "", {{"spatialSigma", "2,2"}});
+        EXPECT_EQ(difference(what, nullptr, picture), 0) << width << " x " << height;
+        EXPECT_EQ(difference(what, context(), picture), 0) << width << " x " << height;
+    }
+}
+
 TEST_F(ProcessTiles, ReadsTiledFilesAndAssociatedAlpha) {
     Picture const picture = scene(150, 133, 4, Depth::uint8);
     writePicture(file("in.tif"), picture);

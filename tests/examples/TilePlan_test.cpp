@@ -103,10 +103,15 @@ TEST(TilePlan, ShortensTilesUntilTheyFitIntoMemory) {
     EXPECT_GE(height, 1024);
     EXPECT_LT(heightWith(320), height);
     // The bands of whole rows fit, but not the frame of a tile that is 2048 pixels wide: one of 1280 takes
-    // 1184 rows of 2 * 90,000 + 1481 * 664 bytes, 1314 MiB.
+    // 1169 rows of 2 * 90,000 + 1466 * 848 bytes, 1587 MiB.
     MemoryUse const costly = {0, 3, 16, 400};
-    TilePlan const plan(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), costly, std::size_t(1400) << 20U);
+    TilePlan const plan(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), costly, std::size_t(1600) << 20U);
     EXPECT_EQ(plan.tiles().front().extent(), ORVO::ExtentInPixelSpace(1280, 1024));
+    // Read by 256 rows, 255 more have to be held twice: 44 MiB, for which 1600 do not suffice.
+    MemoryUse const byTiles = {0, 3, 16, 400, 256};
+    TilePlan const planByTiles(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), byTiles,
+                               std::size_t(1600) << 20U);
+    EXPECT_EQ(planByTiles.tiles().front().extent(), ORVO::ExtentInPixelSpace(1024, 1024));
     try {
         heightWith(141);
         FAIL() << "141 MiB suffice";
@@ -143,10 +148,13 @@ TEST(TileOptions, RefusesWithOneLine) {
     EXPECT_EQ(tileRefusal({"in", "out"}), "--filter is missing (apply_filter --list shows the filters)");
     EXPECT_EQ(tileRefusal({"--filter", "F", "in"}), "An input and an output file are needed");
     EXPECT_EQ(tileRefusal({"--filter"}), "--filter needs a value");
-    EXPECT_EQ(tileRefusal({"--wrong", "1"}), "Unknown option --wrong");
+    EXPECT_EQ(tileRefusal({"--wrong", "1"}), "Unknown option --wrong (--help shows the options)");
     EXPECT_EQ(tileRefusal({"--tile", "0"}), "--tile needs a whole number of 1 or more, not \"0\"");
     EXPECT_EQ(tileRefusal({"--memory-limit", "x"}),
               "--memory-limit needs a whole number of 1 or more, not \"x\"");
+    EXPECT_EQ(tileRefusal({"--filter", "F", "--memory-limit", "17592186044415", "in", "out"}), "accepted");
+    EXPECT_EQ(tileRefusal({"--memory-limit", "17592186044416"}),
+              "--memory-limit is too large: 17592186044416");
     EXPECT_EQ(tileRefusal({"--threads", "-1"}), "--threads needs a whole number of 1 or more, not \"-1\"");
     EXPECT_EQ(tileRefusal({"--target", "gpu"}), "--target is cpu or gl, not \"gpu\"");
     EXPECT_EQ(tileRefusal({"--set", "a"}), "--set needs NAME=VALUE, not \"a\"");

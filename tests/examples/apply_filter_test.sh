@@ -2,34 +2,8 @@
 # apply_filter_test.sh PROGRAM DATA SCRATCH: runs the example host with good and with bad command lines.
 set -u
 program=$1 data=$2 scratch=$3
-failures=0
-rm -rf "$scratch"
-mkdir -p "$scratch"
-
-fail() {
-    echo "FAILED: $*"
-    failures=$((failures + 1))
-}
-
-# refused STATUS PATTERN ARGUMENT...: ends with STATUS, one line on standard error that has PATTERN, no output file.
-refused() {
-    local status=$1 pattern=$2
-    shift 2
-    rm -f "$scratch/out.png"
-    "$program" "$@" > "$scratch/stdout" 2> "$scratch/stderr"
-    local got=$?
-    [ $got -eq "$status" ] || fail "status $got, not $status: $*"
-    [ "$(wc -l < "$scratch/stderr")" -eq 1 ] || fail "not one line: $(cat "$scratch/stderr")"
-    grep -qF -- "$pattern" "$scratch/stderr" || fail "no \"$pattern\" in: $(cat "$scratch/stderr")"
-    [ ! -e "$scratch/out.png" ] || fail "an output file is there: $*"
-    [ -z "$(find "$scratch" -name '.*')" ] || fail "a temporary file is left: $*"
-}
-
-# accepted ARGUMENT...: ends well, silently.
-accepted() {
-    "$program" "$@" > "$scratch/stdout" 2> "$scratch/stderr" || fail "refused: $* ($(cat "$scratch/stderr"))"
-    [ ! -s "$scratch/stderr" ] || fail "standard error: $(cat "$scratch/stderr")"
-}
+output="$scratch/out.png"
+source "$(dirname "$0")/support/program_test.sh"
 
 photograph="$data/astronaut.png"
 bilateral=(--filter FastBilateralBlur)
@@ -93,11 +67,11 @@ done
 cmp -s "$scratch/own_astronaut.png" "$scratch/named_astronaut.png" && fail "the profile in the file changes nothing"
 cmp -s "$scratch/own_coffee.png" "$scratch/named_coffee.png" || fail "a file without a profile has another source"
 refused 2 'is a colour space, which "nonsense" is not' --filter ColorspaceTransformer --set srcProfile=nonsense \
-    "$photograph" "$scratch/out.png"
+    "$photograph" "$output"
 refused 1 'Cannot make src profile from code' --filter ColorspaceTransformer --set srcProfile=none \
-    "$photograph" "$scratch/out.png"
+    "$photograph" "$output"
 refused 1 'Cannot make dst profile from code' --filter ColorspaceTransformer --set dstProfile=none \
-    "$photograph" "$scratch/out.png"
+    "$photograph" "$output"
 
 accepted --list
 grep -A1 '^FastBilateralBlur' "$scratch/stdout" | grep -q 'runs on cpu, gl' || fail "targets of FastBilateralBlur"
@@ -116,42 +90,29 @@ done
 accepted --help
 grep -q '^Usage: apply_filter' "$scratch/stdout" || fail "no usage in --help"
 
-refused 2 'There is no filter "Nonsense"' --filter Nonsense "$photograph" "$scratch/out.png"
-refused 2 'has no parameter "sigma"' "${bilateral[@]}" --set sigma=1 "$photograph" "$scratch/out.png"
+refused 2 'There is no filter "Nonsense"' --filter Nonsense "$photograph" "$output"
+refused 2 'has no parameter "sigma"' "${bilateral[@]}" --set sigma=1 "$photograph" "$output"
 refused 2 'The filter "SimpleBilateralCPU" does not run on gl (--list shows the targets)' --filter SimpleBilateralCPU \
-    --target gl "$photograph" "$scratch/out.png"
+    --target gl "$photograph" "$output"
 refused 2 'The filter "premultiply" does not run on cpu (--list shows the targets)' --filter premultiply \
-    "$photograph" "$scratch/out.png"
-refused 2 '--target is cpu or gl, not "gpu"' --target gpu --filter premultiply "$photograph" "$scratch/out.png"
-refused 2 'is of type float2, which "10" is not' "${bilateral[@]}" --set spatialSigma=10 "$photograph" "$scratch/out.png"
-refused 2 'is of type float, which "wide" is not' "${bilateral[@]}" --set rangeSigma=wide "$photograph" "$scratch/out.png"
-refused 2 'is of type bool, which "yes" is not' "${bilateral[@]}" --set colorize=yes "$photograph" "$scratch/out.png"
-refused 1 'no such file' "${bilateral[@]}" "$scratch/none.png" "$scratch/out.png"
-refused 1 'Cannot read' "${bilateral[@]}" "$0" "$scratch/out.png"
+    "$photograph" "$output"
+refused 2 '--target is cpu or gl, not "gpu"' --target gpu --filter premultiply "$photograph" "$output"
+refused 2 'is of type float2, which "10" is not' "${bilateral[@]}" --set spatialSigma=10 "$photograph" "$output"
+refused 2 'is of type float, which "wide" is not' "${bilateral[@]}" --set rangeSigma=wide "$photograph" "$output"
+refused 2 'is of type bool, which "yes" is not' "${bilateral[@]}" --set colorize=yes "$photograph" "$output"
+refused 1 'no such file' "${bilateral[@]}" "$scratch/none.png" "$output"
+refused 1 'Cannot read' "${bilateral[@]}" "$0" "$output"
 refused 1 'no such folder' "${bilateral[@]}" "$photograph" "$scratch/none/out.png"
 refused 1 'Cannot write' "${bilateral[@]}" "$photograph" "$scratch/out.nonsense"
 
 # A value outside its interval is a warning: the picture is written.
-rm -f "$scratch/out.png"
-"$program" "${bilateral[@]}" --set rangeSigma=2 "$photograph" "$scratch/out.png" 2> "$scratch/stderr" ||
+rm -f "$output"
+"$program" "${bilateral[@]}" --set rangeSigma=2 "$photograph" "$output" 2> "$scratch/stderr" ||
     fail "a value outside its interval is refused"
 grep -qF 'warning: rangeSigma=2 is outside 0.01 to 1' "$scratch/stderr" || fail "warning: $(cat "$scratch/stderr")"
-[ -s "$scratch/out.png" ] || fail "no picture after a warning"
+[ -s "$output" ] || fail "no picture after a warning"
 
-# An interrupt cancels the frame: no output, status 130.
-rm -f "$scratch/out.png"
-"$program" "${bilateral[@]}" --async --repeat 100000 "$photograph" "$scratch/out.png" > /dev/null 2> "$scratch/stderr" &
-program_id=$!
-for _ in $(seq 600); do # until it catches the signal: bit 14 of the mask
-    caught=$(sed -n 's/^SigCgt:\s*//p' "/proc/$program_id/status")
-    [ $((0x$caught & 0x4000)) -ne 0 ] && break
-    sleep 0.1
-done
-kill -TERM $program_id
-wait $program_id
-[ $? -eq 130 ] || fail "status of an interrupted run"
-grep -q 'cancelled, nothing was written' "$scratch/stderr" || fail "interrupt: $(cat "$scratch/stderr")"
-[ ! -e "$scratch/out.png" ] || fail "an output file after an interrupt"
+# An interrupt cancels the frame.
+interrupted TERM "${bilateral[@]}" --async --repeat 100000 "$photograph" "$output"
 
-[ $failures -eq 0 ] && echo "all passed"
-exit $failures
+finish
