@@ -87,11 +87,6 @@ double lightAt(std::int32_t step, std::int32_t nBits) {
     return static_cast<double>(std::bit_cast<float>(Scale::nBias_ + (step << Scale::nDroppedBits_) + nBits));
 }
 
-double clampedResult(ChannelCurve const& curve, double light) {
-    double const value = curve(light);
-    return value > 0.0 ? std::min(value, 1.0) : 0.0;
-}
-
 /// The entry of a step holds the result for the middle of its light; the first one is black's, the last one
 /// white's.
 std::vector<std::uint8_t> byteOutputTable(ChannelCurve const& curve) {
@@ -102,7 +97,7 @@ std::vector<std::uint8_t> byteOutputTable(ChannelCurve const& curve) {
                              : step == Scale::nLast_ ? 1.0
                                                      : lightAt<Scale>(step, 1 << (Scale::nDroppedBits_ - 1));
         aTable[static_cast<std::size_t>(step)] =
-            static_cast<std::uint8_t>(std::lround(clampedResult(curve, light) * 255.0));
+            static_cast<std::uint8_t>(std::lround(curve.clamped(light) * 255.0));
     }
     return aTable;
 }
@@ -113,7 +108,7 @@ std::vector<float> wordOutputTable(ChannelCurve const& curve) {
     std::vector<float> aTable(Scale::nLast_ + 2);
     for (std::int32_t step = 0; step <= Scale::nLast_; ++step) {
         double const light = step == 0 ? 0.0 : lightAt<Scale>(step, 0);
-        aTable[static_cast<std::size_t>(step)] = static_cast<float>(clampedResult(curve, light) * 32768.0);
+        aTable[static_cast<std::size_t>(step)] = static_cast<float>(curve.clamped(light) * 32768.0);
     }
     aTable.back() = aTable[Scale::nLast_];
     return aTable;

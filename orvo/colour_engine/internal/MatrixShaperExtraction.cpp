@@ -1,5 +1,6 @@
 #include "orvo/colour_engine/internal/MatrixShaperExtraction.h"
 
+#include "orvo/colour_engine/internal/CurveFormula.h"
 #include "orvo/colour_engine/internal/LcmsHandles.h"
 #include "orvo/colour_engine/internal/Profile.h"
 
@@ -100,10 +101,20 @@ Matrix whiteScale(Profile const& source, Profile const& destination) {
     return {from.X / to.X, 0.0, 0.0, 0.0, from.Y / to.Y, 0.0, 0.0, 0.0, from.Z / to.Z};
 }
 
-ChannelCurve curveFunction(CurveHandle spCurve) {
-    return ChannelCurve([spCurve = std::move(spCurve)](double x) {
-        return static_cast<double>(cmsEvalToneCurveFloat(spCurve.get(), static_cast<cmsFloat32Number>(x)));
-    });
+/// Nothing for a curve of entries or of several segments.
+std::optional<CurveFormula> formulaOf(cmsToneCurve const* pCurve) {
+    cmsInt32Number const type = cmsGetToneCurveParametricType(pCurve);
+    return type == 0 ? std::nullopt : curveFormula(type, cmsGetToneCurveParams(pCurve));
+}
+
+ChannelCurve channelCurve(CurveHandle spCurve) {
+    auto const formula = formulaOf(spCurve.get());
+    return ChannelCurve(
+        [spCurve = std::move(spCurve)](double x) {
+            return static_cast<double>(
+                cmsEvalToneCurveFloat(spCurve.get(), static_cast<cmsFloat32Number>(x)));
+        },
+        formula);
 }
 
 } // namespace
@@ -133,9 +144,9 @@ std::optional<MatrixShaper> extractMatrixShaper(Profile const& source, Profile c
             return std::nullopt;
         }
     }
-    return MatrixShaper{{curveFunction(aCurves[0]), curveFunction(aCurves[1]), curveFunction(aCurves[2])},
+    return MatrixShaper{{channelCurve(aCurves[0]), channelCurve(aCurves[1]), channelCurve(aCurves[2])},
                         matrix,
-                        {curveFunction(aCurves[3]), curveFunction(aCurves[4]), curveFunction(aCurves[5])}};
+                        {channelCurve(aCurves[3]), channelCurve(aCurves[4]), channelCurve(aCurves[5])}};
 }
 
 } // namespace ORVO::ColourEngine::Internal

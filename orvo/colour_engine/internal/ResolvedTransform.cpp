@@ -20,7 +20,7 @@ std::array<double, 3> evaluateShaper(MatrixShaper const& shaper, std::array<doub
     for (std::size_t i = 0; i < 3; ++i) {
         double const sum = shaper.aMatrix_[3 * i] * aLinear[0] + shaper.aMatrix_[3 * i + 1] * aLinear[1] +
                            shaper.aMatrix_[3 * i + 2] * aLinear[2];
-        aResult[i] = clampToUnit(shaper.aOutputCurves_[i](clampToUnit(sum)));
+        aResult[i] = shaper.aOutputCurves_[i].clamped(clampToUnit(sum));
     }
     return aResult;
 }
@@ -52,15 +52,18 @@ std::array<double, 3> evaluateCube(ColourCube const& cube, std::array<double, 3>
 
 } // namespace
 
-ChannelCurve::ChannelCurve(std::function<double(double)> function) : function_(std::move(function)) {}
+ChannelCurve::ChannelCurve(std::function<double(double)> function, std::optional<CurveFormula> const& formula)
+    : function_(std::move(function)), formula_(formula) {}
 
 double ChannelCurve::operator()(double x) const { return function_(x); }
+
+double ChannelCurve::clamped(double x) const { return clampToUnit(function_(x)); }
 
 std::vector<float> ChannelCurve::sample(std::size_t nEntries) const {
     std::vector<float> aTable(nEntries);
     for (std::size_t i = 0; i < nEntries; ++i) {
         double const x = static_cast<double>(i) / static_cast<double>(nEntries - 1);
-        aTable[i] = static_cast<float>(clampToUnit(function_(x)));
+        aTable[i] = static_cast<float>(clamped(x));
     }
     return aTable;
 }
@@ -69,7 +72,7 @@ std::vector<float> ChannelCurve::sampleOverRoot(std::size_t nEntries) const {
     std::vector<float> aTable(nEntries);
     for (std::size_t i = 0; i < nEntries; ++i) {
         double const root = static_cast<double>(i) / static_cast<double>(nEntries - 1);
-        aTable[i] = static_cast<float>(clampToUnit(function_(root * root)));
+        aTable[i] = static_cast<float>(clamped(root * root));
     }
     return aTable;
 }
