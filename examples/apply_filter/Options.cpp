@@ -5,7 +5,8 @@ namespace example {
 char const usageText[] = R"(Usage: apply_filter --filter NAME [options] INPUT OUTPUT
        apply_filter --list
 
-Runs one filter over a picture (PNG, JPEG, TIFF or EXR, 1 to 4 channels).
+Runs one filter over a picture (PNG, JPEG, TIFF or EXR, 1 to 4 channels). The output keeps the picture's ICC
+profile (but in EXR), unless the filter leads to other colours.
 
   --list               every filter with the targets it runs on, its inputs, parameters, defaults and bounds
   --filter NAME        the filter to run

@@ -164,11 +164,11 @@ MemoryUse TileFrame::memoryUse() const {
     TileFrameSettings const& settings = graph_->settings;
     std::size_t const channel = bytesPerChannel(settings.depth);
     std::size_t const pixel = workingChannels(settings) * channel;
-    // On the CPU four planes of floats; on OpenGL the copy, its texture, and textures and buffers of floats,
-    // which may be larger than the tile.
+    // On the CPU four planes of floats, which the store keeps; on OpenGL the copy, its texture, and textures
+    // and buffers of floats, which may be larger than the tile.
     std::size_t const work = settings.context ? 2 * pixel + 96 : 16 + (settings.channels < 3 ? pixel : 0);
     std::size_t const fixed = settings.context ? softwareDriver + unusedTextures : 0;
-    return {program + fixed, settings.channels * channel, pixel, work};
+    return {program + fixed, settings.channels * channel, pixel, work, settings.context ? work / 2 : work};
 }
 
 } // namespace example

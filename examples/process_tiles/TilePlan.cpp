@@ -58,13 +58,12 @@ std::size_t areaOf(Rectangle const& rectangle) {
            static_cast<std::size_t>(rectangle.extent().height());
 }
 
-// The frame is counted twice, for what is kept from one for the next.
 std::size_t bytesNeeded(Rectangle const& window, Rectangle const& picture, MemoryUse const& use) {
     int const width = picture.extent().width();
     auto const rows = static_cast<std::size_t>(
         std::min(window.extent().height() + use.rowUnit - 1, picture.extent().height()));
     return 2 * rows * static_cast<std::size_t>(width) * use.file +
-           areaOf(window) * (resultsInFlight * use.result + 2 * use.work);
+           areaOf(window) * (resultsInFlight * use.result + use.work + use.kept);
 }
 
 // A last strip of fewer than 16 pixels belongs to the tile before it.

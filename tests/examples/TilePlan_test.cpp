@@ -16,7 +16,7 @@ namespace example {
 namespace {
 
 constexpr std::size_t plenty = std::size_t(1) << 40U;
-constexpr MemoryUse rgb8 = {std::size_t(140) << 20U, 3, 3, 16};
+constexpr MemoryUse rgb8 = {std::size_t(140) << 20U, 3, 3, 16, 16};
 
 std::string tileRefusal(std::initializer_list<char const*> arguments) {
     std::vector<char const*> all{"process_tiles"};
@@ -104,11 +104,11 @@ TEST(TilePlan, ShortensTilesUntilTheyFitIntoMemory) {
     EXPECT_LT(heightWith(320), height);
     // The bands of whole rows fit, but not the frame of a tile that is 2048 pixels wide: one of 1280 takes
     // 1169 rows of 2 * 90,000 + 1466 * 848 bytes, 1587 MiB.
-    MemoryUse const costly = {0, 3, 16, 400};
+    MemoryUse const costly = {0, 3, 16, 400, 400};
     TilePlan const plan(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), costly, std::size_t(1600) << 20U);
     EXPECT_EQ(plan.tiles().front().extent(), ORVO::ExtentInPixelSpace(1280, 1024));
     // Read by 256 rows, 255 more have to be held twice: 44 MiB, for which 1600 do not suffice.
-    MemoryUse const byTiles = {0, 3, 16, 400, 256};
+    MemoryUse const byTiles = {0, 3, 16, 400, 400, 256};
     TilePlan const planByTiles(30000, 20000, 2048, gridReachOf(10.0F, 10.0F), byTiles,
                                std::size_t(1600) << 20U);
     EXPECT_EQ(planByTiles.tiles().front().extent(), ORVO::ExtentInPixelSpace(1024, 1024));

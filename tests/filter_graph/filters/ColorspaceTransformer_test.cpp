@@ -188,7 +188,8 @@ TEST_F(ColorspaceTransformerTest, ForwarderMakesATransformOnEachFrame) {
     // The unoptimised ones; the optimised one goes on to the node.
     EXPECT_EQ(2U, RecordingEngine::calls("UnReferenceTransform"));
     EXPECT_EQ(before.nProfiles, engineStatistics().nProfiles);
-    EXPECT_EQ(before.nTransforms + 1, engineStatistics().nTransforms);
+    // One at most: what an earlier graph had made between the two spaces is the same one.
+    EXPECT_GE(before.nTransforms + 1, engineStatistics().nTransforms);
     setCodes(filter, PROFILE_SRGB, PROFILE_DISPLAY_P3);
     spForwarder->forwardStuff();
     EXPECT_NE(pFirst, transformOfNode());

@@ -1,6 +1,7 @@
 // Random image graphs, every frame of which must equal, bit for bit, a plain recursive evaluation of the same
-// graph on the whole plane.
+// graph on the whole plane, also after a frame that was cancelled.
 
+#include "orvo/image_flow/filters/BufferCPU.h"
 #include "tests/image_flow/support/Compounds.h"
 #include "tests/support/ImageFlowLayers.h"
 
@@ -14,7 +15,6 @@ namespace ORVO {
 namespace {
 
 using DataFlow::Controller;
-using ORVO::Test::emitAll;
 using ORVO::Test::feed;
 using ORVO::Test::floatImage;
 using ORVO::Test::pixelAt;
@@ -26,12 +26,13 @@ using ImagePtr = std::unique_ptr<ImageCPU, ORVODeleter<ImageCPU>>;
 /// A picture on the whole plane: what is not there has no content.
 using Plane = std::map<std::pair<int, int>, float>; // by row and column
 
-/// One node: a source with its image, or a filter with its producers, at times in a compound or two.
+/// One node: a source with its image, a filter with its producers, at times in a compound or two, or a
+/// buffer.
 struct Member {
     std::unique_ptr<ImageCPUInput> upSource_;
     ImagePtr upImage_;
     std::unique_ptr<ImageFilter> upFilter_;
-    TestFilter* pFilter_ = nullptr;
+    TestFilter* pFilter_ = nullptr; // none for sources and buffers
     std::vector<std::size_t> aProducers_;
     bool bConsumed_ = false;
 
@@ -64,10 +65,15 @@ public:
         int const y = int(pick(24)) - 12;
         int const width = 1 + int(pick(16));
         int const height = 1 + int(pick(16));
-        oController_.flushGraph();
-        emitAll(oController_);
-        oController_.computeRegions(world(float(x), float(y), float(width), float(height)));
         oController_.setSingleThreadMode(pick(3) == 0);
+        if (pick(4) == 0) {
+            prepare(world(float(x), float(y), float(width), float(height)));
+            oController_.processAsync();
+            oController_.cancelProcess();
+            ASSERT_TRUE(oController_.wait(60, 0.0002));
+            oController_.checkException();
+        }
+        prepare(world(float(x), float(y), float(width), float(height)));
         if (pick(2) == 0) {
             oController_.process();
         } else {
@@ -80,6 +86,17 @@ public:
 
 private:
     std::size_t pick(std::size_t n) { return std::uniform_int_distribution<std::size_t>(0, n - 1)(oRandom_); }
+
+    void prepare(PositionExtentInWorldSpace const& region) {
+        oController_.flushGraph();
+        for (Member& member : aMembers_) {
+            // Not the buffers, which would give again what they gave before.
+            if (member.upSource_) {
+                member.upSource_->emit();
+            }
+        }
+        oController_.computeRegions(region);
+    }
 
     void add(std::size_t iMember, bool bLast) {
         aMembers_.emplace_back();
@@ -99,11 +116,15 @@ private:
             member.upSource_ = std::make_unique<ImageCPUInput>();
             newImage(member);
         } else {
-            auto upFilter = std::make_unique<TestFilter>(member.aProducers_.size());
-            member.pFilter_ = upFilter.get();
-            member.pFilter_->iRadius_ = int(pick(3));
-            member.upFilter_ =
-                member.aProducers_.size() == 1 ? atTimesInside(std::move(upFilter)) : std::move(upFilter);
+            if (member.aProducers_.size() == 1 && !bLast && pick(5) == 0) {
+                member.upFilter_ = std::make_unique<BufferCPU>();
+            } else {
+                auto upFilter = std::make_unique<TestFilter>(member.aProducers_.size());
+                member.pFilter_ = upFilter.get();
+                member.pFilter_->iRadius_ = int(pick(3));
+                member.upFilter_ =
+                    member.aProducers_.size() == 1 ? atTimesInside(std::move(upFilter)) : std::move(upFilter);
+            }
             for (std::size_t i = 0; i < member.aProducers_.size(); ++i) {
                 aMembers_[member.aProducers_[i]].bConsumed_ = true;
                 feed(*member.upFilter_, i, aMembers_[member.aProducers_[i]].node());
@@ -137,7 +158,7 @@ private:
         if (member.upSource_) {
             oController_.flushGraph(); // outputs let go of the image
             newImage(member);
-        } else {
+        } else if (member.pFilter_ != nullptr) {
             member.pFilter_->oOffset_.setValue(float(pick(100)) / 8);
             member.pFilter_->iRadius_ = int(pick(3));
         }
@@ -157,6 +178,9 @@ private:
                 }
             }
             return result;
+        }
+        if (member.pFilter_ == nullptr) {
+            return aPlanes[member.aProducers_[0]];
         }
         std::vector<Plane> aInputs;
         PositionExtentInWorldSpace domain;

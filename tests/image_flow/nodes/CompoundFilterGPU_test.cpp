@@ -7,6 +7,7 @@
 #include <random>
 
 #include "orvo/core/exceptions/SharedException.h"
+#include "orvo/core/memory/AllocationFailure.h"
 #include "orvo/core/memory/MemoryStatistics.h"
 #include "orvo/image_flow/filters/BufferGPU.h"
 #include "orvo/image_flow/filters/ConstTeeJointGPU.h"
@@ -181,6 +182,32 @@ TEST_P(CompoundFilterGPUTest, EveryCallThatFailsCrossesTheLevelsAndLeavesTheNext
         EXPECT_NE(nullptr, dynamic_cast<OGL::ExceptionOGL const*>(shared.exception().get()));
     }
     graph.expectRight();
+}
+
+TEST_P(CompoundFilterGPUTest, EveryAllocationThatFailsLeavesTheNextFrameRight) {
+    TextureCompoundGraph graph(frameContext(), GetParam());
+    graph.expectRight();
+    graph.expectRight();
+    ObjectCounts const objects = GLHooks::objects();
+    std::size_t const nBlocks = Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT);
+    std::uint64_t n = 1;
+    for (bool bMore = true; bMore && n < 200; ++n) {
+        {
+            Core::AllocationFailure const failure(n);
+            try {
+                graph.run();
+            } catch (std::bad_alloc const&) {
+                EXPECT_TRUE(failure.hasFired());
+            }
+            bMore = failure.hasFired();
+        }
+        EXPECT_EQ(GLenum(GL_NO_ERROR), glGetError());
+        graph.expectRight();
+        EXPECT_EQ(objects, GLHooks::objects()) << n;
+        EXPECT_EQ(nBlocks, Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT)) << n;
+    }
+    EXPECT_GT(n, 3U);
+    EXPECT_LT(n, 200U);
 }
 
 TEST_P(CompoundFilterGPUTest, CancellationCrossesTheLevels) {
