@@ -44,9 +44,7 @@ Node::Node(std::string const& sName) : sName_(sName) { debugAddNode(this, sName_
 
 Node::~Node() {
     // A node that outlives the library has lost its number already; a destructor reports nothing.
-    if (pIndexMap_ != nullptr) {
-        pIndexMap_->erase(this);
-    }
+    debugForgetNode(this);
 }
 
 void Node::debugWrite(std::ostream& oStream) const {

@@ -36,9 +36,10 @@ class ParameterBase;
 /// Nodes belong to whoever built the graph. They live between `DataFlow::Library::initialize` and
 /// `terminate`, and are disconnected before they die.
 ///
-/// Threads: nodes are constructed, renamed, connected and destroyed by one thread at a time, while no frame
-/// runs. During a frame the thread that holds the node's lock runs it; `processSlice` runs on many threads at
-/// once; `isProcessing` may be asked by any thread.
+/// Threads: the nodes of one graph are constructed, renamed, connected and destroyed by one thread at a time,
+/// while no frame of theirs runs; graphs are independent of each other. During a frame the thread that holds
+/// the node's lock runs it; `processSlice` runs on many threads at once; `isProcessing` may be asked by any
+/// thread.
 class ORVO_API Node {
 public:
     /// Mark of a graph traversal.
@@ -266,8 +267,11 @@ private:
 
     using IndexMap = std::map<Node const*, int>;
 
-    /// The node's entry in the map, with the failures of `debugRemoveNode`.
+    /// The node's entry in the map, with the failures of `debugRemoveNode`. The caller has locked the maps.
     static IndexMap::iterator indexEntry(Node const* pNode);
+
+    /// Forgets the node's number, if it has one.
+    static void debugForgetNode(Node const* pNode) noexcept;
 
     /// `debugRemoveNode` and `debugAddNode` in one, which changes nothing if it throws.
     static void debugRenumberNode(Node const* pNode, std::string const& sName);

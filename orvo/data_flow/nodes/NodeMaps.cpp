@@ -5,13 +5,24 @@
 #include "orvo/core/Check.h"
 
 #include <memory>
+#include <mutex>
 
 namespace ORVO::DataFlow {
+
+namespace {
+
+// Graphs are independent of each other, also where several threads build them at once: these maps are all
+// that their nodes share.
+std::mutex oNodeMapsLock;
+using NodeMapsGuard = std::lock_guard<std::mutex>;
+
+} // namespace
 
 Node::IndexMap* Node::pIndexMap_ = nullptr;
 std::map<std::string, int>* Node::pNameCounter_ = nullptr;
 
 void Node::initializeNodeMaps() {
+    NodeMapsGuard const guard(oNodeMapsLock);
     ORVO_CHECK(!pIndexMap_);
     ORVO_CHECK(!pNameCounter_);
     auto spIndexMap = std::make_unique<IndexMap>();
@@ -20,6 +31,7 @@ void Node::initializeNodeMaps() {
 }
 
 void Node::terminateNodeMaps() {
+    NodeMapsGuard const guard(oNodeMapsLock);
     ORVO_CHECK(pIndexMap_);
     ORVO_CHECK(pNameCounter_);
     delete pIndexMap_;
@@ -29,6 +41,7 @@ void Node::terminateNodeMaps() {
 }
 
 void Node::debugAddNode(Node const* pNode, std::string const& sName) {
+    NodeMapsGuard const guard(oNodeMapsLock);
     ORVO_CHECK(pIndexMap_);
     ORVO_CHECK(pIndexMap_->find(pNode) == pIndexMap_->end(),
                "pIndexMap_->find( pNode ) == pIndexMap_->end()");
@@ -38,17 +51,29 @@ void Node::debugAddNode(Node const* pNode, std::string const& sName) {
 }
 
 void Node::debugRemoveNode(Node const* pNode) {
+    NodeMapsGuard const guard(oNodeMapsLock);
     // Found first: without the maps there is nothing to erase from.
     auto const it = indexEntry(pNode);
     pIndexMap_->erase(it);
 }
 
+void Node::debugForgetNode(Node const* pNode) noexcept {
+    NodeMapsGuard const guard(oNodeMapsLock);
+    if (pIndexMap_ != nullptr) {
+        pIndexMap_->erase(pNode);
+    }
+}
+
 void Node::debugRenumberNode(Node const* pNode, std::string const& sName) {
+    NodeMapsGuard const guard(oNodeMapsLock);
     auto const it = indexEntry(pNode);
     it->second = (*pNameCounter_)[sName]++;
 }
 
-int Node::index(Node const* pNode) { return indexEntry(pNode)->second; }
+int Node::index(Node const* pNode) {
+    NodeMapsGuard const guard(oNodeMapsLock);
+    return indexEntry(pNode)->second;
+}
 
 Node::IndexMap::iterator Node::indexEntry(Node const* pNode) {
     ORVO_CHECK(pIndexMap_);

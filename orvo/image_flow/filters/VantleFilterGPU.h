@@ -23,15 +23,15 @@ class VantleShaderAdapter;
 ///
 /// The parameter "Transform" holds the `VantleTransform*`, on which the filter keeps a reference of its own
 /// from the frame on that first runs with it. A null transform, and one that the engine has no shader for,
-/// draw the input with a red diagonal; in the second case every frame asks the engine again, which may have
-/// come back. The parameter "Vantle Options" is there for hosts; changing it rebuilds nothing.
+/// draw the input with a red diagonal; in the second case each run asks the engine again, which may have come
+/// back. The parameter "Vantle Options" is there for hosts; changing it rebuilds nothing.
 ///
 /// Where the parameter "Grey Result" is set, the green result goes into red, green and blue: a picture of one
 /// or two channels is read from red, and grey through a transform is green at its end, as on the CPU.
 ///
 /// The program is generated and the tables are made when a frame finds another transform than the last one
-/// did, another binding of an engine, or "Grey Result" changed. Other frames ask the engine for nothing, link
-/// nothing and make no texture.
+/// did, or another binding of an engine, or "Grey Result" changed. Other frames ask the engine for nothing,
+/// link nothing and make no texture.
 ///
 /// Threads: as BasicGLShaderFilter. All frames run in contexts of one share group.
 class ORVO_API VantleFilterGPU : public BasicGLShaderFilter {

@@ -10,7 +10,10 @@
 
 #include <memory>
 #include <optional>
+#include <set>
 #include <string>
+#include <thread>
+#include <vector>
 
 namespace {
 
@@ -44,6 +47,32 @@ TEST_F(NodeMapsTest, NodesOfOneNameAreNumbered) {
     Node const oThird("blur");
     EXPECT_EQ("blur [2]", oThird.debugId());
     EXPECT_EQ("blur [1]", oSecond.debugId());
+}
+
+TEST_F(NodeMapsTest, NoNumberIsGivenTwiceOnManyThreads) {
+    constexpr int nThreads = 4;
+    constexpr int nNodes = 200;
+    std::vector<std::set<std::string>> aIds(nThreads);
+    std::vector<std::thread> aThreads;
+    aThreads.reserve(nThreads);
+    for (std::set<std::string>& ids : aIds) {
+        aThreads.emplace_back([&ids] {
+            Node const kept("blur");
+            ids.insert(kept.debugId());
+            for (int i = 0; i < nNodes; ++i) {
+                Node node("other");
+                node.setName("blur");
+                ids.insert(node.debugId());
+            }
+        });
+    }
+    std::set<std::string> all;
+    for (int i = 0; i < nThreads; ++i) {
+        aThreads[std::size_t(i)].join();
+        all.merge(aIds[std::size_t(i)]);
+    }
+    EXPECT_EQ(std::size_t(nThreads * (nNodes + 1)), all.size());
+    EXPECT_EQ("other [800]", Node("other").debugId());
 }
 
 TEST_F(NodeMapsTest, EmptyAndStrangeNamesAreNumberedToo) {

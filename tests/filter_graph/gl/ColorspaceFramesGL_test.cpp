@@ -15,9 +15,9 @@ namespace {
 using namespace ORVO::Test;
 using namespace ORVO::ColourEngine;
 
-class ColourFramesGL : public GLFrameTest {};
+class ColorspaceFramesGL : public GLFrameTest {};
 
-TEST_F(ColourFramesGL, GreyGoesInAsRGBAndComesOutAsGreen) {
+TEST_F(ColorspaceFramesGL, GreyGoesInAsRGBAndComesOutAsGreen) {
     UnevenProfile const profile;
     for (GreyRow const& row : greyRows()) {
         SCOPED_TRACE(row.pName_);
@@ -30,7 +30,7 @@ TEST_F(ColourFramesGL, GreyGoesInAsRGBAndComesOutAsGreen) {
     }
 }
 
-TEST_F(ColourFramesGL, GreenGoesThroughOtherFiltersIntoGrey) {
+TEST_F(ColorspaceFramesGL, GreenGoesThroughOtherFiltersIntoGrey) {
     UnevenProfile const profile;
     GreyRow const& row = greyRows()[5]; // RGB to grey
     PackedImage<std::uint8_t> input(16, 16, row.nInput_);
@@ -44,7 +44,7 @@ TEST_F(ColourFramesGL, GreenGoesThroughOtherFiltersIntoGrey) {
     expectResultOf(row, input.pixels(), output.pixels());
 }
 
-TEST_F(ColourFramesGL, AGreyTextureOfTheHostsGetsGreen) {
+TEST_F(ColorspaceFramesGL, AGreyTextureOfTheHostsGetsGreen) {
     UnevenProfile const profile;
     GreyRow const& row = greyRows()[5]; // RGB to grey
     PackedImage<std::uint8_t> input(16, 16, row.nInput_);
@@ -63,7 +63,7 @@ TEST_F(ColourFramesGL, AGreyTextureOfTheHostsGetsGreen) {
 }
 
 // Another image at the graph's end makes another result of the same transform.
-TEST_F(ColourFramesGL, TheImageAtTheEndDecides) {
+TEST_F(ColorspaceFramesGL, TheImageAtTheEndDecides) {
     UnevenProfile const profile;
     PackedImage<std::uint8_t> input(16, 16, 1);
     fillWithLightColours(input);
@@ -84,7 +84,7 @@ TEST_F(ColourFramesGL, TheImageAtTheEndDecides) {
     }
 }
 
-TEST_F(ColourFramesGL, InBytesThereAndBackIsAsFarAsBytesCarry) {
+TEST_F(ColorspaceFramesGL, InBytesThereAndBackIsAsFarAsBytesCarry) {
     PackedImage<std::uint8_t> input(64, 64);
     PackedImage<std::uint8_t> output(64, 64);
     GLColourGraph graph(context(), input.handle(), output.handle(), roundTrip());

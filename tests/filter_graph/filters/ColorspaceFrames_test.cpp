@@ -16,7 +16,7 @@ namespace {
 using namespace ORVO::Test;
 using namespace ORVO::ColourEngine;
 
-class ColourFramesCPU : public FrameTest {};
+class ColorspaceFrames : public FrameTest {};
 
 template <typename T>
 void expectGreyRows() {
@@ -30,12 +30,12 @@ void expectGreyRows() {
     }
 }
 
-TEST_F(ColourFramesCPU, GreyGoesInAsRGBAndComesOutAsGreen) {
+TEST_F(ColorspaceFrames, GreyGoesInAsRGBAndComesOutAsGreen) {
     expectGreyRows<std::uint8_t>();
     expectGreyRows<std::uint16_t>();
 }
 
-TEST_F(ColourFramesCPU, InBytesThereAndBackIsAsFarAsBytesCarry) {
+TEST_F(ColorspaceFrames, InBytesThereAndBackIsAsFarAsBytesCarry) {
     CPUColourGraph<std::uint8_t> graph(64, 64, roundTrip());
     for (RoundTripRow const& row : roundTripRows()) {
         SCOPED_TRACE(row.pName_);
@@ -47,7 +47,7 @@ TEST_F(ColourFramesCPU, InBytesThereAndBackIsAsFarAsBytesCarry) {
 
 // Each thread has a graph of its own, and all of them come for one transform at once, which nobody has asked
 // for before.
-TEST_F(ColourFramesCPU, FramesOnManyThreadsShareATransform) {
+TEST_F(ColorspaceFrames, FramesOnManyThreadsShareATransform) {
     constexpr int kThreads = 4;
     constexpr int kFrames = 8;
     UnevenProfile const profile;
