@@ -149,8 +149,10 @@ std::string describeCube(ColourCube const& cube, ShaderParameters& aParameters) 
     if (cube.oSpacing_.has_value()) {
         std::string const sTable =
             addCurve(aParameters, "orvoSpacing", cube.oSpacing_->sample(nCurveEntries));
-        sBody += "    color.rgb = vec3(orvoCurve(" + sTable + ", color.r), orvoCurve(" + sTable +
-                 ", color.g), orvoCurve(" + sTable + ", color.b));\n";
+        sBody += "    vec3 code = clamp(color.rgb, 0.0, 1.0);\n"
+                 "    color.rgb = vec3(orvoCurve(" +
+                 sTable + ", code.r), orvoCurve(" + sTable + ", code.g), orvoCurve(" + sTable +
+                 ", code.b));\n";
     }
     // From the middle of the first texel to the middle of the last one.
     sBody += "    color.rgb = texture3D(orvoCube, color.rgb * (32.0 / 33.0) + 0.5 / 33.0).rgb;\n";
