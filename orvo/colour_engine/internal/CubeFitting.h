@@ -1,6 +1,7 @@
 #pragma once
 
 #include "orvo/colour_engine/internal/ColourCube.h"
+#include "orvo/core/Export.h"
 
 #include <array>
 #include <functional>
@@ -14,9 +15,9 @@ using ColourFunction = std::function<std::array<double, 3>(std::array<double, 3>
 /// transform bends, with results in the nodes or, where the transform ends in curves, with what goes into
 /// these, as lightness and not clamped, so that neither the curves nor the border of the gamut bend what is
 /// interpolated. Which one is chosen by the error of trilinear interpolation over some thousand colours.
-ColourCube fitCube(TableStages const& aStages);
+ORVO_API ColourCube fitCube(TableStages const& aStages);
 
 /// The same for any transform into 0..1, with results in the nodes.
-ColourCube fitCube(ColourFunction const& exact);
+ORVO_API ColourCube fitCube(ColourFunction const& exact);
 
 } // namespace ORVO::ColourEngine::Internal

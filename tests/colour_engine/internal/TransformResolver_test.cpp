@@ -208,8 +208,6 @@ TEST(TransformResolver, TakesTheStepsOfTables) {
             Road const road(tables.handle(), spSRGB->handle(), intent,
                             options != 0 ? cmsFLAGS_BLACKPOINTCOMPENSATION : 0);
             EXPECT_LT(largestDifference(*spTransform, road), 2.0 / 32768.0);
-            ASSERT_NE(nullptr, spTransform->colourCube());
-            EXPECT_EQ(3u * 33 * 33 * 33, spTransform->colourCube()->aValues_.size());
         }
     }
     EXPECT_THROW(resolveTransform(*spSRGB, tables, 0, 0), std::runtime_error);

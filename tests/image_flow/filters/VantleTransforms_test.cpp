@@ -5,11 +5,13 @@
 #include "tests/image_flow/support/ShaderRoad.h"
 
 #include "orvo/colour_engine/ProfileCodes.h"
+#include "orvo/colour_engine/ProfileRegistry.h"
 #include "orvo/colour_engine/VantlePackingSpec.h"
 #include "orvo/colour_engine/internal/Applier.h"
 #include "orvo/colour_engine/internal/ResolvedTransform.h"
 #include "orvo/colour_engine/internal/ShaderDescription.h"
 #include "orvo/image_flow/colour/CVantle.h"
+#include "tests/colour_engine/support/TableProfiles.h"
 #include "tests/support/RecordingEngine.h"
 
 namespace {
@@ -233,6 +235,38 @@ TEST_F(VantleTransformsTest, CubesAreInterpolated) {
     });
     Texels const expected = pictureOf(aOnCPU, 32768.0);
     EXPECT_LE(errorsOf(actual, input, [&](int x, int y) { return expected.at(x, y); }).dLargest_, 1e-3);
+}
+
+/// Profiles of tables are cubes on the GPU alone. Whose error is stated: mean and largest, against what the
+/// CPU makes of the profile's own tables.
+TEST_F(VantleTransformsTest, ProfilesOfTablesAreNearTheCPU) {
+    struct Row {
+        char const* name;
+        TableRecipe source;
+        std::uint32_t destination;
+        double mean;
+        double largest;
+    };
+    auto const aColours = colours<std::uint16_t>(32768);
+    Texels const input = pictureOf(aColours, 32768.0);
+    Road road(frameContext(), input, ImageGPU::PIXEL_FORMAT_RGBA32F,
+              ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT);
+    for (Row const& row : {Row{"camera", {true, 17, labOfCamera}, PROFILE_SRGB, 3e-4, 0.008},
+                           Row{"sRGB", {true, 33, labOfSRGB}, PROFILE_SRGB, 4e-4, 0.006},
+                           Row{"camera, linear", {true, 17, labOfCamera}, PROFILE_LINEAR_SRGB, 4e-4, 0.015},
+                           Row{"sRGB, wide gamut", {true, 33, labOfSRGB}, PROFILE_WIDE_GAMUT, 4e-4, 0.03}}) {
+        SCOPED_TRACE(row.name);
+        constexpr std::uint32_t iCode = profileCode("Tabl");
+        Bytes const aBytes = tableProfile(row.source);
+        registerProfile(iCode, aBytes.data(), aBytes.size());
+        EngineTransform const transform(iCode, row.destination);
+        EXPECT_TRUE(unregisterProfile(iCode));
+        Texels const expected = pictureOf(onCPU(aColours, transform), 32768.0);
+        Errors const errors =
+            errorsOf(road.run(transform.get()), input, [&](int x, int y) { return expected.at(x, y); });
+        EXPECT_LE(errors.dMean_, row.mean);
+        EXPECT_LE(errors.dLargest_, row.largest);
+    }
 }
 
 } // namespace
