@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <chrono>
 #include <cstddef>
+#include <ctime>
 #include <vector>
 
 namespace ORVO::Benchmarks {
@@ -14,6 +15,15 @@ double secondsOf(Work const& work) {
     auto const start = std::chrono::steady_clock::now();
     work();
     return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+}
+
+/// Seconds that the work takes on all of the process's threads together: what else the machine does hardly
+/// counts. A software driver draws on threads of the process.
+template <class Work>
+double processorSecondsOf(Work const& work) {
+    std::clock_t const start = std::clock();
+    work();
+    return static_cast<double>(std::clock() - start) / CLOCKS_PER_SEC;
 }
 
 /// The upper median; there is at least one value.

@@ -1,8 +1,10 @@
 #include "orvo/colour_engine/EmbeddedEngine.h"
 
 #include "orvo/colour_engine/ProfileCodes.h"
+#include "orvo/colour_engine/ProfileRegistry.h"
 #include "orvo/colour_engine/VantleShaderParameterData.h"
 #include "tests/colour_engine/support/Engine.h"
+#include "tests/colour_engine/support/ICCProfiles.h"
 
 #include <array>
 #include <atomic>
@@ -196,7 +198,12 @@ std::string textOf(Engine const& engine, VantleString* pString) {
 TEST(EmbeddedEngine, DescribesATransformAsAShader) {
     NothingLeft const nothingLeft;
     Engine const engine;
-    VantleTransform* const pTransform = engine.transform(PROFILE_SRGB, PROFILE_WIDE_GAMUT);
+    // Curves that are given as tables stay tables in the shader.
+    constexpr std::uint32_t iCode = profileCode("File");
+    auto const aBytes = ORVO::Test::sampledProfile();
+    registerProfile(iCode, aBytes.data(), aBytes.size());
+    VantleTransform* const pTransform = engine.transform(iCode, PROFILE_WIDE_GAMUT);
+    EXPECT_TRUE(unregisterProfile(iCode));
     VantleShader* pShader = nullptr;
     ASSERT_EQ(0u, engine.NewShader(VANTLE_SHADER_FAMILY, pTransform, nullptr, &pShader));
     // The shader needs its transform no more.
@@ -223,7 +230,7 @@ TEST(EmbeddedEngine, DescribesATransformAsAShader) {
 
     std::uint32_t nParameters = 0;
     EXPECT_EQ(0u, engine.NumParameters(pShader, &nParameters));
-    EXPECT_GT(nParameters, 0u);
+    ASSERT_EQ(2u, nParameters) << "the table of the input curves, and the matrix";
     for (std::uint32_t i = 0; i < nParameters; ++i) {
         _t_Vantle_ShaderParameterData data{};
         ASSERT_EQ(0u, engine.Parameter(pShader, i, &data));

@@ -1,5 +1,6 @@
 #include "orvo/colour_engine/internal/ProfileTags.h"
 
+#include "orvo/colour_engine/internal/CurveFormula.h"
 #include "orvo/colour_engine/internal/Profile.h"
 
 #include <cmath>
@@ -40,6 +41,12 @@ cmsCIEXYZ mediaWhite(cmsHPROFILE pProfile) {
     bool const bOldDisplay =
         cmsGetProfileVersion(pProfile) < 4.0 && cmsGetDeviceClass(pProfile) == cmsSigDisplayClass;
     return pWhite == nullptr || bOldDisplay ? *cmsD50_XYZ() : *pWhite;
+}
+
+/// Nothing for a curve of entries or of several segments.
+std::optional<CurveFormula> formulaOf(cmsToneCurve const* pCurve) {
+    cmsInt32Number const type = cmsGetToneCurveParametricType(pCurve);
+    return type == 0 ? std::nullopt : curveFormula(type, cmsGetToneCurveParams(pCurve));
 }
 
 } // namespace
@@ -92,9 +99,13 @@ Matrix whiteScale(Profile const& source, Profile const& destination) {
 }
 
 ChannelCurve curveFunction(CurveHandle spCurve) {
-    return ChannelCurve([spCurve = std::move(spCurve)](double x) {
-        return static_cast<double>(cmsEvalToneCurveFloat(spCurve.get(), static_cast<cmsFloat32Number>(x)));
-    });
+    auto const formula = formulaOf(spCurve.get());
+    return ChannelCurve(
+        [spCurve = std::move(spCurve)](double x) {
+            return static_cast<double>(
+                cmsEvalToneCurveFloat(spCurve.get(), static_cast<cmsFloat32Number>(x)));
+        },
+        formula);
 }
 
 } // namespace ORVO::ColourEngine::Internal

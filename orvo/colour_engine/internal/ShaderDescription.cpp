@@ -1,10 +1,14 @@
 #include "orvo/colour_engine/internal/ShaderDescription.h"
 
 #include "orvo/colour_engine/internal/ResolvedTransform.h"
+#include "orvo/colour_engine/internal/ShaderCurve.h"
+#include "orvo/colour_engine/internal/ShaderNumber.h"
 
 #include <algorithm>
 #include <array>
+#include <cmath>
 #include <cstdint>
+#include <optional>
 #include <utility>
 
 namespace ORVO::ColourEngine::Internal {
@@ -29,7 +33,8 @@ constexpr char const* pShaderEntryPoint = "orvoColourTransform";
 constexpr std::size_t nCurveEntries = 4096;
 
 /// The driver would interpolate a table of floats in half precision, if at all, so the two neighbours are
-/// read one by one: the texel n lies at (n + 0.5) / 4096, and beyond the last one the last is read.
+/// read one by one: the texel n lies at (n + 0.5) / 4096, and beyond the last one the last is read. x is from
+/// 0 to 1 before; a driver that knows it from the clamp here reads the texels faster.
 constexpr char const* pCurveFunction = "float orvoCurve(sampler1D table, float x) {\n"
                                        "    float position = clamp(x, 0.0, 1.0) * 4095.0;\n"
                                        "    float entry = floor(position);\n"
@@ -97,28 +102,114 @@ std::string entryFunction(std::string const& sBody) {
     return std::string("void ") + pShaderEntryPoint + "(inout vec4 color) {\n" + sBody + "}\n";
 }
 
+/// The curves of one side of the matrix as GLSL expressions: those that can be computed as functions, each
+/// different one once, and the others as tables.
+class CurveExpressions {
+public:
+    explicit CurveExpressions(ShaderParameters& aParameters) : aParameters_(aParameters) {}
+
+    /// What gives the curve at sArgument. The table is over sArgument itself, or over its square root.
+    std::string input(std::optional<ShaderCurve> const& computed, ChannelCurve const& curve, std::size_t i,
+                      std::string const& sArgument) {
+        if (computed.has_value()) {
+            return call(*computed, "orvoInputCurve" + std::to_string(i), sArgument);
+        }
+        return lookUp("orvoInput" + std::to_string(i), curve.sample(nCurveEntries), sArgument);
+    }
+    std::string output(std::optional<ShaderCurve> const& computed, ChannelCurve const& curve, std::size_t i,
+                       std::string const& sArgument) {
+        if (computed.has_value()) {
+            return call(*computed, "orvoOutputCurve" + std::to_string(i), sArgument);
+        }
+        // The output curves are steep near black: by the square root of the light, the entries are close
+        // there.
+        return lookUp("orvoOutput" + std::to_string(i), curve.sampleOverRoot(nCurveEntries),
+                      "sqrt(" + sArgument + ")");
+    }
+
+    /// The functions that the expressions call.
+    std::string functions() const {
+        std::string sText = bTables_ ? pCurveFunction : "";
+        for (auto const& [sBody, sName] : aFunctions_) {
+            sText += "float " + sName + "(float x) {\n" + sBody + "}\n";
+        }
+        return sText;
+    }
+
+private:
+    std::string call(ShaderCurve const& curve, std::string const& sName, std::string const& sArgument) {
+        if (curve.isIdentity()) {
+            return sArgument;
+        }
+        std::string const sBody = curve.body();
+        auto iSame = std::find_if(aFunctions_.begin(), aFunctions_.end(),
+                                  [&](auto const& function) { return function.first == sBody; });
+        if (iSame == aFunctions_.end()) {
+            iSame = aFunctions_.emplace(iSame, sBody, sName);
+        }
+        return iSame->second + "(" + sArgument + ")";
+    }
+    std::string lookUp(std::string const& sName, std::vector<float> aTable, std::string const& sArgument) {
+        bTables_ = true;
+        return "orvoCurve(" + addCurve(aParameters_, sName, std::move(aTable)) + ", " + sArgument + ")";
+    }
+
+    ShaderParameters& aParameters_;
+    std::vector<std::pair<std::string, std::string>> aFunctions_; ///< body and name
+    bool bTables_ = false;
+};
+
+/// The matrix as GLSL has it, by columns.
+std::string matrixText(std::array<double, 9> const& aMatrix) {
+    // What rounding has left of a zero is no work for the shader.
+    constexpr double dRounding = 1e-12;
+    std::string sText;
+    for (std::size_t column = 0; column < 3; ++column) {
+        for (std::size_t row = 0; row < 3; ++row) {
+            double const element = aMatrix[3 * row + column];
+            sText += (sText.empty() ? "mat3(" : ", ") +
+                     shaderNumber(std::abs(element) < dRounding ? 0.0 : element);
+        }
+    }
+    return sText + ")";
+}
+
 std::string describeShaper(MatrixShaper const& shaper, ShaderParameters& aParameters) {
     constexpr std::array<char const*, 3> aChannels{"r", "g", "b"};
+    std::array<std::optional<ShaderCurve>, 3> aInputs;
+    std::array<std::optional<ShaderCurve>, 3> aOutputs;
+    bool bTables = false;
+    bool bComputedResults = false;
+    for (std::size_t i = 0; i < 3; ++i) {
+        aInputs[i] = ShaderCurve::ofInput(shaper.aInputCurves_[i]);
+        aOutputs[i] = ShaderCurve::ofOutput(shaper.aOutputCurves_[i]);
+        bTables = bTables || !aInputs[i].has_value() || !aOutputs[i].has_value();
+        bComputedResults = bComputedResults || (aOutputs[i].has_value() && !aOutputs[i]->isIdentity());
+    }
+    CurveExpressions expressions(aParameters);
     std::string sInputs;
+    for (std::size_t i = 0; i < 3; ++i) {
+        sInputs += (i > 0 ? ", " : "") + expressions.input(aInputs[i], shaper.aInputCurves_[i], i,
+                                                           std::string("code.") + aChannels[i]);
+    }
+    // A uniform is read again for each group of pixels, by drivers that compute on the processor: nine
+    // numbers cost as much as three curves there. Where textures have to be bound anyway, the matrix goes
+    // with them.
+    std::string const sMatrix =
+        bTables ? addMatrix(aParameters, shaper.aMatrix_) : matrixText(shaper.aMatrix_);
     std::string sOutputs;
     for (std::size_t i = 0; i < 3; ++i) {
-        std::string const sTable = addCurve(aParameters, "orvoInput" + std::to_string(i),
-                                            shaper.aInputCurves_[i].sample(nCurveEntries));
-        sInputs += std::string(i > 0 ? ", " : "") + "orvoCurve(" + sTable + ", color." + aChannels[i] + ")";
+        sOutputs += (i > 0 ? ", " : "") + expressions.output(aOutputs[i], shaper.aOutputCurves_[i], i,
+                                                             std::string("light.") + aChannels[i]);
     }
-    std::string const sMatrix = addMatrix(aParameters, shaper.aMatrix_);
-    for (std::size_t i = 0; i < 3; ++i) {
-        std::string const sTable = addCurve(aParameters, "orvoOutput" + std::to_string(i),
-                                            shaper.aOutputCurves_[i].sampleOverRoot(nCurveEntries));
-        sOutputs += std::string(i > 0 ? ", " : "") + "orvoCurve(" + sTable + ", root." + aChannels[i] + ")";
-    }
-    // The output curves are steep near black: by the square root of the light, the entries are close there.
-    return declarationsOf(aParameters) + pCurveFunction +
-           entryFunction("    vec3 light = clamp(" + sMatrix + " * vec3(" + sInputs +
+    sOutputs = "vec3(" + sOutputs + ")";
+    return declarationsOf(aParameters) + expressions.functions() +
+           entryFunction("    vec3 code = clamp(color.rgb, 0.0, 1.0);\n"
+                         "    vec3 light = clamp(" +
+                         sMatrix + " * vec3(" + sInputs +
                          "), 0.0, 1.0);\n"
-                         "    vec3 root = sqrt(light);\n"
-                         "    color.rgb = vec3(" +
-                         sOutputs + ");\n");
+                         "    color.rgb = " +
+                         (bComputedResults ? "clamp(" + sOutputs + ", 0.0, 1.0)" : sOutputs) + ";\n");
 }
 
 /// The texels between 0 and 1.

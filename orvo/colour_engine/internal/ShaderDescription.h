@@ -16,6 +16,12 @@ class ResolvedTransform;
 /// `NumParameters` the size of parameters(), `Parameter` the record with a string for the name and a pointer
 /// to the data, `CopyData` the data.
 ///
+/// Curves and a matrix, with every curve in closed form that ShaderCurve can compute, become text alone,
+/// without parameters. Where a curve has to be a table, of 4096 entries, the matrix is a parameter too.
+/// Anything else becomes a cube in a 3D texture. Samples below 0 count as 0 and samples above 1 as 1, and
+/// results are from 0 to 1; what NaN gives is the driver's, some colour in that range, as GLSL leaves it open
+/// what clamp() makes of it (Mesa: 0). Alpha stays as it is.
+///
 /// Threads: immutable: any, at once.
 class ORVO_API ShaderDescription {
 public:

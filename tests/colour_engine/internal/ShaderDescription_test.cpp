@@ -78,10 +78,78 @@ TEST(ShaderDescription, SharesTablesBetweenEqualCurves) {
     EXPECT_EQ(std::string::npos, one.code().find("orvoInput1"));
     ShaderDescription const two(shaper({2, 1.8, 2}, {0.5, 0.5, 0.4}));
     ASSERT_EQ(5U, two.parameters().size());
-    EXPECT_NE(std::string::npos, two.code().find("orvoCurve(orvoInput0, color.r), orvoCurve(orvoInput1, "
-                                                 "color.g), orvoCurve(orvoInput0, color.b)"));
-    EXPECT_NE(std::string::npos, two.code().find("orvoCurve(orvoOutput0, root.r), orvoCurve(orvoOutput0, "
-                                                 "root.g), orvoCurve(orvoOutput2, root.b)"));
+    EXPECT_NE(std::string::npos, two.code().find("orvoCurve(orvoInput0, code.r), orvoCurve(orvoInput1, "
+                                                 "code.g), orvoCurve(orvoInput0, code.b)"));
+    EXPECT_NE(std::string::npos, two.code().find("orvoCurve(orvoOutput0, sqrt(light.r)), "
+                                                 "orvoCurve(orvoOutput0, sqrt(light.g)), "
+                                                 "orvoCurve(orvoOutput2, sqrt(light.b))"));
+}
+
+/// The same curves, known to be powers.
+ChannelCurve knownPower(double exponent) {
+    return ChannelCurve([=](double x) { return std::pow(x, exponent); }, curveFormula(1, &exponent));
+}
+
+bool contains(ShaderDescription const& description, char const* pText) {
+    return description.code().find(pText) != std::string::npos;
+}
+
+TEST(ShaderDescription, ComputesCurvesInClosedFormWithoutParameters) {
+    ShaderDescription const description(
+        ResolvedTransform(MatrixShaper{{knownPower(2.2), knownPower(1.8), knownPower(2.2)},
+                                       aMatrix,
+                                       {knownPower(0.5), knownPower(0.5), knownPower(1.0)}}));
+    EXPECT_TRUE(description.parameters().empty());
+    EXPECT_FALSE(contains(description, "uniform"));
+    EXPECT_FALSE(contains(description, "texture1D"));
+    // Each different curve once, none for the straight one, and the matrix by columns.
+    for (char const* pText :
+         {"float orvoInputCurve0(float x) {\n", "float orvoInputCurve1(float x) {\n",
+          "float orvoOutputCurve0(float x) {\n",
+          "vec3 code = clamp(color.rgb, 0.0, 1.0);\n"
+          "    vec3 light = clamp(mat3(0.5, (-0.5), 0.75, 0.25, 1.5, (-0.25), 0.125, 0.0625, 2.0) * "
+          "vec3(orvoInputCurve0(code.r), orvoInputCurve1(code.g), orvoInputCurve0(code.b)), 0.0, 1.0);\n"
+          "    color.rgb = clamp(vec3(orvoOutputCurve0(light.r), orvoOutputCurve0(light.g), light.b), 0.0, "
+          "1.0);\n"})
+        EXPECT_TRUE(contains(description, pText)) << pText << "\nin\n" << description.code();
+    EXPECT_FALSE(contains(description, "orvoInputCurve2"));
+    EXPECT_FALSE(contains(description, "orvoOutputCurve1"));
+    EXPECT_FALSE(contains(description, "orvoOutputCurve2"));
+}
+
+TEST(ShaderDescription, HasTheMatrixAloneBetweenStraightCurves) {
+    auto const one = knownPower(1.0);
+    // Noise of a computed zero is left out.
+    ShaderDescription const description(ResolvedTransform(MatrixShaper{
+        {one, one, one}, {1.0, 1e-17, 0.0, -1e-17, 0.5, 0.0, 0.0, 1e-6, 0.25}, {one, one, one}}));
+    EXPECT_EQ("void orvoColourTransform(inout vec4 color) {\n"
+              "    vec3 code = clamp(color.rgb, 0.0, 1.0);\n"
+              "    vec3 light = clamp(mat3(1.0, 0.0, 0.0, 0.0, 0.5, 1e-06, 0.0, 0.0, 0.25) * vec3(code.r, "
+              "code.g, code.b), 0.0, 1.0);\n"
+              "    color.rgb = vec3(light.r, light.g, light.b);\n"
+              "}\n",
+              description.code());
+}
+
+TEST(ShaderDescription, MixesTablesAndComputedCurves) {
+    // A table on one side alone, or for one channel alone.
+    ShaderDescription const in(ResolvedTransform(MatrixShaper{
+        {power(2.2), power(2.2), power(2.2)}, aMatrix, {knownPower(0.5), knownPower(0.5), knownPower(0.5)}}));
+    ASSERT_EQ(2U, in.parameters().size());
+    expectCurve(in.parameters()[0], "orvoInput0");
+    EXPECT_EQ("orvoMatrix", in.parameters()[1].sName_);
+    EXPECT_TRUE(contains(in, "clamp(orvoMatrix * vec3(orvoCurve(orvoInput0, code.r), "));
+    EXPECT_TRUE(contains(in, "clamp(vec3(orvoOutputCurve0(light.r), "));
+    ShaderDescription const out(
+        ResolvedTransform(MatrixShaper{{knownPower(2.2), knownPower(2.2), knownPower(2.2)},
+                                       aMatrix,
+                                       {knownPower(0.5), power(0.7), knownPower(1.0)}}));
+    ASSERT_EQ(2U, out.parameters().size());
+    EXPECT_EQ("orvoMatrix", out.parameters()[0].sName_);
+    expectCurve(out.parameters()[1], "orvoOutput1");
+    EXPECT_TRUE(contains(out, "vec3(orvoInputCurve0(code.r), orvoInputCurve0(code.g), "));
+    EXPECT_TRUE(contains(
+        out, "clamp(vec3(orvoOutputCurve0(light.r), orvoCurve(orvoOutput1, sqrt(light.g)), light.b)"));
 }
 
 TEST(ShaderDescription, MakesACubeOfOneTexture) {
@@ -143,7 +211,10 @@ TEST(ShaderDescription, StaysWithinTheInterfacesLengths) {
     ColourCube cube;
     cube.aValues_.resize(std::size_t(33) * 33 * 33 * 3);
     for (ResolvedTransform const& transform :
-         {ResolvedTransform(cube), shaper({1.5, 2.0, 2.5}, {0.5, 0.75, 1.25})}) {
+         {ResolvedTransform(cube), shaper({1.5, 2.0, 2.5}, {0.5, 0.75, 1.25}),
+          ResolvedTransform(MatrixShaper{{knownPower(1.8), knownPower(2.2), knownPower(2.4)},
+                                         aMatrix,
+                                         {knownPower(0.37), knownPower(0.45), knownPower(0.55)}})}) {
         ShaderDescription const description(transform);
         EXPECT_LT(description.code().size(), 8192U);
         EXPECT_LT(description.entryPoint().size(), 1024U);

@@ -159,21 +159,7 @@ TEST(TransformResolver, TakesAForeignWhiteIntoAccountWhereColoursAreAbsolute) {
 }
 
 TEST(TransformResolver, TakesCurvesThatAreGivenAsTables) {
-    // As in most files: 1024 entries of sRGB's curve, version 2.
-    std::array<cmsUInt16Number, 1024> aEntries{};
-    for (std::size_t i = 0; i < aEntries.size(); ++i) {
-        double const x = static_cast<double>(i) / 1023.0;
-        double const y = x <= 0.04045 ? x / 12.92 : std::pow((x + 0.055) / 1.055, 2.4);
-        aEntries[i] = static_cast<cmsUInt16Number>(std::lround(65535.0 * y));
-    }
-    cmsToneCurve* const pCurve = cmsBuildTabulatedToneCurve16(nullptr, 1024, aEntries.data());
-    cmsHPROFILE const pFile = ORVO::Test::gammaProfile(1.0);
-    for (auto const eTag : {cmsSigRedTRCTag, cmsSigGreenTRCTag, cmsSigBlueTRCTag}) {
-        cmsWriteTag(pFile, eTag, pCurve);
-    }
-    cmsFreeToneCurve(pCurve);
-    cmsSetProfileVersion(pFile, 2.1);
-    auto const aBytes = ORVO::Test::bytesOf(pFile);
+    auto const aBytes = ORVO::Test::sampledProfile();
     Profile const file(aBytes.data(), aBytes.size());
     auto const spSRGB = profileFromCode(PROFILE_SRGB);
     for (std::uint32_t intent = 0; intent < 4; ++intent) {

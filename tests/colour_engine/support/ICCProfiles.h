@@ -3,6 +3,8 @@
 
 #include <lcms2.h>
 
+#include <array>
+#include <cmath>
 #include <stdexcept>
 #include <vector>
 
@@ -36,6 +38,24 @@ inline cmsHPROFILE gammaProfile(double gamma) {
     cmsHPROFILE const pProfile = cmsCreateRGBProfile(&white, &primaries, aCurves);
     cmsFreeToneCurve(pCurve);
     return pProfile;
+}
+
+/// sRGB as most files have it: the curve as 1024 entries of 16 bits, version 2.
+inline Bytes sampledProfile() {
+    std::array<cmsUInt16Number, 1024> aEntries{};
+    for (std::size_t i = 0; i < aEntries.size(); ++i) {
+        double const x = static_cast<double>(i) / 1023.0;
+        double const y = x <= 0.04045 ? x / 12.92 : std::pow((x + 0.055) / 1.055, 2.4);
+        aEntries[i] = static_cast<cmsUInt16Number>(std::lround(65535.0 * y));
+    }
+    cmsToneCurve* const pCurve = cmsBuildTabulatedToneCurve16(nullptr, 1024, aEntries.data());
+    cmsHPROFILE const pFile = gammaProfile(1.0);
+    for (auto const eTag : {cmsSigRedTRCTag, cmsSigGreenTRCTag, cmsSigBlueTRCTag}) {
+        cmsWriteTag(pFile, eTag, pCurve);
+    }
+    cmsFreeToneCurve(pCurve);
+    cmsSetProfileVersion(pFile, 2.1);
+    return bytesOf(pFile);
 }
 
 /// RGB with tables alone: what sRGB means, in Lab. It is a source and no destination.

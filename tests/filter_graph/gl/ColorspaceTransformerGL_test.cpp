@@ -2,9 +2,11 @@
 #include "orvo/filter_graph/filters/ColorspaceTransformer.h"
 
 #include "orvo/colour_engine/EngineStatistics.h"
+#include "orvo/colour_engine/ProfileRegistry.h"
 #include "orvo/core/memory/MemoryStatistics.h"
 #include "orvo/image_runtime/TexturePool.h"
 #include "orvo/ogl/ExceptionOGL.h"
+#include "tests/colour_engine/support/ICCProfiles.h"
 #include "tests/filter_graph/support/ColourGraph.h"
 #include "tests/support/Expect.h"
 #include "tests/support/gl/GLFrameTest.h"
@@ -19,6 +21,8 @@ using namespace ORVO::Test;
 using namespace ORVO::ColourEngine;
 
 constexpr std::uint32_t kNoCode = profileCode("none");
+/// sRGB, with sampled curves: they are textures.
+constexpr std::uint32_t kSampled = profileCode("File");
 
 /// source -> transformers -> sink, in textures.
 class GLColourGraph {
@@ -47,7 +51,12 @@ private:
 
 class ColorspaceTransformerGLTest : public GLFrameTest {
 protected:
-    ColorspaceTransformerGLTest() { RecordingEngine::install(); }
+    ColorspaceTransformerGLTest() {
+        RecordingEngine::install();
+        Bytes const aBytes = sampledProfile();
+        registerProfile(kSampled, aBytes.data(), aBytes.size());
+    }
+    ~ColorspaceTransformerGLTest() override { unregisterProfile(kSampled); }
 };
 
 TEST_F(ColorspaceTransformerGLTest, FramesFollowTheCodes) {
@@ -59,7 +68,10 @@ TEST_F(ColorspaceTransformerGLTest, FramesFollowTheCodes) {
     for (auto const& [source, destination] : {std::pair(PROFILE_SRGB, PROFILE_WIDE_GAMUT),
                                               {PROFILE_WIDE_GAMUT, PROFILE_SRGB},
                                               {PROFILE_DISPLAY_P3, PROFILE_BT_2020},
-                                              {PROFILE_LINEAR_SRGB, PROFILE_SRGB}}) {
+                                              {kSampled, PROFILE_WIDE_GAMUT},
+                                              {PROFILE_LINEAR_SRGB, PROFILE_SRGB},
+                                              {PROFILE_WIDE_GAMUT, kSampled},
+                                              {kSampled, kSampled}}) {
         setCodes(graph.filter(), source, destination);
         graph.frame();
         EXPECT_LE(largestDifference(transformed(input.pixels(), source, destination), output.pixels()), 1);
@@ -113,43 +125,54 @@ TEST_F(ColorspaceTransformerGLTest, FramesWithTheSameCodesMakeNothing) {
     PackedImage<std::uint8_t> input(16, 16);
     PackedImage<std::uint8_t> output(16, 16);
     input.fillAtRandom(4);
-    GLColourGraph graph(context(), input.handle(), output.handle(),
-                        {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT)});
-    for (int i = 0; i < 3; ++i)
-        graph.frame();
-    auto const nShaderCalls = RecordingEngine::shaderCalls();
-    EXPECT_GT(nShaderCalls, 0U);
-    std::set<std::string> const aNames{"glLinkProgram",   "glGenTextures",   "glTexImage1D",
-                                       "glTexSubImage1D", "glTexSubImage3D", "glCreateShader"};
-    std::map<std::string, std::uint64_t> before;
-    for (std::string const& sName : aNames)
-        before[sName] = GLHooks::calls(sName);
-    ObjectCounts const objects = GLHooks::objects();
-    for (int i = 0; i < 20; ++i)
-        graph.frame();
-    EXPECT_EQ(nShaderCalls, RecordingEngine::shaderCalls());
-    for (std::string const& sName : aNames)
-        EXPECT_EQ(before[sName], GLHooks::calls(sName)) << sName;
-    EXPECT_EQ(objects, GLHooks::objects());
-    EXPECT_LE(
-        largestDifference(transformed(input.pixels(), PROFILE_SRGB, PROFILE_WIDE_GAMUT), output.pixels()), 1);
+    // Without tables, and with them.
+    for (std::uint32_t const source : {PROFILE_SRGB, kSampled}) {
+        GLColourGraph graph(context(), input.handle(), output.handle(),
+                            {makeTransformer(source, PROFILE_WIDE_GAMUT)});
+        auto const nUploads = GLHooks::calls("glTexSubImage1D");
+        for (int i = 0; i < 3; ++i)
+            graph.frame();
+        EXPECT_EQ(source == kSampled, GLHooks::calls("glTexSubImage1D") > nUploads);
+        auto const nShaderCalls = RecordingEngine::shaderCalls();
+        EXPECT_GT(nShaderCalls, 0U);
+        std::set<std::string> const aNames{"glLinkProgram",   "glGenTextures",   "glTexImage1D",
+                                           "glTexSubImage1D", "glTexSubImage3D", "glCreateShader"};
+        std::map<std::string, std::uint64_t> before;
+        for (std::string const& sName : aNames)
+            before[sName] = GLHooks::calls(sName);
+        ObjectCounts const objects = GLHooks::objects();
+        for (int i = 0; i < 20; ++i)
+            graph.frame();
+        EXPECT_EQ(nShaderCalls, RecordingEngine::shaderCalls());
+        for (std::string const& sName : aNames)
+            EXPECT_EQ(before[sName], GLHooks::calls(sName)) << sName;
+        EXPECT_EQ(objects, GLHooks::objects());
+        EXPECT_LE(largestDifference(transformed(input.pixels(), source, PROFILE_WIDE_GAMUT), output.pixels()),
+                  1);
+    }
 }
 
-// 500 frames of 2 by 2 pixels, codes changed on every tenth: what a change makes is given back. Counted are
-// OpenGL's objects of every kind, tracked blocks and bytes, and the engine's objects.
-TEST_F(ColorspaceTransformerGLTest, HundredsOfFramesLeaveNothing) {
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr int kManyFrames = 500; // ten times slower, on the same roads
+#else
+constexpr int kManyFrames = 10000;
+#endif
+
+// Frames of 2 by 2 pixels, codes changed fifty times: what a change makes is given back, tables as well.
+// Counted are OpenGL's objects of every kind, tracked blocks and bytes, and the engine's objects.
+TEST_F(ColorspaceTransformerGLTest, ThousandsOfFramesLeaveNothing) {
     PackedImage<std::uint8_t> input(2, 2);
     PackedImage<std::uint8_t> output(2, 2);
     GLColourGraph graph(context(), input.handle(), output.handle(),
                         {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT)});
-    constexpr std::uint32_t aCodes[] = {PROFILE_WIDE_GAMUT, PROFILE_DISPLAY_P3, PROFILE_BT_2020};
-    auto const frame = [&](int i) {
-        setCodes(graph.filter(), PROFILE_SRGB, aCodes[i / 10 % 3]);
+    constexpr std::pair<std::uint32_t, std::uint32_t> aCodes[] = {
+        {PROFILE_SRGB, PROFILE_WIDE_GAMUT}, {kSampled, PROFILE_DISPLAY_P3}, {PROFILE_SRGB, PROFILE_BT_2020}};
+    auto const frame = [&](int iCodes) {
+        setCodes(graph.filter(), aCodes[iCodes % 3].first, aCodes[iCodes % 3].second);
         graph.frame();
     };
-    for (int i = 0; i < 45; i += 5)
-        frame(i);
-    frame(0);
+    for (int i = 0; i < 7; ++i)
+        frame(i / 2);
     auto const counts = [] {
         EngineStatistics const engine = engineStatistics();
         return std::vector<std::size_t>{Core::MemoryStatistics::blocks(MEMORY_TYPE_OBJECT),
@@ -163,8 +186,8 @@ TEST_F(ColorspaceTransformerGLTest, HundredsOfFramesLeaveNothing) {
     };
     auto const before = counts();
     ObjectCounts const objects = GLHooks::objects();
-    for (int i = 0; i < 500; ++i)
-        frame(i);
+    for (int i = 0; i < kManyFrames; ++i)
+        frame(i / (kManyFrames / 50));
     frame(0);
     EXPECT_EQ(before, counts());
     EXPECT_EQ(objects, GLHooks::objects());
@@ -188,9 +211,9 @@ TEST_F(ColorspaceTransformerGLTest, SurvivesEveryFailingCall) {
     PackedImage<std::uint8_t> input(5, 4);
     PackedImage<std::uint8_t> output(5, 4);
     input.fillAtRandom(6);
-    auto const aExpected = transformed(input.pixels(), PROFILE_SRGB, PROFILE_DISPLAY_P3);
+    auto const aExpected = transformed(input.pixels(), kSampled, PROFILE_DISPLAY_P3);
     GLColourGraph graph(context(), input.handle(), output.handle(),
-                        {makeTransformer(PROFILE_SRGB, PROFILE_DISPLAY_P3)});
+                        {makeTransformer(kSampled, PROFILE_DISPLAY_P3)});
     for (char const* pName :
          {"glGenTextures", "glTexImage2D", "glTexSubImage1D", "glCreateProgram", "glCreateShader",
           "glCompileShader", "glLinkProgram", "glFramebufferTexture2D", "glCheckFramebufferStatus"}) {
@@ -199,7 +222,7 @@ TEST_F(ColorspaceTransformerGLTest, SurvivesEveryFailingCall) {
         for (; bFailed && n < 100; ++n) {
             // Another transform and nothing in the pool, so that program and tables are filled and the rest
             // is made.
-            setCodes(graph.filter(), PROFILE_SRGB, n % 2 == 0 ? PROFILE_BT_2020 : PROFILE_WIDE_GAMUT);
+            setCodes(graph.filter(), kSampled, n % 2 == 0 ? PROFILE_BT_2020 : PROFILE_WIDE_GAMUT);
             TexturePool::Instance()->clearAll();
             {
                 GLCallFailure const failure(pName, n);
@@ -210,7 +233,7 @@ TEST_F(ColorspaceTransformerGLTest, SurvivesEveryFailingCall) {
                 }
                 bFailed = failure.hasFired();
             }
-            setCodes(graph.filter(), PROFILE_SRGB, PROFILE_DISPLAY_P3);
+            setCodes(graph.filter(), kSampled, PROFILE_DISPLAY_P3);
             graph.frame();
             EXPECT_LE(largestDifference(aExpected, output.pixels()), 1) << pName << " " << n;
         }

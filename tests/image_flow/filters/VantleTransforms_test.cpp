@@ -1,5 +1,5 @@
 // Transforms of the embedded engine on the GPU against the same on the CPU: a dense lattice over the RGB
-// cube, random colours, and the grey axis.
+// cube, random colours, and the grey axis. Among the spaces is one whose curves are given as tables.
 #include "orvo/image_flow/filters/VantleFilterGPU.h"
 
 #include "tests/image_flow/support/ShaderRoad.h"
@@ -11,8 +11,12 @@
 #include "orvo/colour_engine/internal/ResolvedTransform.h"
 #include "orvo/colour_engine/internal/ShaderDescription.h"
 #include "orvo/image_flow/colour/CVantle.h"
+#include "orvo/image_flow/filters/VantleShaderAdapter.h"
+#include "tests/colour_engine/support/ICCProfiles.h"
 #include "tests/colour_engine/support/TableProfiles.h"
 #include "tests/support/RecordingEngine.h"
+
+#include <limits>
 
 namespace {
 
@@ -110,9 +114,17 @@ Texels pictureOf(std::vector<T> const& aColours, double white) {
     });
 }
 
+/// sRGB, with sampled curves.
+constexpr std::uint32_t kSampled = profileCode("File");
+
 class VantleTransformsTest : public ShaderFlowTest {
 protected:
-    VantleTransformsTest() { RecordingEngine::install(); }
+    VantleTransformsTest() {
+        RecordingEngine::install();
+        Bytes const aBytes = sampledProfile();
+        registerProfile(kSampled, aBytes.data(), aBytes.size());
+    }
+    ~VantleTransformsTest() override { unregisterProfile(kSampled); }
 
     /// One filter, to whose changing transforms the colours are shown.
     struct Road {
@@ -158,13 +170,82 @@ protected:
     }
 };
 
+// The colour library rounds what sampled curves give to 16 bits. A table interpolates between such steps;
+// what that is near black, a destination of a plain gamma magnifies beyond a thousandth: of those, bytes
+// alone.
 constexpr std::pair<std::uint32_t, std::uint32_t> aPairs[] = {
     {PROFILE_WIDE_GAMUT, PROFILE_SRGB},  {PROFILE_SRGB, PROFILE_WIDE_GAMUT},
     {PROFILE_SRGB, PROFILE_DISPLAY_P3},  {PROFILE_DISPLAY_P3, PROFILE_BT_2020},
     {PROFILE_BT_2020, PROFILE_SRGB},     {PROFILE_LINEAR_SRGB, PROFILE_SRGB},
     {PROFILE_SRGB, PROFILE_LINEAR_SRGB}, {PROFILE_WIDE_GAMUT, PROFILE_LINEAR_SRGB},
     {PROFILE_GRAY, PROFILE_SRGB},        {PROFILE_SRGB, PROFILE_GRAY},
-    {PROFILE_SRGB, PROFILE_SRGB}};
+    {PROFILE_SRGB, PROFILE_SRGB},        {kSampled, PROFILE_DISPLAY_P3},
+    {PROFILE_WIDE_GAMUT, kSampled},      {kSampled, kSampled},
+    {kSampled, PROFILE_WIDE_GAMUT}};
+
+TEST_F(VantleTransformsTest, SampledCurvesAreTablesAndOthersAreNot) {
+    struct Row {
+        std::uint32_t source_;
+        std::uint32_t destination_;
+        std::vector<std::string> aParameters_;
+    };
+    Row const aRows[] = {{PROFILE_SRGB, PROFILE_WIDE_GAMUT, {}},
+                         {PROFILE_GRAY, PROFILE_LINEAR_SRGB, {}},
+                         {kSampled, PROFILE_WIDE_GAMUT, {"orvoInput0", "orvoMatrix"}},
+                         {PROFILE_BT_2020, kSampled, {"orvoMatrix", "orvoOutput0"}},
+                         {kSampled, kSampled, {"orvoInput0", "orvoMatrix", "orvoOutput0"}}};
+    for (Row const& row : aRows) {
+        EngineTransform const transform(row.source_, row.destination_);
+        VantleShaderAdapter adapter(transform.get(), nullptr);
+        ASSERT_TRUE(adapter.isValid());
+        std::vector<std::string> aNames(adapter.numParameters());
+        for (unsigned i = 0; i < aNames.size(); ++i)
+            adapter.getParameter(i, aNames[i]);
+        EXPECT_EQ(row.aParameters_, aNames) << std::hex << row.source_ << " " << row.destination_;
+    }
+}
+
+TEST_F(VantleTransformsTest, ValuesOutsideAreThoseOfTheEnds) {
+    constexpr float nan = std::numeric_limits<float>::quiet_NaN();
+    // The driver's clamp() makes 0 of NaN.
+    constexpr std::pair<double, double> aValues[] = {
+        {-0.25, 0.0}, {-1e30, 0.0}, {1.5, 1.0}, {1e30, 1.0}, {nan, 0.0}};
+    // For each value and channel three by three pixels of one colour, as their neighbours are read with a
+    // weight of 0, which NaN comes through.
+    auto const region = pixels(0, 0, 15, 9);
+    auto const colourAt = [&](int x, int y, bool bOutside) {
+        Pixel colour{0.25, 0.5, 0.75, 1.5};
+        colour[std::size_t(y / 3)] = bOutside ? aValues[x / 3].first : aValues[x / 3].second;
+        return colour;
+    };
+    Texels const outside = Texels(region).fill([&](int x, int y) { return colourAt(x, y, true); });
+    Texels const inside = Texels(region).fill([&](int x, int y) { return colourAt(x, y, false); });
+    for (auto const& [source, destination] : {std::pair(PROFILE_SRGB, PROFILE_WIDE_GAMUT),
+                                              {PROFILE_WIDE_GAMUT, PROFILE_SRGB},
+                                              {PROFILE_LINEAR_SRGB, PROFILE_LINEAR_SRGB},
+                                              {kSampled, PROFILE_WIDE_GAMUT},
+                                              {PROFILE_WIDE_GAMUT, kSampled},
+                                              {kSampled, kSampled}}) {
+        EngineTransform const transform(source, destination);
+        auto const resultOf = [&](Texels const& picture) {
+            ImageGPUPtr const upInput = textureOf(picture, ImageGPU::PIXEL_FORMAT_RGBA32F);
+            VantleFilterGPU filter;
+            filter.outputPrecisionHintParameter().setValue(ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT);
+            filter.transform()->setValue(transform.get());
+            ShaderRoad road(frameContext(), filter);
+            road.setInput(0, *upInput);
+            return Texels(*road.run(world(0, 0, 15, 9)));
+        };
+        Texels const expected = resultOf(inside);
+        Texels const actual = resultOf(outside);
+        for (int y = 1; y < 9; y += 3)
+            for (int x = 1; x < 15; x += 3)
+                EXPECT_EQ(expected.at(x, y), actual.at(x, y))
+                    << std::hex << source << " " << destination << " " << x << " " << y;
+        // An end is not what its channel would be in the middle.
+        EXPECT_NE(expected.at(1, 1)[0], expected.at(7, 1)[0]);
+    }
+}
 
 TEST_F(VantleTransformsTest, BytesAreWithinOneOfTheCPU) {
     auto const aColours = colours<std::uint8_t>(255);
@@ -186,6 +267,8 @@ TEST_F(VantleTransformsTest, FloatsAreWithinAThousandthOfTheCPU) {
     Road road(frameContext(), input, ImageGPU::PIXEL_FORMAT_RGBA32F,
               ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT);
     for (auto const& [source, destination] : aPairs) {
+        if (source == kSampled && destination == PROFILE_WIDE_GAMUT)
+            continue;
         EngineTransform const transform(source, destination);
         Texels const expected = pictureOf(onCPU(aColours, transform), 32768.0);
         Errors const errors =
