@@ -1,5 +1,7 @@
-// The colour transform on the CPU, 1920 x 1080, from sRGB to the wide-gamut space, in 8-bit and 16-bit
-// integers, with the best instruction set on one thread and on two, and with SSE2 alone on one.
+// The colour transform on the CPU, 1920 x 1080, in 8-bit and 16-bit integers, with the best instruction set
+// on one thread and on two, and with SSE2 alone on one: from sRGB to the wide-gamut space (curves and a
+// matrix), and between sRGB and profiles of tables, Lab in 33 nodes each way, as source, as destination and
+// as both.
 //
 // What is timed is a frame of the node, with its slices and its copy of alpha. The counter to_lcms2 is its
 // time in times of the colour library called directly on the same picture, in its own optimised mode and on
@@ -16,6 +18,7 @@
 #include "orvo/image_flow/colour/CVantle.h"
 #include "orvo/image_runtime/ImageRuntime.h"
 #include "orvo/ogl/OGL.h"
+#include "tests/colour_engine/support/TableProfiles.h"
 
 #include <benchmark/benchmark.h>
 #include <lcms2.h>
@@ -85,6 +88,27 @@ std::vector<unsigned char> picture(Format const& format, int white) {
     return aBytes;
 }
 
+/// From where to where.
+struct Spaces {
+    char const* sName_;
+    bool bTablesIn_;
+    bool bTablesOut_;
+};
+
+constexpr Spaces kSpaces[] = {{"transform", false, false},
+                              {"from_tables", true, false},
+                              {"to_tables", false, true},
+                              {"tables", true, true}};
+
+constexpr std::uint32_t kTablesIn = ColourEngine::profileCode("TabI");
+constexpr std::uint32_t kTablesOut = ColourEngine::profileCode("TabO");
+
+Test::Bytes const& tables(bool bIn) {
+    static Test::Bytes const aIn = Test::tableProfile({true, 33, Test::labOfSRGB});
+    static Test::Bytes const aOut = Test::tableProfile({false, 33, Test::sRGBOfLab});
+    return bIn ? aIn : aOut;
+}
+
 void check(VantleResult result) {
     if (result != 0) {
         throw std::runtime_error("the colour engine refuses");
@@ -94,15 +118,19 @@ void check(VantleResult result) {
 /// A frame of the node between two pictures in memory.
 class NodeFrame {
 public:
-    NodeFrame(Format const& format, std::vector<unsigned char> const& aInput,
+    NodeFrame(Spaces const& spaces, Format const& format, std::vector<unsigned char> const& aInput,
               std::vector<unsigned char> const& aOutput, std::size_t nThreads)
         : nThreadsBefore_(DataFlow::Controller::getNumberOfThreads()),
           oInput_(format.eFormat_, aInput.data(), region(), PixelExtentInWorldSpace(1, 1),
                   ExtentInPixelSpace()),
           oOutput_(format.eFormat_, aOutput.data(), region(), PixelExtentInWorldSpace(1, 1),
                    ExtentInPixelSpace()) {
-        check(CVantle::makeTransform(&pTransform_, ColourEngine::PROFILE_SRGB,
-                                     ColourEngine::PROFILE_WIDE_GAMUT));
+        ColourEngine::registerProfile(kTablesIn, tables(true).data(), tables(true).size());
+        ColourEngine::registerProfile(kTablesOut, tables(false).data(), tables(false).size());
+        std::uint32_t const plain =
+            spaces.bTablesIn_ ? ColourEngine::PROFILE_SRGB : ColourEngine::PROFILE_WIDE_GAMUT;
+        check(CVantle::makeTransform(&pTransform_, spaces.bTablesIn_ ? kTablesIn : ColourEngine::PROFILE_SRGB,
+                                     spaces.bTablesOut_ ? kTablesOut : plain));
         DataFlow::Controller::setNumberOfThreads(nThreads);
         oController_.setSingleThreadMode(nThreads == 1);
         DataFlow::Connect(*oSource_.imageOutput(), *oFilter_.imageInput(0));
@@ -146,13 +174,16 @@ private:
 /// The colour library on the same spaces.
 class DirectCall {
 public:
-    explicit DirectCall(Format const& format) {
+    DirectCall(Spaces const& spaces, Format const& format) {
         cmsCIExyY const white = {0.3127, 0.3290, 1.0};
         cmsCIExyYTRIPLE const primaries = {{0.64, 0.33, 1.0}, {0.21, 0.71, 1.0}, {0.15, 0.06, 1.0}};
         cmsToneCurve* const pGamma = cmsBuildGamma(nullptr, 563.0 / 256.0);
         std::array<cmsToneCurve*, 3> const aCurves = {pGamma, pGamma, pGamma};
-        cmsHPROFILE pSource = cmsCreate_sRGBProfile();
-        cmsHPROFILE pDestination = cmsCreateRGBProfile(&white, &primaries, aCurves.data());
+        cmsHPROFILE pSource = spaces.bTablesIn_ ? open(tables(true)) : cmsCreate_sRGBProfile();
+        cmsHPROFILE pDestination = spaces.bTablesOut_ ? open(tables(false))
+                                   : spaces.bTablesIn_
+                                       ? cmsCreate_sRGBProfile()
+                                       : cmsCreateRGBProfile(&white, &primaries, aCurves.data());
         pTransform_ = cmsCreateTransform(pSource, format.nLcmsFormat_, pDestination, format.nLcmsFormat_,
                                          INTENT_PERCEPTUAL, 0);
         cmsCloseProfile(pDestination);
@@ -168,17 +199,22 @@ public:
     }
 
 private:
+    static cmsHPROFILE open(Test::Bytes const& aBytes) {
+        return cmsOpenProfileFromMem(aBytes.data(), static_cast<cmsUInt32Number>(aBytes.size()));
+    }
+
     cmsHTRANSFORM pTransform_;
 };
 
-void transform(benchmark::State& state, Format const& format, InstructionSet eInstructionSet, int nThreads) {
+void transform(benchmark::State& state, Spaces const& spaces, Format const& format,
+               InstructionSet eInstructionSet, int nThreads) {
     Layers const layers;
     auto const aInput = picture(format, format.bWords_ ? 32768 : 255);
     // Its own white is 65535.
     auto const aDirectInput = picture(format, format.bWords_ ? 65535 : 255);
     std::vector<unsigned char> aOutput(aInput.size());
-    NodeFrame frame(format, aInput, aOutput, static_cast<std::size_t>(nThreads));
-    DirectCall const direct(format);
+    NodeFrame frame(spaces, format, aInput, aOutput, static_cast<std::size_t>(nThreads));
+    DirectCall const direct(spaces, format);
     Benchmarks::Team team(nThreads);
     auto const runDirect = [&] {
         team.run(kHeight, [&](std::size_t begin, std::size_t end) {
@@ -205,19 +241,22 @@ void transform(benchmark::State& state, Format const& format, InstructionSet eIn
     state.SetItemsProcessed(state.iterations() * kWidth * kHeight);
 }
 
-void add(Format const& format, InstructionSet eInstructionSet, char const* sSet, int nThreads) {
-    std::string const sName =
-        std::string("transform/") + format.sName_ + "/" + sSet + "/threads_" + std::to_string(nThreads);
-    benchmark::RegisterBenchmark(sName.c_str(), transform, format, eInstructionSet, nThreads)
+void add(Spaces const& spaces, Format const& format, InstructionSet eInstructionSet, char const* sSet,
+         int nThreads) {
+    std::string const sName = std::string(spaces.sName_) + "/" + format.sName_ + "/" + sSet + "/threads_" +
+                              std::to_string(nThreads);
+    benchmark::RegisterBenchmark(sName.c_str(), transform, spaces, format, eInstructionSet, nThreads)
         ->UseRealTime()
         ->Unit(benchmark::kMillisecond);
 }
 
 bool addAll() {
-    for (Format const& format : kFormats) {
-        add(format, InstructionSet::SSE2, "sse2", 1);
-        add(format, Core::bestInstructionSet(), "best", 1);
-        add(format, Core::bestInstructionSet(), "best", 2);
+    for (Spaces const& spaces : kSpaces) {
+        for (Format const& format : kFormats) {
+            add(spaces, format, InstructionSet::SSE2, "sse2", 1);
+            add(spaces, format, Core::bestInstructionSet(), "best", 1);
+            add(spaces, format, Core::bestInstructionSet(), "best", 2);
+        }
     }
     return true;
 }

@@ -3,9 +3,13 @@
 #include "orvo/colour_engine/ProfileCodes.h"
 #include "tests/colour_engine/support/Engine.h"
 #include "tests/colour_engine/support/ICCProfiles.h"
+#include "tests/colour_engine/support/TableProfiles.h"
 #include "tests/support/Expect.h"
 
+#include <algorithm>
 #include <array>
+#include <cmath>
+#include <vector>
 
 namespace {
 
@@ -106,12 +110,77 @@ TEST_F(ProfileRegistryTest, TakesGreyProfiles) {
     EXPECT_EQ(0u, engine.UnReferenceTransform(pTo));
 }
 
+/// Pixels through a transform between the code and another one, in both sizes, and its shader: all of it
+/// works, or what fails has its text. Whether it worked.
+bool usesProfile(Engine const& engine, std::uint32_t source, std::uint32_t destination) {
+    VantleProfile* const pSource = engine.profile(source);
+    VantleProfile* const pDestination = engine.profile(destination);
+    VantleTransform* pRaw = nullptr;
+    VantleTransform* pTransform = nullptr;
+    VantleResult result = engine.MakeColorTransform(&pRaw, pSource, pDestination, 0, 0);
+    if (result == 0) {
+        result = engine.OptimizeTransform(&pTransform, pRaw, 0);
+        EXPECT_EQ(0u, engine.UnReferenceTransform(pRaw));
+    }
+    EXPECT_EQ(0u, engine.UnReferenceProfile(pSource));
+    EXPECT_EQ(0u, engine.UnReferenceProfile(pDestination));
+    if (result != 0) {
+        EXPECT_EQ("No transform between the profiles", engine.failureText(result));
+        EXPECT_EQ(nullptr, pTransform);
+        return false;
+    }
+    // All greys and some colours, as bytes and as words up to the white of words.
+    std::array<std::uint8_t, 3 * 256> aBytes{};
+    std::array<std::uint16_t, 3 * 256> aWords{};
+    for (std::size_t i = 0; i < aBytes.size(); ++i) {
+        aBytes[i] = static_cast<std::uint8_t>(i < 384 ? i * 2 / 3 : i * 37);
+        aWords[i] = static_cast<std::uint16_t>(aBytes[i] * 32768 / 255);
+    }
+    auto const bytes = ORVO::Test::packedRGB8(aBytes.data(), 256);
+    auto words = bytes;
+    words.bytesPerChannel = 2;
+    for (int i = 0; i < 3; ++i) {
+        words.planes[i] = {aWords.data() + i, 3 * 2 * 256, 3 * 2, 0, 0};
+    }
+    EXPECT_EQ(0u, engine.ApplyGeneral(pTransform, &bytes, &bytes, 1, 256, nullptr));
+    EXPECT_EQ(0u, engine.ApplyGeneral(pTransform, &words, &words, 1, 256, nullptr));
+    for (std::uint16_t const word : aWords) {
+        EXPECT_LE(word, 32768);
+    }
+    EXPECT_EQ(0u, engine.UnReferenceTransform(pTransform));
+    return true;
+}
+
+/// What the shader of a transform is made of is finite.
+void expectFiniteShader(Engine const& engine, std::uint32_t source, std::uint32_t destination) {
+    VantleTransform* const pTransform = engine.transform(source, destination);
+    VantleShader* pShader = nullptr;
+    ASSERT_EQ(0u, engine.NewShader(VANTLE_SHADER_FAMILY, pTransform, nullptr, &pShader));
+    std::uint32_t nParameters = 0;
+    EXPECT_EQ(0u, engine.NumParameters(pShader, &nParameters));
+    for (std::uint32_t i = 0; i < nParameters; ++i) {
+        std::uint32_t nBytes = 0;
+        EXPECT_EQ(0u, engine.CopyData(pShader, i, nullptr, &nBytes));
+        std::vector<float> aData(nBytes / sizeof(float));
+        EXPECT_EQ(0u, engine.CopyData(pShader, i, aData.data(), &nBytes));
+        EXPECT_TRUE(
+            std::all_of(aData.begin(), aData.end(), [](float value) { return std::isfinite(value); }));
+    }
+    EXPECT_EQ(0u, engine.Release(reinterpret_cast<QuorContainer*>(pShader)));
+    EXPECT_EQ(0u, engine.UnReferenceTransform(pTransform));
+}
+
 TEST_F(ProfileRegistryTest, SurvivesDamagedProfiles) {
+    NothingLeft const nothingLeft;
+    Engine const engine;
     std::uint32_t noise = 1;
     auto const next = [&noise] { return noise = noise * 1664525U + 1013904223U; };
     int nRefused = 0;
-    for (Bytes const& aGood : {bytesOf(ORVO::Test::gammaProfile(2.0)), ORVO::Test::tableSourceProfile()}) {
-        for (int i = 0; i < 100; ++i) {
+    int nUsed = 0;
+    for (Bytes const& aGood : {bytesOf(ORVO::Test::gammaProfile(2.0)), ORVO::Test::tableSourceProfile(),
+                               ORVO::Test::tableProfile({true, 5, ORVO::Test::labOfCamera, 2.1}),
+                               ORVO::Test::tableProfile({false, 5, ORVO::Test::sRGBOfLab})}) {
+        for (int i = 0; i < 16; ++i) {
             Bytes aBytes = aGood;
             for (int iByte = 0; iByte < 4; ++iByte) {
                 // Most of what can go wrong stands in the header, the table of tags and the heads of the
@@ -122,10 +191,20 @@ TEST_F(ProfileRegistryTest, SurvivesDamagedProfiles) {
                 registerProfile(iCode, aBytes.data(), aBytes.size());
             } catch (ParameterException const&) {
                 ++nRefused;
+                continue;
+            }
+            bool const bSource = usesProfile(engine, iCode, PROFILE_SRGB);
+            bool const bDestination = usesProfile(engine, PROFILE_SRGB, iCode);
+            EXPECT_TRUE(bSource || bDestination);
+            ++nUsed;
+            // Tables are fitted to a cube, which takes its time.
+            if (bSource && i % 8 == 0) {
+                expectFiniteShader(engine, iCode, PROFILE_SRGB);
             }
         }
     }
     EXPECT_GT(nRefused, 0);
+    EXPECT_GT(nUsed, 0);
 }
 
 TEST_F(ProfileRegistryTest, RefusesWhatIsNoProfileOfColoursAndKeepsTheOldOne) {

@@ -13,7 +13,7 @@ Applier::Applier(std::shared_ptr<ResolvedTransform const> spTransform)
     if (MatrixShaper const* const pShaper = spTransform_->matrixShaper()) {
         oShaper_.emplace(*pShaper);
     } else {
-        oCube_.emplace(*spTransform_->colourCube());
+        oStages_.emplace(spTransform_->stages());
     }
 }
 
@@ -30,7 +30,7 @@ bool Applier::apply(_t_Vantle_PackingSpec const& source, _t_Vantle_PackingSpec c
     if (oShaper_) {
         oShaper_->apply(from, to, rows, columns, kernels);
     } else {
-        oCube_->apply(from, to, rows, columns, kernels);
+        oStages_->apply(from, to, rows, columns, kernels);
     }
     return true;
 }

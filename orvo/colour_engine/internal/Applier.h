@@ -1,7 +1,7 @@
 #pragma once
 
-#include "orvo/colour_engine/internal/ApplyCube.h"
 #include "orvo/colour_engine/internal/ApplyShaper.h"
+#include "orvo/colour_engine/internal/ApplyStages.h"
 #include "orvo/core/Export.h"
 
 #include <cstdint>
@@ -43,7 +43,7 @@ private:
     std::shared_ptr<ResolvedTransform const> spTransform_;
     // One of the two.
     std::optional<ApplyShaper> oShaper_;
-    std::optional<ApplyCube> oCube_;
+    std::optional<ApplyStages> oStages_;
 };
 
 } // namespace ORVO::ColourEngine::Internal

@@ -31,13 +31,20 @@ using ByteScale = LightScale<24, 10>;
 /// of 3.
 using WordScale = LightScale<48, 7>;
 
-/// Where colours lie in a cube of 33 nodes an edge, for interpolation within one of the six tetrahedra of a
-/// cell: along the axes in the order of their fractions, largest first.
-struct CubePlaces {
+/// A table of three axes.
+struct GridShape {
+    float aLast_[3];          ///< the last node along each axis
+    std::int32_t aStride_[3]; ///< from a node to the next one along each axis, in nodes
+};
+
+/// Where colours lie in a table. In a tetrahedron of a cell the corners follow from the lower one of the cell
+/// along the axes in the order of their fractions, largest first.
+struct GridPlaces {
     alignas(64) std::int32_t aNode_[nBlockPixels];   ///< node of the cell's lower corner
     alignas(64) std::int32_t aSecond_[nBlockPixels]; ///< from there to the second corner, in nodes
     alignas(64) std::int32_t aThird_[nBlockPixels];  ///< from there to the third corner, in nodes
-    alignas(64) float aWeights_[4][nBlockPixels];    ///< of the corners; the last one is the upper corner
+    /// In a tetrahedron: sorted, largest first. Between all corners of a cell: along its axes.
+    alignas(64) float aFractions_[3][nBlockPixels];
 };
 
 /// The arithmetic between the tables, for n <= nBlockPixels pixels in planes. Made for one instruction set by
@@ -50,8 +57,23 @@ struct ApplyKernels {
     /// The same as a step of WordScale and the fraction in 0..1 towards the next step.
     void (*mixToWords)(std::int32_t* pStep, float* pFraction, float const* const* pLight,
                        float const* pFactors, std::size_t n);
-    /// Colours 0..32 along each edge of the cube. The weights add up to `white`.
-    void (*placeInCube)(CubePlaces* pPlaces, float const* const* pColour, float white, std::size_t n);
+    /// One plane as a step of ByteScale, and as a step of WordScale with a fraction.
+    void (*stepToBytes)(std::int32_t* pStep, float const* pLight, std::size_t n);
+    void (*stepToWords)(std::int32_t* pStep, float* pFraction, float const* pLight, std::size_t n);
+    /// In place: row by row three factors and what is added.
+    void (*mix)(float* const* pPlanes, float const* pFactors, std::size_t n);
+    /// In place, as `ConnectionStage`.
+    void (*fromLab)(float* const* pPlanes, std::size_t n);
+    void (*toLab)(float* const* pPlanes, std::size_t n);
+    /// Values are clamped to 0..1 along each axis. Those for words round as `GridStage` says.
+    void (*placeInTetrahedra)(GridPlaces* pPlaces, float const* const* pColour, GridShape const& shape,
+                              std::size_t n);
+    void (*placeWordsInTetrahedra)(GridPlaces* pPlaces, float const* const* pColour, GridShape const& shape,
+                                   std::size_t n);
+    void (*placeInCells)(GridPlaces* pPlaces, float const* const* pColour, GridShape const& shape,
+                         std::size_t n);
+    void (*placeWordsInCells)(GridPlaces* pPlaces, float const* const* pColour, GridShape const& shape,
+                              std::size_t n);
 };
 
 /// The kernels of a set that the processor supports; those of SSE2 for PLAIN.

@@ -1,12 +1,10 @@
 #pragma once
 
 #include "orvo/colour_engine/internal/ResolvedTransform.h"
+#include "orvo/colour_engine/internal/SampleTables.h"
 
 #include <array>
 #include <cstddef>
-#include <cstdint>
-#include <mutex>
-#include <vector>
 
 namespace ORVO::ColourEngine::Internal {
 
@@ -23,7 +21,6 @@ struct ApplyPixels;
 /// Threads: any, at once.
 class ApplyShaper {
 public:
-    /// Borrows the curves and the matrix.
     explicit ApplyShaper(MatrixShaper const& shaper);
 
     ApplyShaper(ApplyShaper const&) = delete;
@@ -33,27 +30,9 @@ public:
                std::size_t columns, ApplyKernels const& kernels) const;
 
 private:
-    /// A table for each channel; equal ones are kept once.
-    template <typename Entry>
-    struct Tables {
-        std::once_flag oOnce_;
-        std::array<std::vector<Entry>, 3> aStorage_;
-        std::array<Entry const*, 3> aTables_{};
-
-        template <typename Make>
-        std::array<Entry const*, 3> const& get(Make const& make);
-    };
-
-    std::array<float const*, 3> const& inputs(bool bWords) const;
-    std::array<std::uint8_t const*, 3> const& byteOutputs() const;
-    std::array<float const*, 3> const& wordOutputs() const;
-
-    MatrixShaper const& shaper_;
     std::array<float, 9> aFactors_;
-    mutable Tables<float> oByteInputs_;
-    mutable Tables<float> oWordInputs_;
-    mutable Tables<std::uint8_t> oByteOutputs_;
-    mutable Tables<float> oWordOutputs_;
+    InputTables oInputs_;
+    OutputTables oOutputs_;
 };
 
 } // namespace ORVO::ColourEngine::Internal

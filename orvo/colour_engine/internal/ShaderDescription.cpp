@@ -212,9 +212,22 @@ std::string describeShaper(MatrixShaper const& shaper, ShaderParameters& aParame
                          (bComputedResults ? "clamp(" + sOutputs + ", 0.0, 1.0)" : sOutputs) + ";\n");
 }
 
+/// The texels between 0 and 1.
+std::vector<float> texelsOf(ColourCube const& cube) {
+    std::vector<float> aTexels = cube.aValues_;
+    if (cube.oOutputCurves_.has_value()) {
+        std::transform(aTexels.begin(), aTexels.end(), aTexels.begin(), [](float value) {
+            return static_cast<float>((static_cast<double>(value) - ColourCube::dLowest_) /
+                                      ColourCube::dSpan_);
+        });
+    }
+    return aTexels;
+}
+
 std::string describeCube(ColourCube const& cube, ShaderParameters& aParameters) {
     constexpr auto nEdge = static_cast<std::uint32_t>(ColourCube::nEdge_);
     static_assert(nEdge == 33, "The text below has the number of entries in it");
+    static_assert(ColourCube::dLowest_ == -0.5 && ColourCube::dSpan_ == 2.0, "These stand in the text below");
     auto record = textureRecord(_t_Vantle_ShaderParameterData::KIND_TEXTURE_3D, nTexture3D, nLinear);
     // Integers, which every driver interpolates; their steps are far below those of the cube.
     record.internalFormat = nRGB16;
@@ -222,11 +235,31 @@ std::string describeCube(ColourCube const& cube, ShaderParameters& aParameters) 
     record.width = nEdge;
     record.height = nEdge;
     record.depth = nEdge;
-    aParameters.push_back({"orvoCube", record, cube.aValues_});
+    aParameters.push_back({"orvoCube", record, texelsOf(cube)});
+    std::string sBody;
+    if (cube.oSpacing_.has_value()) {
+        std::string const sTable =
+            addCurve(aParameters, "orvoSpacing", cube.oSpacing_->sample(nCurveEntries));
+        sBody += "    vec3 code = clamp(color.rgb, 0.0, 1.0);\n"
+                 "    color.rgb = vec3(orvoCurve(" +
+                 sTable + ", code.r), orvoCurve(" + sTable + ", code.g), orvoCurve(" + sTable +
+                 ", code.b));\n";
+    }
     // From the middle of the first texel to the middle of the last one.
-    return declarationsOf(aParameters) +
-           entryFunction(
-               "    color.rgb = texture3D(orvoCube, color.rgb * (32.0 / 33.0) + 0.5 / 33.0).rgb;\n");
+    sBody += "    color.rgb = texture3D(orvoCube, color.rgb * (32.0 / 33.0) + 0.5 / 33.0).rgb;\n";
+    if (cube.oOutputCurves_.has_value()) {
+        std::array<std::string, 3> aTables;
+        for (std::size_t i = 0; i < 3; ++i) {
+            aTables[i] = addCurve(aParameters, "orvoOutput" + std::to_string(i),
+                                  (*cube.oOutputCurves_)[i].sampleOverRoot(nCurveEntries));
+        }
+        sBody += "    vec3 root = sqrt(clamp(color.rgb * 2.0 - 0.5, 0.0, 1.0));\n"
+                 "    color.rgb = vec3(orvoCurve(" +
+                 aTables[0] + ", root.r), orvoCurve(" + aTables[1] + ", root.g), orvoCurve(" + aTables[2] +
+                 ", root.b));\n";
+    }
+    bool const bCurves = cube.oSpacing_.has_value() || cube.oOutputCurves_.has_value();
+    return declarationsOf(aParameters) + (bCurves ? pCurveFunction : "") + entryFunction(sBody);
 }
 
 } // namespace

@@ -1,13 +1,16 @@
 #include "orvo/colour_engine/internal/TransformResolver.h"
 
+#include "orvo/colour_engine/internal/CubeFitting.h"
 #include "orvo/colour_engine/internal/LcmsHandles.h"
 #include "orvo/colour_engine/internal/MatrixShaperExtraction.h"
 #include "orvo/colour_engine/internal/Profile.h"
 #include "orvo/colour_engine/internal/ResolvedTransform.h"
+#include "orvo/colour_engine/internal/StageExtraction.h"
 
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <functional>
 #include <mutex>
 #include <optional>
 #include <stdexcept>
@@ -54,22 +57,32 @@ private:
     bool bGrayOut_;
 };
 
-/// The library works in single precision inside: where an output curve is steep, at black, its noise grows.
-bool isSameSample(double a, double b) {
-    constexpr double nearBlack = 1.0 / 128.0;
-    double const tolerance = std::min(a, b) < nearBlack ? 2e-3 : 1.0 / 32768.0;
-    return std::abs(a - b) <= tolerance;
-}
+/// How far two results of samples may be from each other, away from black and at it.
+struct Tolerance {
+    double dElsewhere;
+    double dNearBlack;
 
-/// Whether curves and matrix say the same as the library on a lattice and along the greys. A profile may have
-/// tables beside its curves, a black point to be moved or a white of its own: then they do not.
-bool agrees(ResolvedTransform const& transform, ExactRoad const& road) {
+    bool holds(double a, double b) const {
+        constexpr double nearBlack = 1.0 / 128.0;
+        return std::abs(a - b) <= (std::min(a, b) < nearBlack ? dNearBlack : dElsewhere);
+    }
+};
+
+/// The library works in single precision inside: where an output curve is steep, at black, its noise grows.
+constexpr Tolerance oOfShapers = {1.0 / 32768.0, 2e-3};
+/// In tables it works with 16 bits, of which one is four times as much after the steepest usual curve.
+constexpr Tolerance oOfTables = {8.0 / 32768.0, 8e-3};
+
+/// Whether what the tags say is what the library does, on a lattice and along the greys. A profile may have
+/// tables beside its curves, a black point to be moved or a white of its own.
+bool agrees(ResolvedTransform const& transform, ExactRoad const& road, Tolerance const& tolerance) {
     auto const same = [&](Colour const& colour) {
         Colour const ours = transform.evaluate(colour);
         Colour const theirs = road(colour);
-        return std::equal(ours.begin(), ours.end(), theirs.begin(), isSameSample);
+        return std::equal(ours.begin(), ours.end(), theirs.begin(),
+                          [&](double a, double b) { return tolerance.holds(a, b); });
     };
-    constexpr std::array aLevels = {0.0, 0.25, 0.5, 0.75, 1.0};
+    constexpr std::array aLevels = {0.0, 0.23, 0.5, 0.77, 1.0};
     for (double const red : aLevels) {
         for (double const green : aLevels) {
             for (double const blue : aLevels) {
@@ -89,24 +102,6 @@ bool agrees(ResolvedTransform const& transform, ExactRoad const& road) {
     return true;
 }
 
-ColourCube fillCube(ExactRoad const& road) {
-    constexpr std::size_t nEdge = ColourCube::nEdge_;
-    constexpr double step = 1.0 / static_cast<double>(nEdge - 1);
-    ColourCube cube;
-    cube.aValues_.reserve(3 * nEdge * nEdge * nEdge);
-    for (std::size_t b = 0; b < nEdge; ++b) {
-        for (std::size_t g = 0; g < nEdge; ++g) {
-            for (std::size_t r = 0; r < nEdge; ++r) {
-                for (double const value : road({step * static_cast<double>(r), step * static_cast<double>(g),
-                                                step * static_cast<double>(b)})) {
-                    cube.aValues_.push_back(static_cast<float>(value));
-                }
-            }
-        }
-    }
-    return cube;
-}
-
 } // namespace
 
 std::shared_ptr<ResolvedTransform const> resolveTransform(Profile const& source, Profile const& destination,
@@ -117,11 +112,17 @@ std::shared_ptr<ResolvedTransform const> resolveTransform(Profile const& source,
     ExactRoad const road(source, destination, intent, options);
     if (auto shaper = extractMatrixShaper(source, destination, intent); shaper.has_value()) {
         auto spTransform = std::make_shared<ResolvedTransform const>(*std::move(shaper));
-        if (agrees(*spTransform, road)) {
+        if (agrees(*spTransform, road, oOfShapers)) {
             return spTransform;
         }
     }
-    return std::make_shared<ResolvedTransform const>(fillCube(road));
+    if (auto stages = extractStages(source, destination, intent, options); stages.has_value()) {
+        auto spTransform = std::make_shared<ResolvedTransform const>(*std::move(stages));
+        if (agrees(*spTransform, road, oOfTables)) {
+            return spTransform;
+        }
+    }
+    return std::make_shared<ResolvedTransform const>(fitCube(std::ref(road)));
 }
 
 } // namespace ORVO::ColourEngine::Internal

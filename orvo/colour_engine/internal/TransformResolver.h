@@ -14,8 +14,9 @@ class ResolvedTransform;
 constexpr std::uint32_t TRANSFORM_BLACK_POINT_COMPENSATION = 1;
 
 /// Works out what a transform does. Where both profiles are curves and a matrix, and what follows from those
-/// agrees with the colour library's own double-precision road, that is the result; else a cube filled through
-/// that road. Throws `std::runtime_error` where the colour library knows no road between the two.
+/// agrees with the colour library's own double-precision road, that is the result; else the steps through the
+/// profiles' tables, where those agree; else a cube fitted to that road. Throws `std::runtime_error` where
+/// the colour library knows no road between the two.
 ///
 /// Threads: any; one at a time works.
 ORVO_API std::shared_ptr<ResolvedTransform const> resolveTransform(Profile const& source,

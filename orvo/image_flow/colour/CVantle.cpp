@@ -1,5 +1,6 @@
 #include "orvo/image_flow/colour/CVantle.h"
 
+#include "orvo/image_flow/colour/TrelException.h"
 #include "orvo/image_flow/colour/VantleGuard.h"
 
 namespace ORVO {
@@ -35,6 +36,26 @@ std::atomic<void*> aVantleSlots[150];
 constinit ImageFlow::QuorTable oVantleTable("VantleInterface2", aVantleRows, std::size(aVantleRows),
                                             aVantleSlots);
 constinit ImageFlow::VantleGuard oVantle(oVantleTable);
+
+/// A reference on an object of the engine's for a scope, whatever throws in it.
+template <typename Handle, VantleResult (*drop)(Handle*)>
+struct Dropped {
+    Dropped() = default;
+    Dropped(Dropped const&) = delete;
+    Dropped& operator=(Dropped const&) = delete;
+    ~Dropped() {
+        if (pHandle_ == nullptr) {
+            return;
+        }
+        try {
+            drop(pHandle_);
+        } catch (TrelException const&) { // The engine is gone, and the object with it.
+            pHandle_ = nullptr;
+        }
+    }
+
+    Handle* pHandle_ = nullptr;
+};
 
 } // namespace
 
@@ -90,24 +111,18 @@ VantleResult CVantle::OptimizeTransform(VantleTransform** pOut, VantleTransform*
 VantleResult CVantle::makeTransform(VantleTransform** pOut, std::uint32_t sourceCode,
                                     std::uint32_t destinationCode) {
     *pOut = nullptr;
-    VantleProfile* pSource = nullptr;
-    VantleResult result = ProfileFromCode(&pSource, sourceCode);
-    if (result != 0) {
-        return result;
-    }
-    VantleProfile* pDestination = nullptr;
-    result = ProfileFromCode(&pDestination, destinationCode);
+    Dropped<VantleProfile, &UnReferenceProfile> source;
+    Dropped<VantleProfile, &UnReferenceProfile> destination;
+    Dropped<VantleTransform, &UnReferenceTransform> raw;
+    VantleResult result = ProfileFromCode(&source.pHandle_, sourceCode);
     if (result == 0) {
-        VantleTransform* pRaw = nullptr;
-        result = MakeColorTransform(&pRaw, pSource, pDestination, VANTLE_INTENT_ABSOLUTE, 0);
-        if (result == 0) {
-            result = OptimizeTransform(pOut, pRaw, 0);
-            UnReferenceTransform(pRaw);
-        }
-        UnReferenceProfile(pDestination);
+        result = ProfileFromCode(&destination.pHandle_, destinationCode);
     }
-    UnReferenceProfile(pSource);
-    return result;
+    if (result == 0) {
+        result = MakeColorTransform(&raw.pHandle_, source.pHandle_, destination.pHandle_,
+                                    VANTLE_INTENT_ABSOLUTE, 0);
+    }
+    return result == 0 ? OptimizeTransform(pOut, raw.pHandle_, 0) : result;
 }
 
 } // namespace ORVO

@@ -48,7 +48,8 @@ public:
                                           std::uint32_t options);
 
     /// The whole road from two codes to an optimised transform with the absolute intent, everything else
-    /// released. Returns the first result that is not 0, with `*pOut` null and nothing left referenced.
+    /// released. Returns the first result that is not 0, with `*pOut` null and nothing left referenced. Where
+    /// the engine goes away midway, `TrelException` comes out, and references are dropped if it is back.
     static VantleResult makeTransform(VantleTransform** pOut, std::uint32_t sourceCode,
                                       std::uint32_t destinationCode);
 };

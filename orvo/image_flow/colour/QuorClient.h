@@ -14,6 +14,10 @@ namespace ORVO::ImageFlow {
 
 /// The client's side of the interface layer: keeps the address procedure and what was fetched through it.
 ///
+/// Of the layer's interfaces it binds the four base ones. The cache interface, which a start loads only for
+/// client classes that ask for it, is left out: no class here keeps purgeable data at the engine, and
+/// transforms are shared by the engine itself.
+///
 /// Threads: start and stop by the thread that starts the layers; the others from any thread.
 class ORVO_API QuorClient {
 public:

@@ -37,8 +37,26 @@ private:
 } // namespace
 
 bool QuorTable::tryLoad() noexcept {
-    // Read first: an interface that goes while the table is filled is noticed at the next use.
-    std::uint32_t const iCount = QuorClient::unregisterCount();
+    // An engine that is replaced while the table is filled leaves procedures of both in it, and another
+    // thread may have noted the new counter beside them: so the counter is read again behind, and the table
+    // filled once more where it moved. An engine that never rests is noticed at the next use.
+    constexpr int nRounds = 4;
+    for (int iRound = 0; iRound < nRounds; ++iRound) {
+        std::uint32_t const iGeneration = QuorClient::generation();
+        std::uint32_t const iCount = QuorClient::unregisterCount();
+        if (!fill()) {
+            return false;
+        }
+        iLoadCount_.store(iCount, std::memory_order_release);
+        iGeneration_.store(iGeneration, std::memory_order_release);
+        if (QuorClient::unregisterCount() == iCount && QuorClient::generation() == iGeneration) {
+            break;
+        }
+    }
+    return true;
+}
+
+bool QuorTable::fill() noexcept {
     for (std::size_t iRow = nRows_; iRow-- > 0;) {
         QuorRow const& row = pRows_[iRow];
         void* const pProcedure = QuorClient::resolve(pInterface_, row.pSelector, row.pProcName);
@@ -47,8 +65,6 @@ bool QuorTable::tryLoad() noexcept {
         }
         pSlots_[row.slot].store(pProcedure, std::memory_order_release);
     }
-    iLoadCount_.store(iCount, std::memory_order_release);
-    iGeneration_.store(QuorClient::generation(), std::memory_order_release);
     return true;
 }
 

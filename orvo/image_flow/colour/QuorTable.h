@@ -18,8 +18,11 @@ struct QuorRow {
 /// The client's side of one interface: a record of procedure pointers that is filled by name and filled again
 /// whenever an interface was unregistered since. Slots that no row names stay null.
 ///
-/// Threads: static; everything from any thread, without locks: a load writes what another load would write.
-/// An engine that takes procedures away while they are being called is the host's mistake.
+/// Threads: static; everything from any thread, without locks, as the engine that is asked for a procedure
+/// may come back here. Two loads write the same where the engine stays the same; where it is replaced
+/// meanwhile, the load sees that the counter moved and fills the table again. A call at that very moment may
+/// still go to the old engine's procedure: an engine that takes procedures away while they are being called
+/// is the host's mistake.
 class ORVO_API QuorTable {
 public:
     /// Borrows everything: `pRows` lists the rows by rising slot, `pSlots` has room for the highest.
@@ -31,6 +34,7 @@ public:
     QuorTable& operator=(QuorTable const&) = delete;
 
     /// Fills the table from the last row to the first and notes the counter of unregistrations; 1 on success.
+    /// Where the counter moves meanwhile it does so again, up to three times more.
     /// At the first procedure that is missing it stops and leaves the earlier rows as they are: in strict
     /// mode it throws `Quor_T_MT::CQuorError` on a new error object with empty text and component "Quor",
     /// else it returns 0.
@@ -53,6 +57,7 @@ public:
 
 private:
     bool tryLoad() noexcept;
+    bool fill() noexcept;
 
     char const* pInterface_;
     QuorRow const* pRows_;

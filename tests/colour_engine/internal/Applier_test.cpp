@@ -11,6 +11,7 @@
 #include <cmath>
 #include <cstdint>
 #include <cstring>
+#include <limits>
 #include <random>
 #include <thread>
 
@@ -160,6 +161,37 @@ TransformPointer randomCube() {
     return std::make_shared<ResolvedTransform const>(cube);
 }
 
+/// Steps of every kind, each of the tables with edges of its own: into Lab and back through one table, and
+/// through one of words.
+TransformPointer someStages() {
+    auto const table = [](std::array<std::size_t, 3> const& edges, bool trilinear, bool words) {
+        GridStage stage{edges, trilinear, words, {}};
+        for (std::size_t k = 0; k < edges[2]; ++k) {
+            for (std::size_t j = 0; j < edges[1]; ++j) {
+                for (std::size_t i = 0; i < edges[0]; ++i) {
+                    auto const x = static_cast<double>(i) / static_cast<double>(edges[0] - 1);
+                    auto const y = static_cast<double>(j) / static_cast<double>(edges[1] - 1);
+                    auto const z = static_cast<double>(k) / static_cast<double>(edges[2] - 1);
+                    for (double const value : {x * x * 0.5 + 0.5 * x, y, 0.25 + 0.5 * z + 0.25 * x * y}) {
+                        stage.aNodes_.push_back(
+                            static_cast<float>(words ? std::round(value * 65535.0) / 65535.0 : value));
+                    }
+                }
+            }
+        }
+        return stage;
+    };
+    ChannelCurve const gentle([](double x) { return 0.3 * x + 0.7 * x * x; });
+    return std::make_shared<ResolvedTransform const>(TableStages{
+        CurveStage{{powerCurve(1.4), powerCurve(0.9), powerCurve(1.0)}},
+        MatrixStage{{0.6, 0.3, 0.06, /**/ 0.1, 0.8, 0.1, /**/ 0.05, 0.15, 0.6}, {0.01, 0.0, 0.02}},
+        ConnectionStage::XYZ_TO_LAB, table({7, 4, 9}, true, false),
+        CurveStage{{gentle, powerCurve(1.0), gentle}}, table({5, 6, 3}, false, false),
+        table({9, 17, 5}, true, true), table({4, 9, 33}, false, true), ConnectionStage::LAB_TO_XYZ,
+        MatrixStage{{1.1, -0.1, 0.0, /**/ -0.2, 1.2, 0.1, /**/ 0.3, 0.0, 0.7}, {-0.02, 0.0, 0.01}},
+        CurveStage{{powerCurve(1.0 / 1.8), encodedSRGB(), powerCurve(1.0)}}});
+}
+
 /// Walks from the lower corner of the cell along the axes, that of the largest fraction first.
 Colour tetrahedral(ColourCube const& cube, Colour const& colour) {
     std::array<int, 3> cell{};
@@ -230,6 +262,54 @@ TEST(Applier, EveryPackingGoesIntoEveryOther) {
                     worstDistance(from, to, [&](Colour const& c) { return transform->evaluate(c); });
                 EXPECT_LE(worst, destination.bytes == 1 ? 0.54 : 0.65);
             }
+        }
+    }
+}
+
+TEST(Applier, StepsOfEveryKindAgreeWithThePlainOnes) {
+    auto const transform = someStages();
+    Applier const applier(transform);
+    for (Packing const& source : kPackings) {
+        for (Packing const& destination : kPackings) {
+            SCOPED_TRACE(testing::Message() << source.name << " to " << destination.name);
+            PackedImage from(source, 135, 4, 5);
+            PackedImage to(destination, 135, 4, 2);
+            from.randomize(18);
+            ASSERT_TRUE(apply(applier, from, to));
+            EXPECT_TRUE(to.restIsUntouched());
+            double const worst =
+                worstDistance(from, to, [&](Colour const& c) { return transform->evaluate(c); });
+            // One of the 65535 steps of a table that rounds to the other side is two of 32768 behind a slope
+            // of 4.
+            EXPECT_LE(worst, destination.bytes == 1 ? 0.56 : 4.0);
+        }
+    }
+}
+
+TEST(Applier, ValuesThatAreNoColoursEndAtTheEdges) {
+    double const infinite = std::numeric_limits<double>::infinity();
+    GridStage const table{
+        {2, 2, 2}, false, false, {0, 0, 0, 1, 0, 0, 0, 1, 0, 1, 1, 0, 0, 0, 1, 1, 0, 1, 0, 1, 1, 1, 1, 1}};
+    for (bool const words : {false, true}) {
+        for (bool const trilinear : {false, true}) {
+            GridStage grid = table;
+            grid.bWords_ = words;
+            grid.bTrilinear_ = trilinear;
+            Applier const applier(std::make_shared<ResolvedTransform const>(TableStages{
+                MatrixStage{{infinite, 0, 0, 0, -infinite, 0, 0, 0, 1e30}, {0.0, 0.0, -5e29}}, grid}));
+            PackedImage from(kRGB16, 2, 1);
+            PackedImage to(kRGB16, 2, 1);
+            for (int c = 0; c < 3; ++c) {
+                from.set(0, 0, c, 32768);
+                from.set(1, 0, c, 0);
+            }
+            ASSERT_TRUE(apply(applier, from, to));
+            EXPECT_EQ(32768, to.get(0, 0, 0));
+            EXPECT_EQ(0, to.get(0, 0, 1));
+            EXPECT_EQ(32768, to.get(0, 0, 2));
+            // Infinity times 0 is no number; the third one is far below 0.
+            EXPECT_LE(to.get(1, 0, 0), 32768);
+            EXPECT_EQ(0, to.get(1, 0, 2));
         }
     }
 }
@@ -318,7 +398,7 @@ TEST(Applier, WordsAboveWhiteCountAsWhite) {
 
 TEST(Applier, InstructionSetsAndPartsOfAPictureGiveTheSameBits) {
     auto const eActive = Core::activeInstructionSet();
-    for (auto const& transform : {someShaper(), randomCube()}) {
+    for (auto const& transform : {someShaper(), randomCube(), someStages()}) {
         Applier const applier(transform);
         for (Packing const& packing : {kRGB8, kRGB16}) {
             PackedImage from(packing, 333, 4);
@@ -383,7 +463,7 @@ TEST(Applier, PlanesMayLieAnywhere) {
 }
 
 TEST(Applier, WorksInPlace) {
-    for (auto const& transform : {someShaper(), randomCube()}) {
+    for (auto const& transform : {someShaper(), randomCube(), someStages()}) {
         Applier const applier(transform);
         for (Packing const& packing : kPackings) {
             PackedImage image(packing, 141, 2);

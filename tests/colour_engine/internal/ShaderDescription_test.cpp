@@ -178,6 +178,35 @@ TEST(ShaderDescription, MakesACubeOfOneTexture) {
     EXPECT_NE(std::string::npos, description.code().find("color.rgb * (32.0 / 33.0) + 0.5 / 33.0"));
 }
 
+TEST(ShaderDescription, PutsCurvesBeforeAndBehindACube) {
+    ColourCube cube;
+    cube.aValues_.resize(std::size_t(33) * 33 * 33 * 3);
+    cube.aValues_[0] = -0.5F;
+    cube.aValues_[1] = 1.5F;
+    cube.oSpacing_ = power(0.5);
+    cube.oOutputCurves_ = {power(0.75), power(0.5), power(0.75)};
+    ShaderDescription const description{ResolvedTransform(cube)};
+    auto const& aParameters = description.parameters();
+    ASSERT_EQ(4U, aParameters.size());
+    EXPECT_EQ("orvoCube", aParameters[0].sName_);
+    // -0.5..1.5 in a texture of 0..1
+    EXPECT_FLOAT_EQ(0.0F, aParameters[0].aData_[0]);
+    EXPECT_FLOAT_EQ(1.0F, aParameters[0].aData_[1]);
+    EXPECT_FLOAT_EQ(0.25F, aParameters[0].aData_[2]);
+    expectCurve(aParameters[1], "orvoSpacing");
+    expectCurve(aParameters[2], "orvoOutput0");
+    expectCurve(aParameters[3], "orvoOutput1");
+    double const x = 1000.0 / 4095.0;
+    EXPECT_FLOAT_EQ(float(std::sqrt(x)), aParameters[1].aData_[1000]);
+    EXPECT_FLOAT_EQ(float(std::pow(x, 1.5)), aParameters[2].aData_[1000]);
+    EXPECT_FLOAT_EQ(float(x), aParameters[3].aData_[1000]);
+    for (char const* const pText : {"orvoCurve(orvoSpacing, code.b)", "color.rgb * 2.0 - 0.5",
+                                    "vec3(orvoCurve(orvoOutput0, root.r), orvoCurve(orvoOutput1, root.g), "
+                                    "orvoCurve(orvoOutput0, root.b))"})
+        EXPECT_NE(std::string::npos, description.code().find(pText)) << pText;
+    EXPECT_LT(description.code().size(), 8192U);
+}
+
 TEST(ShaderDescription, StaysWithinTheInterfacesLengths) {
     ColourCube cube;
     cube.aValues_.resize(std::size_t(33) * 33 * 33 * 3);

@@ -5,6 +5,8 @@
 #include "orvo/colour_engine/internal/ResolvedTransform.h"
 #include "tests/colour_engine/support/ICCProfiles.h"
 
+#include <gtest/gtest.h>
+
 #include <algorithm>
 #include <array>
 #include <cmath>
@@ -171,30 +173,72 @@ TEST(TransformResolver, TakesCurvesThatAreGivenAsTables) {
     }
 }
 
-TEST(TransformResolver, FillsACubeWhereThereAreTables) {
+TEST(TransformResolver, TakesTheStepsOfTables) {
     auto const aBytes = ORVO::Test::tableSourceProfile();
     Profile const tables(aBytes.data(), aBytes.size());
     EXPECT_TRUE(tables.canBeSource());
     EXPECT_FALSE(tables.canBeDestination());
     auto const spSRGB = profileFromCode(PROFILE_SRGB);
-    auto const spTransform = resolveTransform(tables, *spSRGB, 0, 0);
-    ColourCube const* const pCube = spTransform->colourCube();
-    ASSERT_NE(nullptr, pCube);
-    ASSERT_EQ(3u * 33 * 33 * 33, pCube->aValues_.size());
-    Road const road(tables.handle(), spSRGB->handle(), 0);
-    for (std::size_t const red : {0, 7, 32}) {
-        for (std::size_t const blue : {0, 20, 32}) {
-            std::size_t const green = 11;
-            Colour const theirs = road({static_cast<double>(red) / 32, static_cast<double>(green) / 32,
-                                        static_cast<double>(blue) / 32});
-            std::size_t const first = 3 * ((blue * 33 + green) * 33 + red);
-            expectColour(theirs,
-                         {pCube->aValues_[first], pCube->aValues_[first + 1], pCube->aValues_[first + 2]},
-                         1e-6);
+    for (std::uint32_t intent = 0; intent < 4; ++intent) {
+        for (std::uint32_t const options : {0U, TRANSFORM_BLACK_POINT_COMPENSATION}) {
+            SCOPED_TRACE(testing::Message() << "intent " << intent << " options " << options);
+            auto const spTransform = resolveTransform(tables, *spSRGB, intent, options);
+            EXPECT_EQ(nullptr, spTransform->matrixShaper());
+            // Its table, out of Lab, a matrix, the curves of sRGB; a black point is part of the matrix.
+            auto const& aStages = spTransform->stages();
+            ASSERT_EQ(4u, aStages.size());
+            EXPECT_TRUE(std::holds_alternative<GridStage>(aStages[0]));
+            EXPECT_TRUE(std::holds_alternative<ConnectionStage>(aStages[1]));
+            EXPECT_TRUE(std::holds_alternative<MatrixStage>(aStages[2]));
+            EXPECT_TRUE(std::holds_alternative<CurveStage>(aStages[3]));
+            Road const road(tables.handle(), spSRGB->handle(), intent,
+                            options != 0 ? cmsFLAGS_BLACKPOINTCOMPENSATION : 0);
+            EXPECT_LT(largestDifference(*spTransform, road), 2.0 / 32768.0);
         }
     }
-    EXPECT_LT(largestDifference(*spTransform, road), 2e-3);
     EXPECT_THROW(resolveTransform(*spSRGB, tables, 0, 0), std::runtime_error);
+}
+
+/// A grey device with a table: L is the square of the grey.
+ORVO::Test::Bytes greyTableProfile() {
+    cmsHPROFILE const pProfile = cmsCreateProfilePlaceholder(nullptr);
+    cmsSetProfileVersion(pProfile, 4.3);
+    cmsSetDeviceClass(pProfile, cmsSigInputClass);
+    cmsSetColorSpace(pProfile, cmsSigGrayData);
+    cmsSetPCS(pProfile, cmsSigLabData);
+    std::vector<cmsUInt16Number> aEntries;
+    for (int i = 0; i <= 64; ++i) {
+        double const grey = i / 64.0;
+        aEntries.push_back(static_cast<cmsUInt16Number>(std::lround(65535.0 * grey * grey)));
+        aEntries.push_back(0x8080); // a and b are 0
+        aEntries.push_back(0x8080);
+    }
+    cmsToneCurve* const pStraight = cmsBuildGamma(nullptr, 1.0);
+    cmsToneCurve* const aCurves[3] = {pStraight, pStraight, pStraight};
+    cmsPipeline* const pPipeline = cmsPipelineAlloc(nullptr, 1, 3);
+    cmsPipelineInsertStage(pPipeline, cmsAT_END, cmsStageAllocToneCurves(nullptr, 1, aCurves));
+    cmsPipelineInsertStage(pPipeline, cmsAT_END, cmsStageAllocCLut16bit(nullptr, 65, 1, 3, aEntries.data()));
+    cmsPipelineInsertStage(pPipeline, cmsAT_END, cmsStageAllocToneCurves(nullptr, 3, aCurves));
+    ORVO::Test::demand(cmsWriteTag(pProfile, cmsSigAToB0Tag, pPipeline));
+    cmsPipelineFree(pPipeline);
+    cmsFreeToneCurve(pStraight);
+    return ORVO::Test::bytesOf(pProfile);
+}
+
+TEST(TransformResolver, FitsACubeWhereTheStepsAreOthers) {
+    auto const aBytes = greyTableProfile();
+    Profile const tables(aBytes.data(), aBytes.size());
+    auto const spTransform = resolveTransform(tables, *profileFromCode(PROFILE_LINEAR_SRGB), 1, 0);
+    EXPECT_EQ(nullptr, spTransform->matrixShaper());
+    ColourCube const* const pCube = spTransform->colourCube();
+    ASSERT_NE(nullptr, pCube);
+    EXPECT_EQ(3u * 33 * 33 * 33, pCube->aValues_.size());
+    // L = 100 * 0.8^2 = 64: ((64 + 16) / 116)^3; the red and the blue sample do not count. Between nodes that
+    // are 1 / 32 apart a line leaves the curve, whose second derivative is 10.3 there, by 10.3 / 32^2 / 8.
+    double const light = 80.0 / 116.0 * (80.0 / 116.0) * (80.0 / 116.0);
+    expectColour({light, light, light}, spTransform->evaluate({0.1, 0.8, 0.9}), 1.3e-3);
+    // L = 6.25: 6.25 / 903.3
+    expectColour({0.00692, 0.00692, 0.00692}, spTransform->evaluate({0.25, 0.25, 0.25}), 5e-4);
 }
 
 } // namespace

@@ -172,6 +172,18 @@ TEST(CVantle, CallsTheNewProceduresOnceTheCounterMoved) {
               FakeEngine::calls());
 }
 
+TEST(CVantle, CallsTheNewProceduresOfAnEngineThatIsReplacedDuringTheLoad) {
+    FakeBinding const binding;
+    FakeEngine::whenAsked([](std::string const& sName) {
+        if (sName == "VantleInterface2/ProfileFromCode" && FakeEngine::unregistered() == 7) {
+            FakeEngine::unregister();
+            FakeEngine::serveNewVersion();
+        }
+    });
+    CVantle::ReferenceTransform(handle<VantleTransform>(1));
+    EXPECT_EQ((Names{"ReferenceTransformAnew 1"}), FakeEngine::calls());
+}
+
 TEST(CVantle, AStoppedBindingIsAnAbsentEngine) {
     {
         FakeBinding const binding;
@@ -217,6 +229,54 @@ TEST(CVantle, AFailedTransformLeavesNothingReferenced) {
         EXPECT_EQ(nullptr, pTransform) << test.pSelector;
         EXPECT_EQ(test.aCalls, FakeEngine::calls()) << test.pSelector;
     }
+}
+
+TEST(CVantle, AnEngineThatGoesMidwayLeavesNothingReferencedOnceItIsBack) {
+    for (char const* const pLast : {"ProfileFromCode", "MakeColorTransform"}) {
+        SCOPED_TRACE(pLast);
+        FakeBinding const binding;
+        static std::string sLast;
+        sLast = pLast;
+        FakeEngine::whenCalled([](std::string const& sSelector) {
+            if (sSelector == sLast && FakeEngine::unregistered() == 7) {
+                FakeEngine::unregister();
+                FakeEngine::missing() = {"VantleInterface2/ApplyGeneral"};
+            }
+        });
+        auto* pTransform = handle<VantleTransform>(99);
+        // Away for one load.
+        FakeEngine::whenAsked([](std::string const& sName) {
+            static int nAsked = 0;
+            if (sName == "VantleInterface2/ApplyGeneral" && FakeEngine::unregistered() == 8 &&
+                ++nAsked % 2 == 0) {
+                FakeEngine::missing().clear();
+            }
+        });
+        expectAbsent([&] { CVantle::makeTransform(&pTransform, 1, 2); });
+        EXPECT_EQ(nullptr, pTransform);
+        EXPECT_EQ(0, FakeEngine::references());
+    }
+}
+
+TEST(CVantle, AnEngineThatGoesForGoodMidwayIsToldOf) {
+    FakeBinding const binding;
+    FakeEngine::whenCalled([](std::string const&) {
+        FakeEngine::unregister();
+        FakeEngine::missing() = {"VantleInterface2/ApplyGeneral"};
+    });
+    auto* pTransform = handle<VantleTransform>(99);
+    expectAbsent([&] { CVantle::makeTransform(&pTransform, 1, 2); });
+    EXPECT_EQ(nullptr, pTransform);
+    EXPECT_EQ((Names{"ProfileFromCode 1"}), FakeEngine::calls());
+}
+
+TEST(CVantle, AMadeTransformIsTheOneReferenceThatIsLeft) {
+    FakeBinding const binding;
+    VantleTransform* pTransform = nullptr;
+    EXPECT_EQ(0u, CVantle::makeTransform(&pTransform, 1, 2));
+    EXPECT_EQ(1, FakeEngine::references());
+    CVantle::UnReferenceTransform(pTransform);
+    EXPECT_EQ(0, FakeEngine::references());
 }
 
 } // namespace

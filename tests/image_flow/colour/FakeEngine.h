@@ -37,6 +37,9 @@ public:
         nAtoms_ = 0;
         methodResult_ = nullptr;
         bCountRefused_ = false;
+        pWhenAsked_ = nullptr;
+        pWhenCalled_ = nullptr;
+        nReferences_ = 0;
         error_ = FakeError{"no such thing", "Fake"};
     }
 
@@ -59,10 +62,19 @@ public:
     static int atoms() { return nAtoms_; }
     static void setMethod(void* pMethod) { methodResult_ = pMethod; }
     static void refuseCount() { bCountRefused_ = true; }
+    /// Runs before each answer, with the "interface/selector" that is asked for.
+    static void whenAsked(void (*pHook)(std::string const&)) { pWhenAsked_ = pHook; }
+    /// Runs behind each operation, with its selector.
+    static void whenCalled(void (*pHook)(std::string const&)) { pWhenCalled_ = pHook; }
+    /// How many references on profiles, transforms and shaders are out.
+    static int references() { return nReferences_; }
 
     static void* address(char const* pInterface, char const* pSelector, char const* pProcName) {
         std::string const sName = std::string(pInterface) + "/" + pSelector;
         aAsked_.push_back(sName + "/" + pProcName);
+        if (pWhenAsked_ != nullptr) {
+            pWhenAsked_(sName);
+        }
         if (aMissing_.count(sName) != 0) {
             return nullptr;
         }
@@ -95,6 +107,9 @@ private:
         text << pSelector;
         (say(text, arguments), ...);
         aCalls_.push_back(text.str());
+        if (pWhenCalled_ != nullptr) {
+            pWhenCalled_(pSelector);
+        }
         auto const found = aResults_.find(pSelector);
         return found != aResults_.end() ? found->second : 0;
     }
@@ -104,6 +119,7 @@ private:
     static VantleResult give(Handle** pOut, std::uintptr_t number, VantleResult result) {
         if (result == 0) {
             *pOut = handle<Handle>(number);
+            ++nReferences_;
         }
         return result;
     }
@@ -132,8 +148,10 @@ private:
         std::string const s = "QuorContainerInterface/";
         a[s + "AddRef/QuorAddRefProc"] =
             of<QuorContainerAddRefProc>([](auto* p) { return record("AddRef", p); });
-        a[s + "Release/QuorReleaseProc"] =
-            of<QuorContainerReleaseProc>([](auto* p) { return record("Release", p); });
+        a[s + "Release/QuorReleaseProc"] = of<QuorContainerReleaseProc>([](auto* p) {
+            --nReferences_;
+            return record("Release", p);
+        });
         a[s + "GetMethod/QuorGetMethodV3Proc"] = of<QuorContainerGetMethodProc>(
             [](void** pOut, auto* pObject, auto* pSelector, auto* pProcName, std::uint32_t notRequired) {
                 *pOut = methodResult_;
@@ -205,7 +223,10 @@ private:
                 return give(pOut, 1000 + code, record("ProfileFromCode", code));
             });
         a[s + "UnReferenceProfile/Vantle_UnReferenceProfileProc2"] =
-            of<VantleUnReferenceProfileProc>([](auto* p) { return record("UnReferenceProfile", p); });
+            of<VantleUnReferenceProfileProc>([](auto* p) {
+                --nReferences_;
+                return record("UnReferenceProfile", p);
+            });
         a[s + "UnReferenceString/Vantle_UnReferenceStringProc2"] =
             of<VantleUnReferenceStringProc>([](auto* p) { return record("UnReferenceString", p); });
         a[s + "StringASCII/Vantle_StringASCIIProc2"] = of<VantleStringASCIIProc>(
@@ -218,9 +239,15 @@ private:
                 return give(pOut, 2000, record("MakeColorTransform", pSource, pDestination, intent, options));
             });
         a[s + "ReferenceTransform/Vantle_ReferenceTransformProc2"] =
-            of<VantleReferenceTransformProc>([](auto* p) { return record("ReferenceTransform", p); });
+            of<VantleReferenceTransformProc>([](auto* p) {
+                ++nReferences_;
+                return record("ReferenceTransform", p);
+            });
         a[s + "UnReferenceTransform/Vantle_UnReferenceTransformProc2"] =
-            of<VantleUnReferenceTransformProc>([](auto* p) { return record("UnReferenceTransform", p); });
+            of<VantleUnReferenceTransformProc>([](auto* p) {
+                --nReferences_;
+                return record("UnReferenceTransform", p);
+            });
         a[s + "ApplyGeneral/Vantle_ApplyGeneralProc2"] =
             of<VantleApplyGeneralProc>([](auto* p, auto const* pSource, auto const* pDestination,
                                           std::uint32_t rows, std::uint32_t columns, auto const* pOptions) {
@@ -279,6 +306,9 @@ private:
     static inline int nAtoms_ = 0;
     static inline void* methodResult_ = nullptr;
     static inline bool bCountRefused_ = false;
+    static inline void (*pWhenAsked_)(std::string const&) = nullptr;
+    static inline void (*pWhenCalled_)(std::string const&) = nullptr;
+    static inline int nReferences_ = 0;
 };
 
 /// The binding to the fake engine, up for a scope.

@@ -121,6 +121,48 @@ TEST(QuorTable, StaysAsItIsUntilTheCounterMoves) {
     EXPECT_EQ(8u, test.oTable_.loadCount());
 }
 
+TEST(QuorTable, AnEngineThatIsReplacedDuringTheLoadIsLoadedAgain) {
+    FakeBinding const binding;
+    TestTable test;
+    FakeEngine::whenAsked([](std::string const& sName) {
+        // The last row that is asked for; the others are the old engine's.
+        if (sName == "VantleShaderInterface/NewShader" && FakeEngine::unregistered() == 7) {
+            FakeEngine::unregister();
+        }
+    });
+    EXPECT_TRUE(test.oTable_.refresh());
+    EXPECT_EQ(6u, FakeEngine::asked().size());
+    EXPECT_EQ(8u, test.oTable_.loadCount());
+    EXPECT_TRUE(test.oTable_.refresh());
+    EXPECT_EQ(6u, FakeEngine::asked().size()) << "and then it rests";
+}
+
+TEST(QuorTable, AnEngineThatIsReplacedAllTheTimeEndsTheLoadAndIsLoadedAtTheNextUse) {
+    FakeBinding const binding;
+    TestTable test;
+    FakeEngine::whenAsked([](std::string const&) { FakeEngine::unregister(); });
+    EXPECT_EQ(1, test.oTable_.load());
+    EXPECT_EQ(12u, FakeEngine::asked().size()) << "four times three rows";
+    EXPECT_NE(FakeEngine::unregistered(), test.oTable_.loadCount());
+    FakeEngine::whenAsked(nullptr);
+    EXPECT_TRUE(test.oTable_.refresh());
+    EXPECT_EQ(15u, FakeEngine::asked().size());
+    EXPECT_EQ(FakeEngine::unregistered(), test.oTable_.loadCount());
+}
+
+TEST(QuorTable, AnEngineThatGoesAwayDuringTheLoadIsAbsent) {
+    FakeBinding const binding;
+    TestTable test;
+    FakeEngine::whenAsked([](std::string const& sName) {
+        if (sName == "VantleShaderInterface/NewShader") {
+            FakeEngine::unregister();
+            FakeEngine::missing() = {"VantleShaderInterface/CopyData"};
+        }
+    });
+    EXPECT_FALSE(test.oTable_.refresh());
+    EXPECT_EQ(nullptr, test.oTable_.procedure(0));
+}
+
 TEST(QuorTable, AnEngineThatGoesAwayNullsTheFirstWordAndMayComeBack) {
     FakeBinding const binding;
     TestTable test;

@@ -502,6 +502,8 @@ TEST_F(VantleFilterGPUTest, SurvivesEveryFailingCall) {
             }
             bFailed = failure.hasFired();
         }
+        // After a refused context none is current.
+        host().makeCurrent();
         EXPECT_EQ(0U, drainErrors());
         expectMixed(road, input);
         EXPECT_EQ(-1, upInput->boundTexUnit());
@@ -510,7 +512,7 @@ TEST_F(VantleFilterGPUTest, SurvivesEveryFailingCall) {
     for (char const* pName :
          {"glGenTextures", "glTexImage1D", "glTexImage2D", "glTexImage3D", "glTexSubImage1D",
           "glTexSubImage2D", "glTexSubImage3D", "glCreateProgram", "glCreateShader", "glCompileShader",
-          "glLinkProgram", "glFramebufferTexture2D", "glCheckFramebufferStatus"}) {
+          "glLinkProgram", "glFramebufferTexture2D", "glCheckFramebufferStatus", "eglMakeCurrent"}) {
         std::uint64_t n = 1;
         while (failedCall(pName, n))
             ++n;

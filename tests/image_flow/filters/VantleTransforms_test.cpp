@@ -13,6 +13,7 @@
 #include "orvo/image_flow/colour/CVantle.h"
 #include "orvo/image_flow/filters/VantleShaderAdapter.h"
 #include "tests/colour_engine/support/ICCProfiles.h"
+#include "tests/colour_engine/support/TableProfiles.h"
 #include "tests/support/RecordingEngine.h"
 
 #include <limits>
@@ -317,6 +318,38 @@ TEST_F(VantleTransformsTest, CubesAreInterpolated) {
     });
     Texels const expected = pictureOf(aOnCPU, 32768.0);
     EXPECT_LE(errorsOf(actual, input, [&](int x, int y) { return expected.at(x, y); }).dLargest_, 1e-3);
+}
+
+/// Profiles of tables are cubes on the GPU alone. Whose error is stated: mean and largest, against what the
+/// CPU makes of the profile's own tables.
+TEST_F(VantleTransformsTest, ProfilesOfTablesAreNearTheCPU) {
+    struct Row {
+        char const* name;
+        TableRecipe source;
+        std::uint32_t destination;
+        double mean;
+        double largest;
+    };
+    auto const aColours = colours<std::uint16_t>(32768);
+    Texels const input = pictureOf(aColours, 32768.0);
+    Road road(frameContext(), input, ImageGPU::PIXEL_FORMAT_RGBA32F,
+              ImageFilter::OUTPUT_PRECISION_16_BIT_FLOAT);
+    for (Row const& row : {Row{"camera", {true, 17, labOfCamera}, PROFILE_SRGB, 3e-4, 0.008},
+                           Row{"sRGB", {true, 33, labOfSRGB}, PROFILE_SRGB, 4e-4, 0.006},
+                           Row{"camera, linear", {true, 17, labOfCamera}, PROFILE_LINEAR_SRGB, 4e-4, 0.015},
+                           Row{"sRGB, wide gamut", {true, 33, labOfSRGB}, PROFILE_WIDE_GAMUT, 4e-4, 0.03}}) {
+        SCOPED_TRACE(row.name);
+        constexpr std::uint32_t iCode = profileCode("Tabl");
+        Bytes const aBytes = tableProfile(row.source);
+        registerProfile(iCode, aBytes.data(), aBytes.size());
+        EngineTransform const transform(iCode, row.destination);
+        EXPECT_TRUE(unregisterProfile(iCode));
+        Texels const expected = pictureOf(onCPU(aColours, transform), 32768.0);
+        Errors const errors =
+            errorsOf(road.run(transform.get()), input, [&](int x, int y) { return expected.at(x, y); });
+        EXPECT_LE(errors.dMean_, row.mean);
+        EXPECT_LE(errors.dLargest_, row.largest);
+    }
 }
 
 } // namespace
