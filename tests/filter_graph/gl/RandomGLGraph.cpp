@@ -187,7 +187,8 @@ BytePicture FilterBenches::run(GLKind eKind, Setting const& setting, std::vector
     }
     aupImages.push_back(std::make_unique<ClientImage>(region, true));
     bench.spSink->setImage(aupImages.back()->handle());
-    bench.aupImages = std::move(aupImages);
+    // The images of the last run are looked at once more when the next one begins.
+    bench.aupImages.swap(aupImages);
     OptimizationOptions options = glOptions();
     options.setCachingMode(OptimizationOptions::CACHING_OFF);
     bench.spProcessor->processFrame(options);
