@@ -23,7 +23,7 @@ void expectGreyRows() {
     UnevenProfile const profile;
     for (GreyRow const& row : greyRows()) {
         SCOPED_TRACE(row.pName_);
-        CPUColourGraph<T> graph(16, 16, row.filters(), row.nInput_, row.nOutput_);
+        PackedColourGraph<T> graph(16, 16, row.filters(), row.nInput_, row.nOutput_);
         fillWithLightColours(graph.oInput_);
         graph.spProcessor_->processFrame(cpuOptions());
         expectResultOf(row, graph.oInput_.pixels(), graph.oOutput_.pixels());
@@ -36,7 +36,7 @@ TEST_F(ColorspaceFrames, GreyGoesInAsRGBAndComesOutAsGreen) {
 }
 
 TEST_F(ColorspaceFrames, InBytesThereAndBackIsAsFarAsBytesCarry) {
-    CPUColourGraph<std::uint8_t> graph(64, 64, roundTrip());
+    PackedColourGraph<std::uint8_t> graph(64, 64, roundTrip());
     for (RoundTripRow const& row : roundTripRows()) {
         SCOPED_TRACE(row.pName_);
         row.fill(graph.oInput_);
@@ -51,9 +51,9 @@ TEST_F(ColorspaceFrames, FramesOnManyThreadsShareATransform) {
     constexpr int kThreads = 4;
     constexpr int kFrames = 8;
     UnevenProfile const profile;
-    std::vector<std::unique_ptr<CPUColourGraph<std::uint8_t>>> aGraphs;
+    std::vector<std::unique_ptr<PackedColourGraph<std::uint8_t>>> aGraphs;
     for (int i = 0; i < kThreads; ++i) {
-        aGraphs.push_back(std::make_unique<CPUColourGraph<std::uint8_t>>(
+        aGraphs.push_back(std::make_unique<PackedColourGraph<std::uint8_t>>(
             24, 24, std::vector<FilterPtr>{makeTransformer(UnevenProfile::kCode, PROFILE_BT_2020)}));
         aGraphs.back()->oInput_.fillAtRandom(static_cast<unsigned>(i));
     }

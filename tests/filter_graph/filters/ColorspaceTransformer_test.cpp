@@ -247,7 +247,7 @@ TEST_F(ColorspaceTransformerTest, ForwarderNamesTheSourceBeforeTheDestination) {
 
 template <typename T>
 void expectTheEnginesResult() {
-    CPUColourGraph<T> graph(37, 23, {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT)});
+    PackedColourGraph<T> graph(37, 23, {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT)});
     graph.oInput_.fillAtRandom(3);
     for (auto const& [source, destination] : {std::pair(PROFILE_SRGB, PROFILE_WIDE_GAMUT),
                                               {PROFILE_WIDE_GAMUT, PROFILE_SRGB},
@@ -267,7 +267,7 @@ TEST_F(ColorspaceTransformerTest, FramesFollowTheCodes) {
 TEST_F(ColorspaceTransformerTest, NewCodesDoNotRebuildTheGraph) {
     static std::atomic<int> nCalls;
     nCalls = 0;
-    CPUColourGraph<std::uint8_t> graph(8, 8, {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT)});
+    PackedColourGraph<std::uint8_t> graph(8, 8, {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT)});
     graph.oInput_.fillAtRandom(4);
     graph.spProcessor_->processFrame(cpuOptions());
     // A callback lives on the compiled graph: it is still called if that was kept.
@@ -286,9 +286,9 @@ TEST_F(ColorspaceTransformerTest, NewCodesDoNotRebuildTheGraph) {
 
 TEST_F(ColorspaceTransformerTest, ThereAndBackIsWithinOne) {
     // In words nothing of the way is lost; 255 codes of a byte are 32768 steps of a word.
-    CPUColourGraph<std::uint16_t> graph(64, 64,
-                                        {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT),
-                                         makeTransformer(PROFILE_WIDE_GAMUT, PROFILE_SRGB)});
+    PackedColourGraph<std::uint16_t> graph(64, 64,
+                                           {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT),
+                                            makeTransformer(PROFILE_WIDE_GAMUT, PROFILE_SRGB)});
     PackedImage<std::uint8_t> bytes(64, 64);
     bytes.fillAtRandom(5);
     auto const toWord = [](int byte) { return static_cast<std::uint16_t>((byte * 32768 + 127) / 255); };
@@ -302,7 +302,7 @@ TEST_F(ColorspaceTransformerTest, ThereAndBackIsWithinOne) {
 }
 
 TEST_F(ColorspaceTransformerTest, FramesWithUnknownCodesFailAndTheNextIsRight) {
-    CPUColourGraph<std::uint8_t> graph(4, 4, {makeTransformer(kUnknown, kUnknown)});
+    PackedColourGraph<std::uint8_t> graph(4, 4, {makeTransformer(kUnknown, kUnknown)});
     graph.oInput_.fillAtRandom(6);
     FilterPtr const& spFilter = graph.aFilters_.front();
     for (int i = 0; i < 2; ++i)
@@ -337,7 +337,7 @@ TEST_F(ColorspaceTransformerTest, FloatImagesAreRefusedOnTheCPU) {
 // 10,000 frames of 2 by 2 pixels, codes changed on every hundredth. Counted are tracked blocks and bytes, and
 // the engine's objects; references on the transforms, which are never dropped, are not objects.
 TEST_F(ColorspaceTransformerTest, TenThousandFramesLeaveNothing) {
-    CPUColourGraph<std::uint8_t> graph(2, 2, {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT)});
+    PackedColourGraph<std::uint8_t> graph(2, 2, {makeTransformer(PROFILE_SRGB, PROFILE_WIDE_GAMUT)});
     constexpr std::uint32_t aCodes[] = {PROFILE_WIDE_GAMUT, PROFILE_DISPLAY_P3, PROFILE_BT_2020};
     OptimizationOptions options = cpuOptions();
     options.setDebuggingMode(OptimizationOptions::DEBUGGING_SINGLE_THREAD);
@@ -373,7 +373,7 @@ TEST_F(ColorspaceTransformerTest, IsCreatedByTheFactory) {
     FilterPtr const spCreated = FilterFactory::Instance()->create(
         IFilter::Identifier("ColorspaceTransformer", "com.norvane.orvo", "Norvane"));
     setCodes(*spCreated, PROFILE_SRGB, PROFILE_BT_2020);
-    CPUColourGraph<std::uint8_t> graph(8, 8, {spCreated});
+    PackedColourGraph<std::uint8_t> graph(8, 8, {spCreated});
     graph.oInput_.fillAtRandom(7);
     graph.spProcessor_->processFrame(cpuOptions());
     EXPECT_EQ(transformed(graph.oInput_.pixels(), PROFILE_SRGB, PROFILE_BT_2020), graph.oOutput_.pixels());
@@ -413,10 +413,10 @@ class ColorspaceTransformerWithoutEngineTest : private WithoutEngine, public Fra
 
 TEST_F(ColorspaceTransformerWithoutEngineTest, SaysSoAndEverythingElseWorks) {
     {
-        CPUColourGraph<std::uint8_t> graph(4, 4, {makeTransformer(PROFILE_SRGB, PROFILE_BT_2020)});
+        PackedColourGraph<std::uint8_t> graph(4, 4, {makeTransformer(PROFILE_SRGB, PROFILE_BT_2020)});
         ORVO_EXPECT_INTERNAL(graph.spProcessor_->processFrame(cpuOptions()), kNoSource);
     }
-    CPUColourGraph<std::uint8_t> graph(4, 4, {std::make_shared<Internal::Bilateral>()});
+    PackedColourGraph<std::uint8_t> graph(4, 4, {std::make_shared<Internal::Bilateral>()});
     for (auto& value : graph.oInput_.pixels())
         value = 200;
     graph.spProcessor_->processFrame(cpuOptions());

@@ -5,9 +5,10 @@
 #include <vector>
 
 #include "orvo/filter_graph/impl/ImageGL.h"
-#include "tests/filter_graph/support/GLColourGraph.h"
+#include "tests/filter_graph/support/ColourGraph.h"
 #include "tests/filter_graph/support/GreyTransforms.h"
 #include "tests/filter_graph/support/RoundTrips.h"
+#include "tests/support/gl/GLFrameTest.h"
 
 namespace ORVO::FilterGraph {
 namespace {
@@ -21,27 +22,23 @@ TEST_F(ColorspaceFramesGL, GreyGoesInAsRGBAndComesOutAsGreen) {
     UnevenProfile const profile;
     for (GreyRow const& row : greyRows()) {
         SCOPED_TRACE(row.pName_);
-        PackedImage<std::uint8_t> input(16, 16, row.nInput_);
-        PackedImage<std::uint8_t> output(16, 16, row.nOutput_);
-        fillWithLightColours(input);
-        GLColourGraph graph(context(), input.handle(), output.handle(), row.filters());
-        graph.frame();
-        expectResultOf(row, input.pixels(), output.pixels());
+        PackedColourGraph<std::uint8_t> graph(16, 16, row.filters(), row.nInput_, row.nOutput_, context());
+        fillWithLightColours(graph.oInput_);
+        graph.spProcessor_->processFrame(glOptions());
+        expectResultOf(row, graph.oInput_.pixels(), graph.oOutput_.pixels());
     }
 }
 
 TEST_F(ColorspaceFramesGL, GreenGoesThroughOtherFiltersIntoGrey) {
     UnevenProfile const profile;
     GreyRow const& row = greyRows()[5]; // RGB to grey
-    PackedImage<std::uint8_t> input(16, 16, row.nInput_);
-    PackedImage<std::uint8_t> output(16, 16, row.nOutput_);
-    fillWithLightColours(input);
     std::vector<FilterPtr> aFilters = row.filters();
     aFilters.push_back(makeAddShader());
     setParameter(*aFilters.back(), "value", 0.0F);
-    GLColourGraph graph(context(), input.handle(), output.handle(), aFilters);
-    graph.frame();
-    expectResultOf(row, input.pixels(), output.pixels());
+    PackedColourGraph<std::uint8_t> graph(16, 16, aFilters, row.nInput_, row.nOutput_, context());
+    fillWithLightColours(graph.oInput_);
+    graph.spProcessor_->processFrame(glOptions());
+    expectResultOf(row, graph.oInput_.pixels(), graph.oOutput_.pixels());
 }
 
 TEST_F(ColorspaceFramesGL, AGreyTextureOfTheHostsGetsGreen) {
@@ -53,8 +50,12 @@ TEST_F(ColorspaceFramesGL, AGreyTextureOfTheHostsGetsGreen) {
     ImageGL output(
         ImageDescriptorGL({row.nOutput_, ImageDescriptor::CHANNEL_TYPE_UINT8}, PixelExtentInWorldSpace()),
         PositionExtentInPixelSpace(PositionInPixelSpace(0, 0), ExtentInPixelSpace(16, 16)), &texture);
-    GLColourGraph graph(context(), input.handle(), &output, row.filters());
-    graph.frame();
+    FilterPtr const spFilter = row.filters().front();
+    SourcePtr const spSource = makeGLSource(input.handle());
+    SinkPtr const spSink = makeGLSink(&output);
+    Connect(spSource, spFilter);
+    Connect(spFilter, spSink);
+    createProcessor(spSink, context())->processFrame(glOptions());
     std::vector<std::uint8_t> aResult(256);
     glBindTexture(GL_TEXTURE_2D, texture.objectID());
     glGetTexImage(GL_TEXTURE_2D, 0, GL_LUMINANCE, GL_UNSIGNED_BYTE, aResult.data());
@@ -85,21 +86,21 @@ TEST_F(ColorspaceFramesGL, TheImageAtTheEndDecides) {
 }
 
 TEST_F(ColorspaceFramesGL, InBytesThereAndBackIsAsFarAsBytesCarry) {
-    PackedImage<std::uint8_t> input(64, 64);
-    PackedImage<std::uint8_t> output(64, 64);
-    GLColourGraph graph(context(), input.handle(), output.handle(), roundTrip());
+    PackedColourGraph<std::uint8_t> graph(64, 64, roundTrip(), 4, 4, context());
+    auto const& aThere = graph.oInput_.pixels();
+    auto const& aBack = graph.oOutput_.pixels();
     OptimizationOptions inHalves = glOptions();
     inHalves.setIntermediateBufferPrecision(OptimizationOptions::INTERMEDIATE_PRECISION_16_BIT_FLOAT);
     for (RoundTripRow const& row : roundTripRows()) {
         SCOPED_TRACE(row.pName_);
-        row.fill(input);
-        graph.frame();
-        row.expectWithin(input.pixels(), output.pixels());
+        row.fill(graph.oInput_);
+        graph.spProcessor_->processFrame(glOptions());
+        row.expectWithin(aThere, aBack);
         if (row.nRange_ > 80)
             continue;
         // Halves are off by 1 / 2048 at most, up to white, a quarter of what bytes are: 4.7 codes become 1.2.
-        graph.frame(inHalves);
-        EXPECT_LE(largestDifference(input.pixels(), output.pixels()), 1);
+        graph.spProcessor_->processFrame(inHalves);
+        EXPECT_LE(largestDifference(aThere, aBack), 1);
     }
 }
 

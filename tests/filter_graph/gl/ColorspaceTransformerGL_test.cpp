@@ -7,8 +7,9 @@
 #include "orvo/image_runtime/TexturePool.h"
 #include "orvo/ogl/ExceptionOGL.h"
 #include "tests/colour_engine/support/ICCProfiles.h"
-#include "tests/filter_graph/support/GLColourGraph.h"
+#include "tests/filter_graph/support/ColourGraph.h"
 #include "tests/support/Expect.h"
+#include "tests/support/gl/GLFrameTest.h"
 
 #include <cmath>
 #include <set>
@@ -22,6 +23,31 @@ using namespace ORVO::ColourEngine;
 constexpr std::uint32_t kNoCode = profileCode("none");
 /// sRGB, with sampled curves: they are textures.
 constexpr std::uint32_t kSampled = profileCode("File");
+
+/// source -> transformers -> sink, in textures.
+class GLColourGraph {
+public:
+    GLColourGraph(OGL::Context const* pContext, ImageBase* pInput, ImageBase* pOutput,
+                  std::vector<FilterPtr> const& aFilters)
+        : aFilters_(aFilters),
+          spSource_(makeGLSource(pInput)),
+          spSink_(makeGLSink(pOutput)),
+          spProcessor_(createProcessor(spSink_, pContext)) {
+        Connect(spSource_, aFilters_.front());
+        for (std::size_t i = 1; i < aFilters_.size(); ++i)
+            Connect(aFilters_[i - 1], aFilters_[i]);
+        Connect(aFilters_.back(), spSink_);
+    }
+
+    IFilter& filter() { return *aFilters_.front(); }
+    void frame(OptimizationOptions const& options = glOptions()) { spProcessor_->processFrame(options); }
+
+private:
+    std::vector<FilterPtr> aFilters_;
+    SourcePtr spSource_;
+    SinkPtr spSink_;
+    std::shared_ptr<IProcessor> spProcessor_;
+};
 
 class ColorspaceTransformerGLTest : public GLFrameTest {
 protected:

@@ -95,12 +95,16 @@ std::vector<T> transformed(std::vector<T> const& aPixels, std::uint32_t source, 
     return aResult;
 }
 
-/// source -> transformers -> sink, on the CPU.
+/// source -> transformers -> sink, between images in host memory.
 template <typename T>
-struct CPUColourGraph {
-    CPUColourGraph(int width, int height, std::vector<FilterPtr> const& aFilters, std::size_t nInput = 4,
-                   std::size_t nOutput = 4)
-        : aFilters_(aFilters), oInput_(width, height, nInput), oOutput_(width, height, nOutput) {
+struct PackedColourGraph {
+    /// @param pContext for frames on OpenGL.
+    PackedColourGraph(int width, int height, std::vector<FilterPtr> const& aFilters, std::size_t nInput = 4,
+                      std::size_t nOutput = 4, OGL::Context const* pContext = nullptr)
+        : aFilters_(aFilters),
+          oInput_(width, height, nInput),
+          oOutput_(width, height, nOutput),
+          spProcessor_(FilterGraph::createProcessor(spSink_, pContext)) {
         spSource_->setImage(oInput_.handle());
         spSink_->setImage(oOutput_.handle());
         FilterGraph::Connect(spSource_, aFilters_.front());
@@ -114,7 +118,7 @@ struct CPUColourGraph {
     PackedImage<T> oOutput_;
     SourcePtr spSource_ = FilterGraph::createInputAdapter(IAdapter::REGION_SYNC_FROM_IMAGE);
     SinkPtr spSink_ = FilterGraph::createOutputAdapter(IAdapter::REGION_SYNC_FROM_IMAGE);
-    std::shared_ptr<FilterGraph::IProcessor> spProcessor_ = FilterGraph::createProcessor(spSink_, nullptr);
+    std::shared_ptr<FilterGraph::IProcessor> spProcessor_;
 };
 
 /// The largest difference between values at the same place.
