@@ -29,7 +29,6 @@ namespace ORVO {
 namespace {
 
 using ImageFlow::bilateral::PixelBuffer;
-using ImageFlow::bilateral::ScopedPlainDrawing;
 using ImageFlow::bilateral::ScopedTarget;
 
 /// Cells of the grid beyond those of the image: four at either end, and one.
@@ -200,7 +199,6 @@ void FastBilateralFilterGPU::internalProcess() {
         enableInputUnit(states);
         // A frame that failed may have left a program behind, if the driver took its context away.
         glUseProgram(0);
-        ScopedPlainDrawing const plain;
         readParameters();
         setUpOutput(input);
         setUpQuad(input);

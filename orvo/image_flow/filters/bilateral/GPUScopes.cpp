@@ -2,7 +2,6 @@
 
 #include "orvo/image_runtime/images/ImageGPU.h"
 #include "orvo/ogl/ExceptionOGL.h"
-#include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/Framebuffer.h"
 #include "orvo/ogl/NativeContext.h"
 #include "orvo/ogl/Program.h"
@@ -10,7 +9,6 @@
 #include "orvo/ogl/TextureState.h"
 #include "orvo/ogl/TokenName.h"
 #include "orvo/ogl/internal/GL.h"
-#include "orvo/ogl/internal/Scopes.h"
 
 #include <array>
 #include <string>
@@ -30,14 +28,6 @@ void undoInContext(Undo const& code) noexcept {
     } catch (...) {
         // Another context is current than the one in which the scope began.
         return;
-    }
-}
-
-void setCapability(GLenum capability, bool bEnabled) {
-    if (bEnabled) {
-        glEnable(capability);
-    } else {
-        glDisable(capability);
     }
 }
 
@@ -108,53 +98,6 @@ ScopedInput::~ScopedInput() {
         OGL::TextureUnit::Unit(0).setEnv(eEnvironment_);
         oImage_.bindDefault();
     });
-}
-
-ScopedPlainDrawing::ScopedPlainDrawing()
-    : bSecondVersion_(OGL::ExtensionManager::Instance()->majorVersion() >= 2),
-      nColorEquation_(OGL::Internal::integerState(GL_BLEND_EQUATION)),
-      nAlphaEquation_(bSecondVersion_ ? OGL::Internal::integerState(GL_BLEND_EQUATION_ALPHA)
-                                      : nColorEquation_) {
-    int const nArrays = bSecondVersion_ ? OGL::Internal::integerState(GL_MAX_VERTEX_ATTRIBS) : 0;
-    for (unsigned i = 0; i < static_cast<unsigned>(nArrays); ++i) {
-        GLint nEnabled = GL_FALSE;
-        glGetVertexAttribiv(i, GL_VERTEX_ATTRIB_ARRAY_ENABLED, &nEnabled);
-        if (nEnabled != GL_FALSE) {
-            aArrays_.push_back(i);
-        }
-    }
-    // Nothing below throws.
-    setEquations(GL_FUNC_ADD, GL_FUNC_ADD);
-    for (unsigned const array : aArrays_) {
-        glDisableVertexAttribArray(array);
-    }
-    if (bSecondVersion_) {
-        bSprites_ = glIsEnabled(GL_POINT_SPRITE) != GL_FALSE;
-        bProgramSizes_ = glIsEnabled(GL_VERTEX_PROGRAM_POINT_SIZE) != GL_FALSE;
-        glDisable(GL_POINT_SPRITE);
-        glDisable(GL_VERTEX_PROGRAM_POINT_SIZE);
-    }
-}
-
-ScopedPlainDrawing::~ScopedPlainDrawing() {
-    undoInContext([this] {
-        setEquations(nColorEquation_, nAlphaEquation_);
-        for (unsigned const array : aArrays_) {
-            glEnableVertexAttribArray(array);
-        }
-        if (bSecondVersion_) {
-            setCapability(GL_POINT_SPRITE, bSprites_);
-            setCapability(GL_VERTEX_PROGRAM_POINT_SIZE, bProgramSizes_);
-        }
-    });
-}
-
-void ScopedPlainDrawing::setEquations(int nColor, int nAlpha) const {
-    if (bSecondVersion_) {
-        glBlendEquationSeparate(static_cast<GLenum>(nColor), static_cast<GLenum>(nAlpha));
-    } else {
-        glBlendEquation(static_cast<GLenum>(nColor));
-    }
 }
 
 } // namespace ORVO::ImageFlow::bilateral

@@ -1,10 +1,7 @@
 #pragma once
 
-#include "orvo/core/Export.h"
 #include "orvo/image_runtime/ShaderProgramProxyOGLAutoLock.h"
 #include "orvo/ogl/TextureUnit.h"
-
-#include <vector>
 
 namespace ORVO {
 
@@ -65,31 +62,6 @@ public:
 private:
     ImageGPU const& oImage_;
     OGL::TextureUnit::Environment eEnvironment_;
-};
-
-/// Drawing with blend equations that add, without point sprites, sizes of points from programs, and generic
-/// arrays, which a host may have set: sprites replace the texture coordinates of points (some drivers: of
-/// everything), and the first generic array the vertices.
-///
-/// Threads: as ScopedTarget.
-class ORVO_API ScopedPlainDrawing {
-public:
-    ScopedPlainDrawing();
-    ~ScopedPlainDrawing();
-    ScopedPlainDrawing(ScopedPlainDrawing const&) = delete;
-    ScopedPlainDrawing& operator=(ScopedPlainDrawing const&) = delete;
-
-private:
-    void setEquations(int nColor, int nAlpha) const;
-
-    /// Whether the driver has the state of version 2: equations for alpha, sprites, sizes, generic arrays.
-    bool bSecondVersion_;
-    int nColorEquation_;
-    int nAlphaEquation_;
-    bool bSprites_ = false;
-    bool bProgramSizes_ = false;
-    /// The generic arrays that were enabled.
-    std::vector<unsigned> aArrays_;
 };
 
 } // namespace ImageFlow::bilateral
