@@ -461,7 +461,7 @@ void RandomGLGraph::evaluateRegions() {
 }
 
 BytePicture RandomGLGraph::evaluateBilateral(Node const& node, BytePicture const& input) {
-    BytePicture const result = benches_.run(GLKind::BILATERAL_NODE, node.setting, {input}, computed(node));
+    BytePicture result = benches_.run(GLKind::BILATERAL_NODE, node.setting, {input}, computed(node));
     // Independent of any graph: the formulas in double precision.
     EXPECT_LE(
         largestByteDifference(result, gpuBilateral::filtered(input.texels(), computed(node), node.bilateral)),

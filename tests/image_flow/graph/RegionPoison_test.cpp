@@ -7,6 +7,7 @@
 #include "orvo/image_flow/filters/FastBilateralFilterCPUNode.h"
 #include "orvo/image_flow/filters/LABToRGBCPU.h"
 #include "orvo/image_flow/filters/RGBToLABCPU.h"
+#include "orvo/image_flow/filters/SimpleBilateralFilterCPU.h"
 #include "tests/image_flow/support/Compounds.h"
 #include "tests/support/ImageFlowLayers.h"
 
@@ -132,14 +133,23 @@ protected:
 
     /// Asks for parts inside, at the corners and beyond the edges of the picture.
     static void check(Builder build) {
-        for (auto const& asked :
-             {world(0, 10, 8, 6), world(-10, 5, 60, 40), world(-14, 0, 9, 9), world(43, 38, 20, 20),
-              world(7, 9, 1, 1), world(20.25f, 20.5f, 3.5f, 2.25f)}) {
+        checkInside(build);
+        check(build, {world(-10, 5, 60, 40), world(-14, 0, 9, 9), world(43, 38, 20, 20)});
+    }
+
+    /// Asks for parts inside alone.
+    static void checkInside(Builder build, Poison poison = Poison::NAN_AND_MEMORY) {
+        check(build, {world(0, 10, 8, 6), world(7, 9, 1, 1), world(20.25f, 20.5f, 3.5f, 2.25f)}, poison);
+    }
+
+    static void check(Builder build, std::vector<PositionExtentInWorldSpace> const& aAsked,
+                      Poison poison = Poison::NAN_AND_MEMORY) {
+        for (auto const& asked : aAsked) {
             SCOPED_TRACE(testing::Message() << asked);
             std::vector<float> const clean = run(build, asked, Poison::NONE);
             EXPECT_FALSE(clean.empty());
             EXPECT_EQ(0, std::count_if(clean.begin(), clean.end(), [](float f) { return std::isnan(f); }));
-            EXPECT_EQ(clean, run(build, asked, Poison::NAN_AND_MEMORY));
+            EXPECT_EQ(clean, run(build, asked, poison));
         }
     }
 
@@ -211,6 +221,20 @@ TEST_F(PoisonTest, throughTheFiltersOfTheLibrary) {
                                         }}) {
         check(build);
     }
+}
+
+TEST_F(PoisonTest, throughTheSimpleBilateralFilterAwayFromTheEdges) {
+    // What stands beyond the edges of the picture comes from elsewhere in it, as the filter's header says: it
+    // is read for every row, and used at the edges alone.
+    checkInside(
+        [](Nodes& nodes, ImageFilter& source) {
+            auto upFilter = std::make_unique<SimpleBilateralFilterCPU>();
+            upFilter->spatialSigma().setValue(3.0f);
+            upFilter->rangeSigma().setValue(0.5f);
+            nodes.push_back(std::move(upFilter));
+            feed(*nodes.back(), 0, source);
+        },
+        Poison::NAN_ONLY);
 }
 
 TEST_F(PoisonTest, throughGraphsInsideNodesAndABuffer) {
