@@ -27,6 +27,7 @@
 #include <epoxy/gl.h>
 #include <lcms2.h>
 
+#include <array>
 #include <cmath>
 #include <memory>
 #include <stdexcept>
@@ -140,14 +141,15 @@ struct Turns {
 
 /// Makes a space of sampled curves known under a code: the primaries of sRGB, a gamma in 1024 entries.
 std::uint32_t registerSampledSpace(std::uint32_t nCode, double gamma) {
-    std::vector<cmsFloat32Number> aEntries;
-    for (int i = 0; i < 1024; ++i)
-        aEntries.push_back(static_cast<float>(std::pow(i / 1023.0, gamma)));
-    cmsToneCurve* const pCurve = cmsBuildTabulatedToneCurveFloat(nullptr, 1024, aEntries.data());
+    std::array<cmsFloat32Number, 1024> aEntries{};
+    for (std::size_t i = 0; i < aEntries.size(); ++i)
+        aEntries[i] = static_cast<float>(std::pow(static_cast<double>(i) / 1023.0, gamma));
+    cmsToneCurve* const pCurve = cmsBuildTabulatedToneCurveFloat(
+        nullptr, static_cast<cmsUInt32Number>(aEntries.size()), aEntries.data());
     cmsToneCurve* const aCurves[] = {pCurve, pCurve, pCurve};
     cmsCIExyY const white = {0.3127, 0.3290, 1.0};
     cmsCIExyYTRIPLE const primaries = {{0.64, 0.33, 1.0}, {0.30, 0.60, 1.0}, {0.15, 0.06, 1.0}};
-    cmsHPROFILE const pProfile = cmsCreateRGBProfile(&white, &primaries, aCurves);
+    cmsHPROFILE pProfile = cmsCreateRGBProfile(&white, &primaries, aCurves);
     cmsFreeToneCurve(pCurve);
     cmsUInt32Number nBytes = 0;
     cmsSaveProfileToMem(pProfile, nullptr, &nBytes);

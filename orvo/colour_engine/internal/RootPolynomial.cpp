@@ -6,6 +6,8 @@
 #include <cmath>
 #include <cstddef>
 #include <numbers>
+#include <sstream>
+#include <utility>
 
 namespace ORVO::ColourEngine::Internal {
 
@@ -118,23 +120,26 @@ float RootPolynomial::operator()(float t) const {
 }
 
 std::string RootPolynomial::statements() const {
-    std::string sText;
+    std::ostringstream text;
     for (unsigned i = 1; i <= oForm_.nRoots_; ++i) {
-        sText += "    float " + rootName(i) + " = sqrt(" + rootName(i - 1) + ");\n";
+        text << "    float " << rootName(i) << " = sqrt(" << rootName(i - 1) << ");\n";
     }
+    text << "    float power = " << rootName(oForm_.nFactorRoots_) << " * (";
     // In pairs of terms, so that no product waits for all of those before it.
-    std::string sSum;
-    for (std::size_t i = (aCoefficients_.size() - 1) / 2 * 2;; i -= 2) {
-        std::string sPair = shaderNumber(aCoefficients_[i]);
+    std::string sClosing;
+    for (std::size_t i = 0; i < aCoefficients_.size(); i += 2) {
+        bool const bLast = i + 2 >= aCoefficients_.size();
+        text << (bLast ? "" : "(") << shaderNumber(aCoefficients_[i]);
         if (i + 1 < aCoefficients_.size()) {
-            sPair += " + " + shaderNumber(aCoefficients_[i + 1]) + " * " + rootName(oForm_.nRoots_);
+            text << " + " << shaderNumber(aCoefficients_[i + 1]) << " * " << rootName(oForm_.nRoots_);
         }
-        sSum =
-            sSum.empty() ? sPair : "(" + sPair + ") + " + rootName(oForm_.nRoots_ - 1) + " * (" + sSum + ")";
-        if (i == 0) {
-            return sText + "    float power = " + rootName(oForm_.nFactorRoots_) + " * (" + sSum + ");\n";
+        if (!bLast) {
+            text << ") + " << rootName(oForm_.nRoots_ - 1) << " * (";
+            sClosing += ')';
         }
     }
+    text << sClosing << ");\n";
+    return text.str();
 }
 
 } // namespace ORVO::ColourEngine::Internal

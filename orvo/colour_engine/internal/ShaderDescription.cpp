@@ -131,7 +131,7 @@ public:
     std::string functions() const {
         std::string sText = bTables_ ? pCurveFunction : "";
         for (auto const& [sBody, sName] : aFunctions_) {
-            sText += "float " + sName + "(float x) {\n" + sBody + "}\n";
+            sText.append("float ").append(sName).append("(float x) {\n").append(sBody).append("}\n");
         }
         return sText;
     }
