@@ -211,7 +211,9 @@ inline GridPlace placeAlong(float clamped, float last) {
     float position = clamped * last;
     if (bWords) {
         float const steps = static_cast<float>(nearestWord(clamped)) * last;
-        auto const carry = static_cast<std::int32_t>(steps * (1.0F / 65535.0F) + 0.5F);
+        float const parts = steps * (1.0F / 65535.0F);
+        auto const wholeParts = static_cast<std::int32_t>(parts);
+        std::int32_t const carry = wholeParts + (parts - static_cast<float>(wholeParts) >= 0.5F ? 1 : 0);
         position = (steps + static_cast<float>(carry)) * (1.0F / 65536.0F);
     }
     auto const whole = static_cast<std::int32_t>(position);
