@@ -17,12 +17,12 @@ using Colour = std::array<double, 3>;
 constexpr double dKink = 216.0 / 24389.0;
 constexpr double dSlope = 24389.0 / 2700.0;
 
-double lightnessOf(double light) {
+double cubeLightness(double light) {
     double const size = std::abs(light);
     return std::copysign(size > dKink ? 1.16 * std::cbrt(size) - 0.16 : dSlope * size, light);
 }
 
-double lightOf(double lightness) {
+double cubeLight(double lightness) {
     double const size = std::abs(lightness);
     double const root = (size + 0.16) / 1.16;
     return std::copysign(size > dSlope * dKink ? root * root * root : size / dSlope, lightness);
@@ -34,18 +34,18 @@ struct Content {
     std::optional<std::array<ChannelCurve, 3>> oOutputCurves_;
 };
 
-Content lightnessBefore(TableStages const& aStages, CurveStage const& last) {
+Content cubeLightnessBefore(TableStages const& aStages, CurveStage const& last) {
     Content content;
     content.value_ = [&aStages](Colour const& colour) {
         Colour result = evaluateStages(aStages, aStages.size() - 1, colour);
         for (double& value : result) {
-            double const part = (lightnessOf(value) - ColourCube::dLowest_) / ColourCube::dSpan_;
+            double const part = (cubeLightness(value) - ColourCube::dLowest_) / ColourCube::dSpan_;
             value = ColourCube::dLowest_ + ColourCube::dSpan_ * clampToUnit(part);
         }
         return result;
     };
     auto const behind = [](ChannelCurve const& curve) {
-        return ChannelCurve([curve](double lightness) { return curve(lightOf(lightness)); });
+        return ChannelCurve([curve](double lightness) { return curve(cubeLight(lightness)); });
     };
     content.oOutputCurves_ = {behind(last.aCurves_[0]), behind(last.aCurves_[1]), behind(last.aCurves_[2])};
     return content;
@@ -211,7 +211,7 @@ ColourCube fitCube(TableStages const& aStages) {
     std::vector<Content> aContents = {{exact, std::nullopt}};
     auto const* const pLast = aStages.empty() ? nullptr : std::get_if<CurveStage>(&aStages.back());
     if (pLast != nullptr) {
-        aContents.push_back(lightnessBefore(aStages, *pLast));
+        aContents.push_back(cubeLightnessBefore(aStages, *pLast));
     }
     return best(exact, aContents);
 }
