@@ -136,7 +136,8 @@ bool runSixteenBitsThroughFloat(std::shared_ptr<FG::IFilter> const& filter, Pict
     return runGraph(Graph(floats, {}, result), result.depth, FrameSettings());
 }
 
-// Found out by a frame of a few pixels.
+} // namespace
+
 bool takesSixteenBits(std::shared_ptr<FG::IFilter> const& filter) {
     Picture const source(4, 4, 4, Depth::uint15_1);
     Picture result(4, 4, 4, Depth::uint15_1);
@@ -146,8 +147,6 @@ bool takesSixteenBits(std::shared_ptr<FG::IFilter> const& filter) {
         return false;
     }
 }
-
-} // namespace
 
 bool runFrames(std::shared_ptr<FG::IFilter> const& filter, Picture const& source, Picture& result,
                FrameSettings const& settings) {

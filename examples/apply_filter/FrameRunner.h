@@ -32,6 +32,10 @@ struct FrameSettings {
 bool runFrames(std::shared_ptr<ORVO::FilterGraph::IFilter> const& filter, Picture const& source,
                Picture& result, FrameSettings const& settings);
 
+/// Whether frames of the filter on the CPU are of 16 bits from end to end; where they are not, runFrames
+/// computes 16-bit pictures in floats. Found out by a frame of a few pixels.
+[[nodiscard]] bool takesSixteenBits(std::shared_ptr<ORVO::FilterGraph::IFilter> const& filter);
+
 /// Whether the filter runs on the CPU, for a null context, or on OpenGL in this context: found out by a frame
 /// of a few pixels.
 [[nodiscard]] bool runsOn(ORVO::OGL::Context const* context,

@@ -182,14 +182,17 @@ void BandReader::readRows(Band& band, int first, int end) const {
     auto const rows = static_cast<std::size_t>(end - first);
     auto* const target = band.picture.pixels.data() +
                          static_cast<std::size_t>(first - band.firstRow) * band.picture.rowBytes();
-    if (!hasAssociatedAlpha(file_->spec)) {
+    bool const dividesByAlpha = hasAssociatedAlpha(file_->spec);
+    // The scale of 16 bits is the engine's own, which OpenImageIO does not know.
+    if (!dividesByAlpha && depth_ != Depth::uint15_1) {
         auto const type = depth_ == Depth::uint8 ? OIIO::TypeDesc::UINT8 : OIIO::TypeDesc::FLOAT;
         file_->read(first, end, type, target);
         return;
     }
     std::vector<float> values(width * rows * channels());
     file_->read(first, end, OIIO::TypeDesc::FLOAT, reinterpret_cast<unsigned char*>(values.data()));
-    changeAlpha(values, channels(), true);
+    if (dividesByAlpha)
+        changeAlpha(values, channels(), true);
     Picture part(width, rows, channels(), depth_);
     floatsToPicture(values, part);
     std::memcpy(target, part.pixels.data(), part.pixels.size());

@@ -24,8 +24,9 @@ constexpr std::size_t softwareDriver = std::size_t(160) << 20U;
 constexpr std::size_t unusedTextures = std::size_t(64) << 20U;
 
 FG::ImageDescriptor::Format formatOf(std::size_t channels, Depth depth) {
-    return {channels, depth == Depth::uint8 ? FG::ImageDescriptor::CHANNEL_TYPE_UINT8
-                                            : FG::ImageDescriptor::CHANNEL_TYPE_FLOAT32};
+    return {channels, depth == Depth::uint8      ? FG::ImageDescriptor::CHANNEL_TYPE_UINT8
+                      : depth == Depth::uint15_1 ? FG::ImageDescriptor::CHANNEL_TYPE_UINT15_1
+                                                 : FG::ImageDescriptor::CHANNEL_TYPE_FLOAT32};
 }
 
 ORVO::PositionExtentInWorldSpace worldOf(Rectangle const& rectangle) {
@@ -122,6 +123,14 @@ struct TileFrame::Graph {
         tile->storageCPU2GL(pixels.pixels.data(), tile->storageGL());
         input->setImage(&tile->image());
     }
+
+    void compute(Rectangle const& computed, Picture& pixels) {
+        pixels.resize(static_cast<std::size_t>(computed.extent().width()),
+                      static_cast<std::size_t>(computed.extent().height()), descriptor.format().nChannel,
+                      settings.depth);
+        result = FG::ImageCPU(descriptor, computed, pixels.pixels.data(), 0);
+        processor->processFrameEmbedded(options);
+    }
 };
 
 TileFrame::TileFrame(std::shared_ptr<FG::IFilter> filter, TileFrameSettings const& settings)
@@ -153,22 +162,35 @@ void TileFrame::run(Band const& band, Rectangle const& computed, Picture& result
     } else {
         graph.bindBand(band, part);
     }
-    result.resize(static_cast<std::size_t>(computed.extent().width()),
-                  static_cast<std::size_t>(computed.extent().height()), graph.descriptor.format().nChannel,
-                  graph.settings.depth);
-    graph.result = FG::ImageCPU(graph.descriptor, computed, result.pixels.data(), 0);
-    graph.processor->processFrameEmbedded(graph.options);
+    graph.compute(computed, result);
+}
+
+void TileFrame::tryOut(Rectangle const& computed) {
+    Graph& graph = *graph_;
+    Rectangle const part = needed(computed);
+    Picture const black(static_cast<std::size_t>(part.extent().width()),
+                        static_cast<std::size_t>(part.extent().height()), graph.descriptor.format().nChannel,
+                        graph.settings.depth);
+    graph.bindTexture(black, part);
+    Picture result;
+    graph.compute(computed, result);
 }
 
 MemoryUse TileFrame::memoryUse() const {
     TileFrameSettings const& settings = graph_->settings;
-    std::size_t const channel = bytesPerChannel(settings.depth);
+    // Pictures of 16 bits are read and written by way of floats.
+    std::size_t const channel = settings.depth == Depth::uint8 ? 1 : sizeof(float);
     std::size_t const pixel = workingChannels(settings) * channel;
-    // On the CPU four planes of floats, which the store keeps; on OpenGL the copy, its texture, and textures
-    // and buffers of floats, which may be larger than the tile.
-    std::size_t const work = settings.context ? 2 * pixel + 96 : 16 + (settings.channels < 3 ? pixel : 0);
-    std::size_t const fixed = settings.context ? softwareDriver + unusedTextures : 0;
-    return {program + fixed, settings.channels * channel, pixel, work, settings.context ? work / 2 : work};
+    std::size_t const file = settings.channels * channel;
+    if (settings.context) {
+        // The copy, its texture, and textures and buffers of floats, which may be larger than the tile.
+        std::size_t const work = 2 * pixel + 96;
+        return {program + softwareDriver + unusedTextures, file, pixel,
+                work + gridTexturesOf(*graph_->filter), work / 2};
+    }
+    // Four planes of floats, which the store keeps.
+    std::size_t const work = 16 + (settings.channels < 3 ? pixel : 0);
+    return {program, file, pixel, work, work};
 }
 
 } // namespace example

@@ -24,7 +24,7 @@ struct TileFrameSettings {
     int width = 0;                               ///< of the whole picture
     int height = 0;
     std::size_t channels = 0;      ///< of the file
-    Depth depth = Depth::uint8;    ///< 8 bits or float
+    Depth depth = Depth::uint8;    ///< on OpenGL 8 bits or float
     std::size_t textureMemory = 0; ///< bytes of textures that may be held, on OpenGL
 };
 
@@ -45,6 +45,10 @@ public:
     /// Computes a part of the picture from a band that has the pixels needed for it. Grey comes out as
     /// colour, and on OpenGL every picture has alpha. Throws what the engine throws.
     void run(Band const& band, Rectangle const& computed, Picture& result);
+
+    /// Computes a part of a black picture on OpenGL, for its textures: throws what the engine throws where
+    /// the driver refuses them.
+    void tryOut(Rectangle const& computed);
 
     [[nodiscard]] MemoryUse memoryUse() const;
 

@@ -9,15 +9,16 @@ namespace example {
 char const tileUsageText[] = R"(Usage: process_tiles --filter NAME [options] INPUT OUTPUT
 
 Runs one filter over a picture file of any size, tile by tile. The output is a tiled TIFF or EXR file.
-Pictures of 8 bits are computed in 8 bits, others in floats. A TIFF file keeps the picture's ICC profile,
-unless the filter leads to other colours.
+Pictures of 8 bits are computed in 8 bits, others in floats; those of 16 bits in 16 bits by filters that do so
+on the CPU. A TIFF file keeps the picture's ICC profile, unless the filter leads to other colours.
 
   --filter NAME        the filter to run (apply_filter --list shows the filters)
   --target TARGET      cpu (the default), or gl: OpenGL in a context without a window
   --set NAME=VALUE     a parameter; vectors as numbers with commas: --set spatialSigma=10,10
                        colour spaces as four characters or a number: --set srcProfile=sRGB. Where the file
                        has an ICC profile, that is the source unless srcProfile is set
-  --tile N             size of a tile in pixels, 2048 by default; tiles are smaller where memory demands
+  --tile N             size of a tile in pixels, 2048 by default; tiles are smaller where memory demands,
+                       and on gl where the driver has no textures for more
   --memory-limit MIB   memory that may be used, 512 by default; on gl textures count, too. A compressed strip
                        of a TIFF file is held whole, beyond the limit where it is a long one
   --threads N          number of threads that compute; all by default

@@ -9,6 +9,7 @@
 #include <cmath>
 #include <cstdint>
 #include <numeric>
+#include <optional>
 #include <string>
 
 namespace example {
@@ -28,6 +29,14 @@ constexpr int comfortableSide = 1024;
 
 // The result that is computed, the one that waits and the one that is being written.
 constexpr std::size_t resultsInFlight = 3;
+
+// Of 16-bit floats with four channels, in the texture that is read and in that which is drawn to. The padding
+// is that of the intensity axis; that of the others is less than the margin.
+constexpr double cellBytes = 16.0;
+constexpr double paddingCells = 9.0;
+
+// For a pixel: more than anybody has memory for, and still a number of bytes for any picture.
+constexpr double mostCells = 1e7;
 
 int roundedUp(int value, int unit) { return (value + unit - 1) / unit * unit; }
 
@@ -64,6 +73,15 @@ std::size_t bytesNeeded(Rectangle const& window, Rectangle const& picture, Memor
         std::min(window.extent().height() + use.rowUnit - 1, picture.extent().height()));
     return 2 * rows * static_cast<std::size_t>(width) * use.file +
            areaOf(window) * (resultsInFlight * use.result + use.work + use.kept);
+}
+
+std::optional<ORVO::float2> spatialSigmaOf(FG::IFilter& filter) {
+    FG::ParameterBase const* const sigma = filter.parameter("spatialSigma");
+    if (sigma && sigma->type() == FG::DataItemBase::TYPE_FLOAT2)
+        return sigma->as<ORVO::float2>().value();
+    if (sigma && sigma->type() == FG::DataItemBase::TYPE_FLOAT)
+        return ORVO::float2(sigma->as<float>().value(), sigma->as<float>().value());
+    return {};
 }
 
 // A last strip of fewer than 16 pixels belongs to the tile before it.
@@ -103,16 +121,8 @@ Rectangle commonPart(Rectangle const& one, Rectangle const& other) {
 }
 
 GridReach gridReachOf(FG::IFilter& filter) {
-    FG::ParameterBase const* const sigma = filter.parameter("spatialSigma");
-    if (sigma && sigma->type() == FG::DataItemBase::TYPE_FLOAT2) {
-        ORVO::float2 const value = sigma->as<ORVO::float2>().value();
-        return gridReachOf(value[0], value[1]);
-    }
-    if (sigma && sigma->type() == FG::DataItemBase::TYPE_FLOAT) {
-        float const value = sigma->as<float>().value();
-        return gridReachOf(value, value);
-    }
-    return {};
+    auto const sigma = spatialSigmaOf(filter);
+    return sigma ? gridReachOf((*sigma)[0], (*sigma)[1]) : GridReach();
 }
 
 GridReach gridReachOf(float sigmaX, float sigmaY) {
@@ -124,6 +134,22 @@ GridReach gridReachOf(float sigmaX, float sigmaY) {
     reach.stepX = whole <= largestStep ? whole : columns;
     reach.stepY = stepOf(sigmaY);
     return reach;
+}
+
+std::size_t gridTexturesOf(FG::IFilter& filter) {
+    auto const sigma = spatialSigmaOf(filter);
+    FG::ParameterBase const* const range = filter.parameter("rangeSigma");
+    if (!sigma || !range || range->type() != FG::DataItemBase::TYPE_FLOAT)
+        return 0;
+    return gridTexturesOf((*sigma)[0], (*sigma)[1], range->as<float>().value());
+}
+
+std::size_t gridTexturesOf(float sigmaX, float sigmaY, float rangeSigma) {
+    double const area = static_cast<double>(sigmaX) * static_cast<double>(sigmaY);
+    if (!(area > 0.0) || !(rangeSigma > 0.0F))
+        return 0;
+    double const cells = (1.0 / static_cast<double>(rangeSigma) + paddingCells) / area;
+    return static_cast<std::size_t>(std::ceil(std::min(cells, mostCells) * cellBytes));
 }
 
 TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, MemoryUse const& use,
@@ -154,7 +180,8 @@ TilePlan::TilePlan(int width, int height, int tileSize, GridReach const& reach, 
     }
     if (needed() > memory)
         throw UsageError("The memory does not suffice: --memory-limit has to be " +
-                         std::to_string((needed() >> 20U) + 1) + " or more, or --tile smaller");
+                         std::to_string((needed() >> 20U) + 1) + " or more" +
+                         (fileTile_ > vectorColumns ? ", or --tile smaller" : ""));
     tiles_ = serpentine(picture(), tileWidth, tileHeight);
     frameMemory_ = areaOf(window()) * use.work;
 }

@@ -42,6 +42,13 @@ struct GridReach {
 /// the step comes as near to one as it can.
 [[nodiscard]] GridReach gridReachOf(float sigmaX, float sigmaY);
 
+/// Bytes that the textures of a filter's bilateral grid take on OpenGL for each pixel that is computed: none
+/// without parameters "spatialSigma" and "rangeSigma".
+[[nodiscard]] std::size_t gridTexturesOf(ORVO::FilterGraph::IFilter& filter);
+
+/// The same of a grid with cells of so many pixels and of so much intensity.
+[[nodiscard]] std::size_t gridTexturesOf(float sigmaX, float sigmaY, float rangeSigma);
+
 /// Bytes that are held: so many in any case, and so many for each pixel.
 struct MemoryUse {
     std::size_t fixed;

@@ -4,6 +4,7 @@
 #include "apply_filter/FrameRunner.h"
 #include "apply_filter/Interrupt.h"
 #include "apply_filter/RequestedFilter.h"
+#include "common/Engine.h"
 #include "common/Picture.h"
 #include "orvo/core/memory/ImageStorage.h"
 #include "orvo/filter_graph/FilterGraph.h"
@@ -14,7 +15,10 @@
 #include "process_tiles/TileWriter.h"
 
 #include <algorithm>
+#include <exception>
+#include <functional>
 #include <memory>
+#include <string>
 #include <utility>
 #include <vector>
 
@@ -23,6 +27,14 @@ namespace example {
 namespace {
 
 using FilterPtr = std::shared_ptr<ORVO::FilterGraph::IFilter>;
+
+// That of the tiles of a file.
+constexpr int smallestTile = 16;
+
+std::size_t pixelsOf(Rectangle const& rectangle) {
+    return static_cast<std::size_t>(rectangle.extent().width()) *
+           static_cast<std::size_t>(rectangle.extent().height());
+}
 
 FilterPtr filterOf(TileOptions const& options, ORVO::OGL::Context const* context) {
     constexpr ProgramName program = {"process_tiles", "apply_filter --list"};
@@ -66,6 +78,43 @@ std::vector<Rows> bandsOf(std::vector<Row> const& rows) {
     return bands;
 }
 
+// Most filters on the CPU compute in 8 bits or in floats, and those on OpenGL all do.
+Depth workingDepth(BandReader const& reader, FilterPtr const& filter, bool onOpenGL) {
+    if (reader.depth() == Depth::uint15_1 && (onOpenGL || !takesSixteenBits(filter)))
+        return Depth::float32;
+    return reader.depth();
+}
+
+Rectangle largestFrame(TilePlan const& plan) {
+    Rectangle largest = rectangleBetween(0, 0, 0, 0);
+    for (Rectangle const& tile : plan.tiles()) {
+        Rectangle const computed = plan.computed(tile);
+        if (pixelsOf(computed) > pixelsOf(largest))
+            largest = computed;
+    }
+    return largest;
+}
+
+// What OpenGL has room for is for the driver to say: textures between the stages of a filter may be larger
+// than its tile by far. Tiles are half as large each time until their frames are not refused.
+TilePlan planOnOpenGL(std::function<TilePlan(int)> const& planOf, TileFrame& frame, int tileSize) {
+    for (;; tileSize /= 2) {
+        try {
+            TilePlan plan = planOf(tileSize);
+            if (!Interrupt::requested())
+                frame.tryOut(largestFrame(plan));
+            return plan;
+        } catch (UsageError const&) {
+            // Memory does not suffice.
+            if (tileSize <= smallestTile)
+                throw;
+        } catch (std::exception const& failure) {
+            if (tileSize <= smallestTile)
+                throw UsageError("Tiles of every size are refused: " + describe(failure));
+        }
+    }
+}
+
 std::string compressionFor(std::string const& output, BandReader const& reader) {
     bool const exr = output.size() > 4 && output.compare(output.size() - 4, 4, ".exr") == 0;
     std::string const compression = reader.compression();
@@ -73,11 +122,6 @@ std::string compressionFor(std::string const& output, BandReader const& reader) 
     if (exr)
         return "zip";
     return known ? compression : "none";
-}
-
-std::size_t pixelsOf(Rectangle const& rectangle) {
-    return static_cast<std::size_t>(rectangle.extent().width()) *
-           static_cast<std::size_t>(rectangle.extent().height());
 }
 
 } // namespace
@@ -91,12 +135,14 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     Picture file;
     file.profile = reader.profile();
     useProfileOfFile(*filter, file, options.values);
-    // Filters compute in 8 bits or in floats.
-    Depth const depth = reader.depth() == Depth::uint8 ? Depth::uint8 : Depth::float32;
+    Depth const depth = workingDepth(reader, filter, context != nullptr);
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
     MemoryUse use = frame.memoryUse();
     use.rowUnit = reader.rowUnit();
-    TilePlan const plan(reader.width(), reader.height(), options.tile, gridReachOf(*filter), use, memory);
+    auto const planOf = [&](int tileSize) {
+        return TilePlan(reader.width(), reader.height(), tileSize, gridReachOf(*filter), use, memory);
+    };
+    TilePlan const plan = context ? planOnOpenGL(planOf, frame, options.tile) : planOf(options.tile);
     // Half as much again as one frame takes: tiles at the edges are smaller than others, and would take the
     // place of what the next tile needs.
     ORVO::Core::setImageStorageLimit(plan.frameMemory() / 2 * 3);

@@ -147,9 +147,11 @@ void TileWriter::writeJob(Job& job) {
     std::vector<float> floats;
     OIIO::TypeDesc type = picture->depth == Depth::uint8 ? OIIO::TypeDesc::UINT8 : OIIO::TypeDesc::FLOAT;
     void const* pixels = picture->pixels.data();
-    if (file_->associatedAlpha) {
+    // The scale of 16 bits is the engine's own, which OpenImageIO does not know.
+    if (file_->associatedAlpha || picture->depth == Depth::uint15_1) {
         floats = pictureToFloats(*picture);
-        changeAlpha(floats, picture->channels, false);
+        if (file_->associatedAlpha)
+            changeAlpha(floats, picture->channels, false);
         type = OIIO::TypeDesc::FLOAT;
         pixels = floats.data();
     }

@@ -43,6 +43,9 @@ Picture scene(std::size_t width, std::size_t height, std::size_t channels, Depth
         double const value = std::clamp(slope + edge + noise, 0.0, 1.0);
         if (depth == Depth::uint8)
             picture.pixels[i] = static_cast<unsigned char>(std::lround(255.0 * value));
+        else if (depth == Depth::uint15_1)
+            reinterpret_cast<std::uint16_t*>(picture.pixels.data())[i] =
+                static_cast<std::uint16_t>(std::lround(32768.0 * value));
         else
             reinterpret_cast<float*>(picture.pixels.data())[i] = static_cast<float>(value);
     }
@@ -148,6 +151,86 @@ TEST_F(ProcessTiles, KeepsTheDepthOfTheFile) {
     writePicture(file("in.tif"), Picture(40, 40, 3, Depth::uint15_1));
     ASSERT_TRUE(processTiles(options("FastBilateralBlur", file("in.tif"), file("out.tif")), nullptr));
     EXPECT_EQ(depthOfFile(file("out.tif")), Depth::uint15_1);
+}
+
+// Colour transforms on the CPU take no floats.
+TEST_F(ProcessTiles, TransformsTheColoursOfSixteenBits) {
+    std::vector<std::pair<std::string, std::string>> const toP3 = {{"srcProfile", "sRGB"},
+                                                                   {"dstProfile", "P3"}};
+    for (std::size_t const channels : {1U, 3U, 4U}) {
+        Picture const picture = scene(150, 91, channels, Depth::uint15_1);
+        TileOptions const what = options("ColorspaceTransformer", "", "", toP3);
+        EXPECT_EQ(difference(what, nullptr, picture), 0) << channels;
+        EXPECT_EQ(depthOfFile(file("out.tif")), Depth::uint15_1);
+        // Unless nothing was done.
+        EXPECT_TRUE(channels == 1 || readPicture(file("out.tif"), picture.depth).pixels != picture.pixels);
+
+        ASSERT_TRUE(
+            processTiles(options("ColorspaceTransformer", file("in.tif"), file("gl.tif"), toP3), context()));
+        EXPECT_EQ(depthOfFile(file("gl.tif")), Depth::uint15_1);
+        Picture const inFloats = readPicture(file("in.tif"), Depth::float32);
+        auto const wanted = pictureToFloats(inOnePiece(what, context(), inFloats));
+        auto const got = pictureToFloats(readPicture(file("gl.tif"), Depth::float32));
+        ASSERT_EQ(got.size(), wanted.size());
+        // In a texture of another size a colour between two 16-bit floats may go to the other one, a step of
+        // 1/2048 at most; the file takes the nearest of its values.
+        for (std::size_t i = 0; i < got.size(); ++i)
+            ASSERT_NEAR(got[i], std::clamp(wanted[i], 0.0F, 1.0F), 1.0F / 2048.0F + 0.51F / 65535.0F)
+                << channels << " at " << i;
+    }
+}
+
+Picture columnsOf(Picture const& picture, std::size_t first, std::size_t end) {
+    Picture part(end - first, picture.height, picture.channels, picture.depth);
+    std::size_t const pixel = picture.rowBytes() / picture.width;
+    for (std::size_t y = 0; y < picture.height; ++y)
+        std::copy_n(&picture.pixels[y * picture.rowBytes() + first * pixel], part.rowBytes(),
+                    &part.pixels[y * part.rowBytes()]);
+    return part;
+}
+
+TEST_F(ProcessTiles, TakesSmallerTilesWhereOpenGLHasNoTexturesForMore) {
+    Picture const picture = scene(2100, 6, 3, Depth::uint8);
+    for (char const* const sigma : {"1,1", "0.5,0.5"}) {
+        TileOptions what =
+            options("FastBilateralBlur", file("in.tif"), file("out.tif"), {{"spatialSigma", sigma}});
+        what.tile = TileOptions().tile;
+        what.memoryLimit = 4096;
+        writePicture(what.input, picture);
+        ASSERT_TRUE(processTiles(what, context()));
+        Picture const result = readPicture(what.output, Depth::uint8);
+        // Parts that OpenGL takes in one piece, on corners of the grid. They are right but for the margins,
+        // which 5 columns are enough for.
+        for (std::size_t const first : {0U, 960U, 1888U}) {
+            std::size_t const end = std::min<std::size_t>(first + 212, picture.width);
+            Picture const part = inOnePiece(what, context(), columnsOf(picture, first, end));
+            std::size_t const left = first == 0 ? 0 : 5;
+            std::size_t const right = end - first - (end == picture.width ? 0 : 5);
+            EXPECT_EQ(columnsOf(result, first + left, first + right).pixels,
+                      columnsOf(part, left, right).pixels)
+                << sigma << " from " << first;
+        }
+    }
+    // 15 cells of intensity for each of 4,200 across: more than drivers have texels.
+    EXPECT_ANY_THROW(
+        inOnePiece(options("FastBilateralBlur", "", "", {{"spatialSigma", "0.5,0.5"}}), context(), picture));
+}
+
+TEST_F(ProcessTiles, IsRefusedWhereOpenGLHasNoTexturesForAnyTile) {
+    TileOptions what = options("FastBilateralBlur", file("in.tif"), file("out.tif"),
+                               {{"spatialSigma", "0.1,0.1"}, {"rangeSigma", "0.01"}});
+    what.memoryLimit = 4096;
+    writePicture(what.input, scene(100, 4, 3, Depth::uint8));
+    try {
+        // A tile of 16 pixels and its margins are 48, of 10 cells each, and each of those is 109 of
+        // intensity.
+        static_cast<void>(processTiles(what, context()));
+        ADD_FAILURE() << "accepted";
+    } catch (UsageError const& failure) {
+        EXPECT_EQ(std::string(failure.what()).find("Tiles of every size are refused: "), 0U)
+            << failure.what();
+    }
+    EXPECT_FALSE(fs::exists(what.output));
 }
 
 // A compressed TIFF file of strips, from floats.

@@ -55,6 +55,18 @@ TEST(TilePlan, StepsAreWholeNumbersOfCellsAndOfVectors) {
     }
 }
 
+TEST(TilePlan, GridsTakeSixteenBytesACell) {
+    // 1 / 0.25 and 9 cells of intensity: for every pixel, for every fourth one, and for each four times four.
+    EXPECT_EQ(gridTexturesOf(1.0F, 1.0F, 0.25F), 13U * 16U);
+    EXPECT_EQ(gridTexturesOf(2.0F, 2.0F, 0.25F), 13U * 16U / 4U);
+    EXPECT_EQ(gridTexturesOf(0.5F, 0.5F, 0.25F), 13U * 16U * 4U);
+    // A part of a byte counts as one: 10 * 16 / 10,000.
+    EXPECT_EQ(gridTexturesOf(100.0F, 100.0F, 1.0F), 1U);
+    EXPECT_EQ(gridTexturesOf(1e-30F, 1e-30F, 1.0F), 160'000'000U);
+    EXPECT_EQ(gridTexturesOf(0.0F, 1.0F, 1.0F), 0U);
+    EXPECT_EQ(gridTexturesOf(1.0F, 1.0F, 0.0F), 0U);
+}
+
 TEST(TilePlan, TilesBeginOnTheEdgesOfFileTilesAndCoverThePicture) {
     for (int const size : {16, 100, 300, 2048}) {
         TilePlan const plan(700, 333, size, {}, rgb8, plenty);

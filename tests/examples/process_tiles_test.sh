@@ -32,6 +32,8 @@ refused 2 'is of type float2, which "10" is not' --filter FastBilateralBlur --se
 refused 2 'The filter "premultiply" does not run on cpu' --filter premultiply "$photograph" "$output"
 refused 2 'The filter "SimpleBilateralCPU" does not run on gl' --filter SimpleBilateralCPU --target gl "$photograph" "$output"
 refused 2 'The memory does not suffice: --memory-limit has to be' "${bilateral[@]}" --memory-limit 1 "$photograph" "$output"
+refused 2 'Tiles of every size are refused' --filter FastBilateralBlur --target gl --set spatialSigma=0.1,0.1 \
+    --set rangeSigma=0.01 --memory-limit 4096 "$photograph" "$output"
 refused 1 'no such file' "${bilateral[@]}" "$scratch/none.png" "$output"
 refused 1 'Cannot read' "${bilateral[@]}" "$0" "$output"
 refused 1 'no such folder' "${bilateral[@]}" "$photograph" "$scratch/none/out.tif"
