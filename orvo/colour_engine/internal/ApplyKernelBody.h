@@ -205,7 +205,8 @@ inline void clampBlock(colour::GridPlaces* __restrict pPlaces, float const* cons
     }
 }
 
-/// All that is rounded here is below 2^24, which floats hold exactly.
+/// Steps are below 2^24, which floats hold exactly; the carry may be one part in 65536 of a cell off where
+/// parts lie next to a half.
 template <bool bWords>
 inline GridPlace placeAlong(float clamped, float last) {
     float position = clamped * last;

@@ -1,5 +1,6 @@
 #include "orvo/colour_engine/internal/CurveFormula.h"
 
+#include <algorithm>
 #include <cmath>
 
 namespace ORVO::ColourEngine::Internal {
@@ -52,7 +53,8 @@ CurveFormula inverse(ParametricCurve const& curve) {
     formula.dExponent_ = 1.0 / curve.g;
     formula.dResultScale_ = 1.0 / curve.a;
     formula.dResultOffset_ = -curve.b / curve.a;
-    formula.dBreak_ = std::pow(curve.a * curve.d + curve.b, curve.g) + curve.e;
+    // Not below 0, where d is a quotient that was rounded.
+    formula.dBreak_ = std::pow(std::max(curve.a * curve.d + curve.b, 0.0), curve.g) + curve.e;
     if (curve.c != 0.0) {
         formula.dSlope_ = 1.0 / curve.c;
         formula.dIntercept_ = -curve.f / curve.c;

@@ -9,7 +9,7 @@
 
 namespace ORVO::ColourEngine::Internal {
 
-/// A power t^p in square roots, products and sums, which every driver computes alike, and fast:
+/// A power t^p in square roots, products and sums, which drivers compute nearly alike, and fast:
 ///     t^p ~ t^(1 / 2^nFactorRoots_) * q(t^(1 / 2^nRoots_))
 /// with a polynomial q of a few terms. Roots are there because a power bends at 0 as no polynomial does: by
 /// the square root of t it does so half as sharply.

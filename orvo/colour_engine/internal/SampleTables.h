@@ -79,7 +79,7 @@ public:
 
     /// Over ByteScale, samples.
     std::array<std::uint8_t const*, 3> const& bytes() const;
-    /// Over WordScale, results times `white`, with one entry more than there are steps.
+    /// Over WordScale, results times 32768, with one entry more than there are steps.
     std::array<float const*, 3> const& words() const;
 
     /// Writes `n` samples of 8 bits into a plane.

@@ -59,6 +59,15 @@ std::vector<std::pair<RootPolynomial::Form, std::size_t>> polynomialCandidates()
     return aCandidates;
 }
 
+/// A shader has no text for anything else.
+bool isFinite(CurveFormula const& formula) {
+    std::array<double, 8> const aNumbers{formula.dScale_,       formula.dOffset_,       formula.dExponent_,
+                                         formula.dResultScale_, formula.dResultOffset_, formula.dBreak_,
+                                         formula.dSlope_,       formula.dIntercept_};
+    return std::all_of(aNumbers.begin(), aNumbers.end(),
+                       [](double number) { return std::isfinite(static_cast<float>(number)); });
+}
+
 /// scale * sValue + offset, without what does nothing.
 std::string scaled(std::string const& sValue, double scale, double offset) {
     if (scale == 0.0) {
@@ -72,7 +81,7 @@ std::string scaled(std::string const& sValue, double scale, double offset) {
 
 template <typename Tolerance>
 std::optional<ShaderCurve> ShaderCurve::make(ChannelCurve const& curve, Tolerance const& toleranceOf) {
-    if (!curve.formula().has_value()) {
+    if (!curve.formula().has_value() || !isFinite(*curve.formula())) {
         return std::nullopt;
     }
     CurveFormula const& formula = *curve.formula();
@@ -81,7 +90,8 @@ std::optional<ShaderCurve> ShaderCurve::make(ChannelCurve const& curve, Toleranc
     if (formula.dExponent_ == 1.0) {
         return keepsBound(result, aPoints) ? std::optional(result) : std::nullopt;
     }
-    double const from = formula.base(std::max(formula.dBreak_, 0.0));
+    // Not below 0, where the break is a quotient that was rounded.
+    double const from = std::max(formula.base(std::max(formula.dBreak_, 0.0)), 0.0);
     double const to = formula.base(1.0);
     auto const toleranceOfPower = [&](double t) {
         return toleranceOf((t - formula.dOffset_) / formula.dScale_) / std::abs(formula.dResultScale_);

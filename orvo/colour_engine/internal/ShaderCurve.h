@@ -13,8 +13,8 @@ class ChannelCurve;
 
 /// A channel's curve as a few instructions of a shader, without a table: its formula, with square roots and a
 /// polynomial in the place of the power. Only curves that have been found to keep their bound exist: they are
-/// computed as the shader does it, in floats, at more than 8000 values from 0 to 1, most of them near black,
-/// and compared with the curve itself.
+/// computed as the shader does it, in floats, at more than 8000 values from 0 to 1, half of them crowded
+/// towards black, and compared with the curve itself.
 ///
 /// What a driver computes otherwise (products and sums fused or in another order, a square root that is off
 /// by two units of the last place, as the GLSL of later versions allows) adds about 3e-7. There is no power

@@ -18,7 +18,8 @@ class ResolvedTransform;
 ///
 /// Curves and a matrix, with every curve in closed form that ShaderCurve can compute, become text alone,
 /// without parameters. Where a curve has to be a table, of 4096 entries, the matrix is a parameter too.
-/// Anything else becomes a cube in a 3D texture. Samples below 0 count as 0 and samples above 1 as 1, and
+/// Anything else becomes a cube in a 3D texture, with curves as tables before and behind it where these help.
+/// Samples below 0 count as 0 and samples above 1 as 1, and
 /// results are from 0 to 1; what NaN gives is the driver's, some colour in that range, as GLSL leaves it open
 /// what clamp() makes of it (Mesa: 0). Alpha stays as it is.
 ///

@@ -16,8 +16,8 @@ namespace ORVO::FilterGraph::Internal::Filters {
 /// On the CPU images have 8-bit or 16-bit channels in R, G, B, A order or grey; on OpenGL any that frames
 /// take. Grey goes through a transform as equal parts of red, green and blue, and a grey result is the green
 /// one: on the CPU where the image that is written has one or two channels, on OpenGL, where images between
-/// filters have at least three, where the image has them that the graph ends in or, with another transform on
-/// the way there, the one that comes in.
+/// filters have at least three, where the image that the graph ends in has them or, if another transform
+/// follows, the image that comes in.
 ///
 /// Threads: as Filter.
 class ORVO_API ColorspaceTransformer : public Filter {

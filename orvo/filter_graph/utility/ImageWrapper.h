@@ -131,11 +131,11 @@ public:
 
     /// Copies the image's pixels, rows without padding, into the top left part of a texture. The channels in
     /// memory are of the type `textureTypeToUse`: `storageSize()` bytes in all, but for channel types that
-    /// this has no own type for. Of types 3 and 4 they are single bytes from 0 to 255, half of
-    /// `storageSize()`, rows just as close; of type 1, which no storage of a wrapper has, twice as much.
+    /// this has no own type for. Of CHANNEL_TYPE_UINT16 and CHANNEL_TYPE_FLOAT16 they are single bytes from 0
+    /// to 255, half of `storageSize()`, rows just as close; of the type 1, which no storage of a wrapper has,
+    /// twice as much.
     ///
-    /// They go up by `TextureUpload` alone: there is no work-around for drivers from before OpenGL 2 that
-    /// would rather have a direct upload.
+    /// They go up by `TextureUpload` alone, whatever the driver.
     /// @throws InternalException "storageGL != 0"; ParameterException "The rectangle lies outside the
     /// texture" if the texture is smaller than the image; as `TextureUpload::asyncUpload`.
     void storageCPU2GL(unsigned char const* storageCPU, OGL::Texture2D* storageGL);

@@ -50,7 +50,7 @@ struct Dropped {
         try {
             drop(pHandle_);
         } catch (TrelException const&) { // The engine is gone, and the object with it.
-            pHandle_ = nullptr;
+            return;
         }
     }
 

@@ -42,14 +42,14 @@ bool QuorTable::tryLoad() noexcept {
     // filled once more where it moved. An engine that never rests is noticed at the next use.
     constexpr int nRounds = 4;
     for (int iRound = 0; iRound < nRounds; ++iRound) {
-        std::uint32_t const iGeneration = QuorClient::generation();
+        std::uint32_t const iBound = QuorClient::generation();
         std::uint32_t const iCount = QuorClient::unregisterCount();
         if (!fill()) {
             return false;
         }
         iLoadCount_.store(iCount, std::memory_order_release);
-        iGeneration_.store(iGeneration, std::memory_order_release);
-        if (QuorClient::unregisterCount() == iCount && QuorClient::generation() == iGeneration) {
+        iGeneration_.store(iBound, std::memory_order_release);
+        if (QuorClient::unregisterCount() == iCount && QuorClient::generation() == iBound) {
             break;
         }
     }

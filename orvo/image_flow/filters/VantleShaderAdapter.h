@@ -19,8 +19,9 @@ namespace ORVO {
 ///
 /// On an adapter that is not valid every operation but isValid() throws InternalException "vantleShader_ !=
 /// NULL". What the engine refuses is thrown as Quor_T_MT::CQuorError, its absence as TrelException. An
-/// adapter that outlives the binding is not valid from the next start of a binding on: what it holds is never
-/// handed to another engine.
+/// adapter that outlives the binding is not valid from the next start of a binding on: what it holds is not
+/// handed to the engine bound then. An engine that replaces another while the binding stands, as the counter
+/// of unregistered interfaces tells, is given these handles.
 ///
 /// Threads: one at a time.
 class ORVO_API VantleShaderAdapter {

@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <limits>
 #include <string>
@@ -164,6 +165,7 @@ TEST(ShaderCurve, IsNotThereForParametersWithoutSense) {
     for (auto const& aParameters : std::vector<std::vector<double>>{{nan, 1.0, 0.0},
                                                                     {infinity, 1.0, 0.0},
                                                                     {2.2, 0.0, 0.0},
+                                                                    {1.0, 0.0, -1.0},
                                                                     {2.2, nan, 0.0},
                                                                     {0.0, 1.0, 0.0},
                                                                     {-1.0, 1.0, 0.0},
@@ -188,9 +190,30 @@ TEST(ShaderCurve, IsNotThereForParametersWithoutSense) {
                     continue;
                 for (float const x : values())
                     ASSERT_NEAR(curve.clamped(x), (*computed)(x), bound) << type << " " << x;
+                EXPECT_EQ(std::string::npos, computed->body().find("inf")) << computed->body();
+                EXPECT_EQ(std::string::npos, computed->body().find("nan")) << computed->body();
             }
         }
     }
+}
+
+// (a x + b)^g from -b/a on, 0 below: rounded, a (-b/a) + b may be less than 0, which has no power and no
+// root.
+TEST(ShaderCurve, IsThereWhereTheBreakIsARoundedQuotient) {
+    int nBelow = 0;
+    for (int const n : {923, 1000, 1012, 1053, 1283, 2816}) {
+        double const b = -n / 65536.0;
+        double const a = 1.0 - b;
+        nBelow += a * (-b / a) + b < 0.0 ? 1 : 0;
+        std::array<double, 3> const aParameters{2.0, a, b};
+        ChannelCurve const curve([=](double x) { return std::pow(std::max(a * x + b, 0.0), 2.0); },
+                                 curveFormula(2, aParameters.data()));
+        EXPECT_TRUE(ShaderCurve::ofInput(curve).has_value()) << n;
+        ChannelCurve const back([=](double y) { return (std::sqrt(y) - b) / a; },
+                                curveFormula(-2, aParameters.data()));
+        EXPECT_TRUE(ShaderCurve::ofOutput(back).has_value()) << n;
+    }
+    EXPECT_EQ(5, nBelow);
 }
 
 } // namespace
