@@ -35,7 +35,7 @@ inline cmsHPROFILE gammaProfile(double gamma) {
     cmsCIExyYTRIPLE const primaries = {{0.64, 0.33, 1.0}, {0.30, 0.60, 1.0}, {0.15, 0.06, 1.0}};
     cmsToneCurve* const pCurve = cmsBuildGamma(nullptr, gamma);
     cmsToneCurve* const aCurves[3] = {pCurve, pCurve, pCurve};
-    cmsHPROFILE const pProfile = cmsCreateRGBProfile(&white, &primaries, aCurves);
+    auto* const pProfile = cmsCreateRGBProfile(&white, &primaries, aCurves);
     cmsFreeToneCurve(pCurve);
     return pProfile;
 }
@@ -49,7 +49,7 @@ inline Bytes sampledProfile() {
         aEntries[i] = static_cast<cmsUInt16Number>(std::lround(65535.0 * y));
     }
     cmsToneCurve* const pCurve = cmsBuildTabulatedToneCurve16(nullptr, 1024, aEntries.data());
-    cmsHPROFILE const pFile = gammaProfile(1.0);
+    auto* const pFile = gammaProfile(1.0);
     for (auto const eTag : {cmsSigRedTRCTag, cmsSigGreenTRCTag, cmsSigBlueTRCTag}) {
         cmsWriteTag(pFile, eTag, pCurve);
     }
@@ -60,11 +60,11 @@ inline Bytes sampledProfile() {
 
 /// RGB with tables alone: what sRGB means, in Lab. It is a source and no destination.
 inline Bytes tableSourceProfile() {
-    cmsHPROFILE const pRGB = gammaProfile(2.0);
-    cmsHPROFILE const pLab = cmsCreateLab4Profile(nullptr);
-    cmsHTRANSFORM const pTransform =
+    auto* const pRGB = gammaProfile(2.0);
+    auto* const pLab = cmsCreateLab4Profile(nullptr);
+    auto* const pTransform =
         cmsCreateTransform(pRGB, TYPE_RGB_16, pLab, TYPE_Lab_16, INTENT_PERCEPTUAL, cmsFLAGS_NOOPTIMIZE);
-    cmsHPROFILE const pLink = cmsTransform2DeviceLink(pTransform, 4.3, cmsFLAGS_GUESSDEVICECLASS);
+    auto* const pLink = cmsTransform2DeviceLink(pTransform, 4.3, cmsFLAGS_GUESSDEVICECLASS);
     cmsDeleteTransform(pTransform);
     cmsCloseProfile(pLab);
     cmsCloseProfile(pRGB);

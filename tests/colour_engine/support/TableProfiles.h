@@ -112,7 +112,7 @@ inline cmsInt32Number sampleTable(cmsUInt16Number const* pIn, cmsUInt16Number* p
 
 /// The bytes of a profile of a display that has nothing but one table between curves, over Lab.
 inline Bytes tableProfile(TableRecipe recipe) {
-    cmsHPROFILE const pProfile = cmsCreateProfilePlaceholder(nullptr);
+    auto* const pProfile = cmsCreateProfilePlaceholder(nullptr);
     cmsSetProfileVersion(pProfile, recipe.dVersion);
     cmsSetDeviceClass(pProfile, cmsSigDisplayClass);
     cmsSetColorSpace(pProfile, cmsSigRgbData);
