@@ -43,8 +43,8 @@ refused 1 'it is a folder' "${bilateral[@]}" "$photograph" "$scratch"
 refused 1 'it is a folder' "${bilateral[@]}" "$scratch" "$output"
 refused 1 "Cannot write /proc/out.tif: " "${bilateral[@]}" "$photograph" /proc/out.tif
 mkfifo "$scratch/pipe.tif"
-refused 1 'it is a device' "${bilateral[@]}" "$photograph" "$scratch/pipe.tif"
-refused 1 'it is a device' "${bilateral[@]}" "$scratch/pipe.tif" "$output"
+refused 1 'it is not a regular file' "${bilateral[@]}" "$photograph" "$scratch/pipe.tif"
+refused 1 'it is not a regular file' "${bilateral[@]}" "$scratch/pipe.tif" "$output"
 
 # A file that ends too early.
 head -c 300000 "$scratch/reference.tif" > "$scratch/short.tif"
