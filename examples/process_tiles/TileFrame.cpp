@@ -176,12 +176,13 @@ void TileFrame::tryOut(Rectangle const& computed) {
     graph.compute(computed, result);
 }
 
+std::size_t TileFrame::channels() const { return workingChannels(graph_->settings); }
+
 MemoryUse TileFrame::memoryUse() const {
     TileFrameSettings const& settings = graph_->settings;
-    // Pictures of 16 bits are read and written by way of floats.
-    std::size_t const channel = settings.depth == Depth::uint8 ? 1 : sizeof(float);
-    std::size_t const pixel = workingChannels(settings) * channel;
-    std::size_t const file = settings.channels * channel;
+    std::size_t const pixel = channels() * bytesPerChannel(settings.depth);
+    // Pictures of 16 bits are read by way of floats.
+    std::size_t const file = settings.channels * (settings.depth == Depth::uint8 ? 1 : sizeof(float));
     if (settings.context) {
         // The copy, its texture, and textures and buffers of floats, which may be larger than the tile.
         std::size_t const work = 2 * pixel + 96;

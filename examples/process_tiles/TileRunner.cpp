@@ -139,6 +139,7 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
     MemoryUse use = frame.memoryUse();
     use.rowUnit = reader.rowUnit();
+    use.copies = copiesToWrite(options.output, reader.channels(), frame.channels(), depth);
     auto const planOf = [&](int tileSize) {
         return TilePlan(reader.width(), reader.height(), tileSize, gridReachOf(*filter), use, memory);
     };
