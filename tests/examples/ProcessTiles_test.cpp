@@ -252,6 +252,15 @@ TEST_F(ProcessTiles, GoesOnAfterTilesThatOpenGLRefuses) {
               inOnePiece(options("scaleDown4channel", "", ""), context(), part).pixels);
 }
 
+TEST_F(ProcessTiles, CompressesEXRWhateverItsNameLooksLike) {
+    writePicture(file("in.tif"), scene(40, 30, 3, Depth::uint8));
+    for (char const* const name : {"out.exr", "out.EXR"}) {
+        ASSERT_TRUE(processTiles(options("RGBToLABCPU", file("in.tif"), file(name)), nullptr));
+        EXPECT_EQ(OIIO::ImageInput::open(file(name))->spec().get_string_attribute("compression"), "zip")
+            << name;
+    }
+}
+
 // A compressed TIFF file of strips, from floats.
 void writeStrips(std::string const& path, Picture const& picture, OIIO::TypeDesc const& type, int rows) {
     OIIO::ImageSpec spec(static_cast<int>(picture.width), static_cast<int>(picture.height),

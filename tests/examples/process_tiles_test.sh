@@ -31,6 +31,11 @@ refused 2 'has no parameter "sigma"' --filter FastBilateralBlur --set sigma=1 "$
 refused 2 'is of type float2, which "10" is not' --filter FastBilateralBlur --set spatialSigma=10 "$photograph" "$output"
 refused 2 'The filter "premultiply" does not run on cpu' --filter premultiply "$photograph" "$output"
 refused 2 'The filter "SimpleBilateralCPU" does not run on gl' --filter SimpleBilateralCPU --target gl "$photograph" "$output"
+# A value that fails has its own words, and ends no search for a tile that is small enough.
+for target in cpu gl; do
+    refused 1 'Cannot make src profile from code' --filter ColorspaceTransformer --target $target --set srcProfile=Nope \
+        "$photograph" "$output"
+done
 refused 2 'The memory does not suffice: --memory-limit has to be' "${bilateral[@]}" --memory-limit 1 "$photograph" "$output"
 refused 2 'Tiles of every size are refused' --filter FastBilateralBlur --target gl --set spatialSigma=0.1,0.1 \
     --set rangeSigma=0.01 --memory-limit 4096 "$photograph" "$output"
