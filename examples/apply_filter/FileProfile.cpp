@@ -9,6 +9,16 @@
 
 namespace example {
 
+namespace {
+
+// The conversions lead to Lab, which no profile of RGB is for, and to sRGB.
+bool leadsToOtherColours(ORVO::FilterGraph::IFilter& filter) {
+    std::string const& name = filter.identifier().name();
+    return filter.parameter("dstProfile") || name == "RGBToLABCPU" || name == "LABToRGBCPU";
+}
+
+} // namespace
+
 void useProfileOfFile(ORVO::FilterGraph::IFilter& filter, Picture const& file,
                       std::vector<std::pair<std::string, std::string>> const& values) {
     namespace Engine = ORVO::ColourEngine;
@@ -29,7 +39,7 @@ void useProfileOfFile(ORVO::FilterGraph::IFilter& filter, Picture const& file,
 }
 
 std::vector<unsigned char> profileOfResult(ORVO::FilterGraph::IFilter& filter, Picture const& file) {
-    return filter.parameter("dstProfile") ? std::vector<unsigned char>() : file.profile;
+    return leadsToOtherColours(filter) ? std::vector<unsigned char>() : file.profile;
 }
 
 } // namespace example

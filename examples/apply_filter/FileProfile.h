@@ -19,8 +19,8 @@ namespace example {
 void useProfileOfFile(ORVO::FilterGraph::IFilter& filter, Picture const& file,
                       std::vector<std::pair<std::string, std::string>> const& values);
 
-/// The profile that the result has: that of the file, but none behind a filter that has a "dstProfile", which
-/// leads to other colours.
+/// The profile that the result has: that of the file, but none behind a filter that leads to other colours:
+/// one that has a "dstProfile", and those between RGB and Lab.
 [[nodiscard]] std::vector<unsigned char> profileOfResult(ORVO::FilterGraph::IFilter& filter,
                                                          Picture const& file);
 

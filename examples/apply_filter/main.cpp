@@ -2,6 +2,7 @@
 #include "apply_filter/FileProfile.h"
 #include "apply_filter/FilterList.h"
 #include "apply_filter/FrameRunner.h"
+#include "apply_filter/Interrupt.h"
 #include "apply_filter/Options.h"
 #include "apply_filter/RequestedFilter.h"
 #include "common/Engine.h"
@@ -34,6 +35,8 @@ bool runFramesOfFilter(std::shared_ptr<ORVO::FilterGraph::IFilter> const& filter
     try {
         return example::runFrames(filter, source, result, {context, options.repeat, options.async});
     } catch (std::exception const&) {
+        if (example::Interrupt::requested())
+            return false;
         // Asked of another one of its kind: this one's values may be what failed.
         if (example::runsOn(context, example::createFilterNamed(options.filter)))
             throw;
@@ -48,6 +51,8 @@ example::Depth depthFor(example::Options const& options) {
 }
 
 bool applyFilter(example::Options const& options, ORVO::OGL::Context const* context) {
+    // While the result is written, too: a temporary file would stay.
+    example::Interrupt const interrupt;
     auto const filter = example::requestedFilter(options, program);
     example::checkWritable(options.output);
     example::Picture const file = example::readPicture(options.input, depthFor(options));

@@ -50,7 +50,7 @@ std::unique_ptr<OIIO::ImageInput> openForReading(std::string const& path) {
         throw PictureError("Cannot read " + path + ": it is a folder");
     // A pipe would be waited for, and cannot be gone back in.
     if (!fs::is_regular_file(path))
-        throw PictureError("Cannot read " + path + ": it is a device");
+        throw PictureError("Cannot read " + path + ": it is not a regular file");
     OIIO::ImageSpec hints;
     hints["oiio:UnassociatedAlpha"] = 1;
     auto input = OIIO::ImageInput::open(path, &hints);
@@ -205,7 +205,7 @@ void checkWritable(std::string const& path) {
         refuse("it is a folder");
     static_cast<void>(outputFor(path));
     if (fs::exists(path) && !fs::is_regular_file(path))
-        refuse("it is a device");
+        refuse("it is not a regular file");
     if (!folder.empty() && !fs::is_directory(folder))
         refuse("no such folder");
     if (::access(folder.empty() ? "." : folder.c_str(), W_OK) != 0)

@@ -76,7 +76,7 @@ struct TileFrame::Graph {
     FG::ImageCPU source;
     FG::ImageCPU result;
     FG::Utility::Tiles textures; ///< on OpenGL: that of this frame and that of the last one
-    int place = 0;
+    int place = 0;               ///< that of the texture that is bound
     std::shared_ptr<FG::IEmbeddedProcessor> processor;
 
     Graph(std::shared_ptr<FG::IFilter> usedFilter, TileFrameSettings const& usedSettings)
@@ -116,12 +116,14 @@ struct TileFrame::Graph {
     }
 
     void bindTexture(Picture const& pixels, Rectangle const& part) {
-        // By turns: the image of the last frame has to stand until another one is bound.
-        place = 1 - place;
-        FG::Utility::ImageWrapper* const tile = textures.createTileAt(place, part);
+        // By turns: the image of the last frame has to stand until another one is bound, which a refused
+        // texture never is.
+        int const other = 1 - place;
+        FG::Utility::ImageWrapper* const tile = textures.createTileAt(other, part);
         tile->initializeStorage();
         tile->storageCPU2GL(pixels.pixels.data(), tile->storageGL());
         input->setImage(&tile->image());
+        place = other;
     }
 
     void compute(Rectangle const& computed, Picture& pixels) {
@@ -176,12 +178,13 @@ void TileFrame::tryOut(Rectangle const& computed) {
     graph.compute(computed, result);
 }
 
+std::size_t TileFrame::channels() const { return workingChannels(graph_->settings); }
+
 MemoryUse TileFrame::memoryUse() const {
     TileFrameSettings const& settings = graph_->settings;
-    // Pictures of 16 bits are read and written by way of floats.
-    std::size_t const channel = settings.depth == Depth::uint8 ? 1 : sizeof(float);
-    std::size_t const pixel = workingChannels(settings) * channel;
-    std::size_t const file = settings.channels * channel;
+    std::size_t const pixel = channels() * bytesPerChannel(settings.depth);
+    // Pictures of 16 bits are read by way of floats.
+    std::size_t const file = settings.channels * (settings.depth == Depth::uint8 ? 1 : sizeof(float));
     if (settings.context) {
         // The copy, its texture, and textures and buffers of floats, which may be larger than the tile.
         std::size_t const work = 2 * pixel + 96;

@@ -50,6 +50,10 @@ public:
     /// the driver refuses them.
     void tryOut(Rectangle const& computed);
 
+    /// Channels of the results.
+    [[nodiscard]] std::size_t channels() const;
+
+    /// Without what reading and writing take beside it.
     [[nodiscard]] MemoryUse memoryUse() const;
 
 private:

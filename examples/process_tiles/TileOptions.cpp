@@ -9,8 +9,8 @@ namespace example {
 char const tileUsageText[] = R"(Usage: process_tiles --filter NAME [options] INPUT OUTPUT
 
 Runs one filter over a picture file of any size, tile by tile. The output is a tiled TIFF or EXR file.
-Pictures of 8 bits are computed in 8 bits, others in floats; those of 16 bits in 16 bits by filters that do so
-on the CPU. A TIFF file keeps the picture's ICC profile, unless the filter leads to other colours.
+8-bit pictures are computed in 8 bits, 16-bit ones in 16 bits where the filter can on the CPU, all others in
+floats. A TIFF file keeps the picture's ICC profile, unless the filter leads to other colours.
 
   --filter NAME        the filter to run (apply_filter --list shows the filters)
   --target TARGET      cpu (the default), or gl: OpenGL in a context without a window

@@ -72,7 +72,7 @@ std::size_t bytesNeeded(Rectangle const& window, Rectangle const& picture, Memor
     auto const rows = static_cast<std::size_t>(
         std::min(window.extent().height() + use.rowUnit - 1, picture.extent().height()));
     return 2 * rows * static_cast<std::size_t>(width) * use.file +
-           areaOf(window) * (resultsInFlight * use.result + use.work + use.kept);
+           areaOf(window) * (resultsInFlight * use.result + use.copies + use.work + use.kept);
 }
 
 std::optional<ORVO::float2> spatialSigmaOf(FG::IFilter& filter) {

@@ -52,11 +52,12 @@ struct GridReach {
 /// Bytes that are held: so many in any case, and so many for each pixel.
 struct MemoryUse {
     std::size_t fixed;
-    std::size_t file;   ///< a pixel of the rows that are read, twice
-    std::size_t result; ///< a pixel of the results on their way into the file
-    std::size_t work;   ///< a pixel of the frame that is computed
-    std::size_t kept;   ///< a pixel of the frame, for the next one
-    int rowUnit = 1;    ///< rows are read in multiples of so many
+    std::size_t file;       ///< a pixel of the rows that are read, twice
+    std::size_t result;     ///< a pixel of the results on their way into the file
+    std::size_t work;       ///< a pixel of the frame that is computed
+    std::size_t kept;       ///< a pixel of the frame, for the next one
+    int rowUnit = 1;        ///< rows are read in multiples of so many
+    std::size_t copies = 0; ///< a pixel of the result that is being written, beside it
 };
 
 /// A picture cut into tiles.

@@ -1,11 +1,13 @@
 #include "process_tiles/TileRunner.h"
 
 #include "apply_filter/FileProfile.h"
+#include "apply_filter/FilterList.h"
 #include "apply_filter/FrameRunner.h"
 #include "apply_filter/Interrupt.h"
 #include "apply_filter/RequestedFilter.h"
 #include "common/Engine.h"
 #include "common/Picture.h"
+#include "common/PictureIO.h"
 #include "orvo/core/memory/ImageStorage.h"
 #include "orvo/filter_graph/FilterGraph.h"
 #include "process_tiles/BandReader.h"
@@ -39,7 +41,8 @@ std::size_t pixelsOf(Rectangle const& rectangle) {
 FilterPtr filterOf(TileOptions const& options, ORVO::OGL::Context const* context) {
     constexpr ProgramName program = {"process_tiles", "apply_filter --list"};
     FilterPtr filter = requestedFilter(options, program);
-    if (!runsOn(context, filter) && !Interrupt::requested())
+    // Asked of another one of its kind: this one's values may be what fails.
+    if (!runsOn(context, createFilterNamed(options.filter)) && !Interrupt::requested())
         throw doesNotRun(options, program);
     return filter;
 }
@@ -79,8 +82,8 @@ std::vector<Rows> bandsOf(std::vector<Row> const& rows) {
 }
 
 // Most filters on the CPU compute in 8 bits or in floats, and those on OpenGL all do.
-Depth workingDepth(BandReader const& reader, FilterPtr const& filter, bool onOpenGL) {
-    if (reader.depth() == Depth::uint15_1 && (onOpenGL || !takesSixteenBits(filter)))
+Depth workingDepth(BandReader const& reader, std::string const& filter, bool onOpenGL) {
+    if (reader.depth() == Depth::uint15_1 && (onOpenGL || !takesSixteenBits(createFilterNamed(filter))))
         return Depth::float32;
     return reader.depth();
 }
@@ -96,9 +99,10 @@ Rectangle largestFrame(TilePlan const& plan) {
 }
 
 // What OpenGL has room for is for the driver to say: textures between the stages of a filter may be larger
-// than its tile by far. Tiles are half as large each time until their frames are not refused.
+// than its tile by far. Tiles are half as large each time until their frames are not refused. What fails for
+// a single pixel, though, has another reason, which is that of the program's failure.
 TilePlan planOnOpenGL(std::function<TilePlan(int)> const& planOf, TileFrame& frame, int tileSize) {
-    for (;; tileSize /= 2) {
+    for (bool pixelWorks = false;; tileSize /= 2) {
         try {
             TilePlan plan = planOf(tileSize);
             if (!Interrupt::requested())
@@ -109,6 +113,9 @@ TilePlan planOnOpenGL(std::function<TilePlan(int)> const& planOf, TileFrame& fra
             if (tileSize <= smallestTile)
                 throw;
         } catch (std::exception const& failure) {
+            if (!pixelWorks)
+                frame.tryOut(rectangleBetween(0, 0, 1, 1));
+            pixelWorks = true;
             if (tileSize <= smallestTile)
                 throw UsageError("Tiles of every size are refused: " + describe(failure));
         }
@@ -116,10 +123,9 @@ TilePlan planOnOpenGL(std::function<TilePlan(int)> const& planOf, TileFrame& fra
 }
 
 std::string compressionFor(std::string const& output, BandReader const& reader) {
-    bool const exr = output.size() > 4 && output.compare(output.size() - 4, 4, ".exr") == 0;
     std::string const compression = reader.compression();
     bool const known = compression == "zip" || compression == "lzw" || compression == "packbits";
-    if (exr)
+    if (extensionOf(output) == ".exr")
         return "zip";
     return known ? compression : "none";
 }
@@ -135,10 +141,11 @@ bool processTiles(TileOptions const& options, ORVO::OGL::Context const* context)
     Picture file;
     file.profile = reader.profile();
     useProfileOfFile(*filter, file, options.values);
-    Depth const depth = workingDepth(reader, filter, context != nullptr);
+    Depth const depth = workingDepth(reader, options.filter, context != nullptr);
     TileFrame frame(filter, {context, reader.width(), reader.height(), reader.channels(), depth, memory / 4});
     MemoryUse use = frame.memoryUse();
     use.rowUnit = reader.rowUnit();
+    use.copies = copiesToWrite(options.output, reader.channels(), frame.channels(), depth);
     auto const planOf = [&](int tileSize) {
         return TilePlan(reader.width(), reader.height(), tileSize, gridReachOf(*filter), use, memory);
     };

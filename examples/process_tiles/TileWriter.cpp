@@ -16,12 +16,19 @@ bool isTiff(std::string const& path) {
     return extension == ".tif" || extension == ".tiff";
 }
 
+bool hasAlpha(std::size_t channels) { return channels == 2 || channels == 4; }
+
+// Of 16 bits the scale is the engine's own, which OpenImageIO does not know.
+bool goesInFloats(std::string const& path, std::size_t fileChannels, Depth depth) {
+    return depth == Depth::uint15_1 || (isExr(path) && hasAlpha(fileChannels));
+}
+
 OIIO::ImageSpec specOf(std::string const& path, TileFileFormat const& format) {
     OIIO::ImageSpec spec(format.width, format.height, static_cast<int>(format.channels),
                          fileType(extensionOf(path), format.depth));
     spec.tile_width = format.fileTile;
     spec.tile_height = format.fileTile;
-    bool const alpha = format.channels == 2 || format.channels == 4;
+    bool const alpha = hasAlpha(format.channels);
     spec.alpha_channel = alpha ? static_cast<int>(format.channels) - 1 : -1;
     spec["compression"] = format.compression;
     if (isExr(path)) {
@@ -49,7 +56,7 @@ struct TileWriter::File {
     File(std::string const& path, TileFileFormat const& format)
         : output(outputFor(path)),
           temporary(path),
-          associatedAlpha(isExr(path) && (format.channels == 2 || format.channels == 4)) {
+          associatedAlpha(isExr(path) && hasAlpha(format.channels)) {
         if (!output->open(temporary.path(), specOf(path, format)))
             throw PictureError("Cannot write " + path + ": " + firstLine(output->geterror()));
     }
@@ -68,6 +75,18 @@ void checkTilesWritable(std::string const& path) {
     if (!isExr(path) && !isTiff(path) && !std::filesystem::is_directory(path))
         throw PictureError("Cannot write " + path + ": tiles go into TIFF and EXR files");
     checkWritable(path);
+}
+
+std::size_t copiesToWrite(std::string const& path, std::size_t fileChannels, std::size_t channels,
+                          Depth depth) {
+    std::size_t bytes = 0;
+    if (hasAlpha(channels) && !hasAlpha(fileChannels))
+        bytes += (channels - 1) * bytesPerChannel(depth);
+    if (fileChannels < 3)
+        bytes += fileChannels * bytesPerChannel(depth);
+    if (goesInFloats(path, fileChannels, depth))
+        bytes += fileChannels * sizeof(float);
+    return bytes;
 }
 
 TileWriter::TileWriter(std::string const& path, TileFileFormat const& format)
@@ -137,18 +156,16 @@ void TileWriter::writeJobs() {
 
 void TileWriter::writeJob(Job& job) {
     bool const grey = format_.channels < 3;
-    bool const hasAlpha = format_.channels == 2 || format_.channels == 4;
     Picture const* picture = &job.picture;
     Picture changed;
-    if (picture->hasAlpha() && !hasAlpha)
+    if (picture->hasAlpha() && !hasAlpha(format_.channels))
         picture = &(changed = withoutAlpha(*picture));
     if (grey)
         picture = &(changed = reducedToGrey(*picture));
     std::vector<float> floats;
     OIIO::TypeDesc type = picture->depth == Depth::uint8 ? OIIO::TypeDesc::UINT8 : OIIO::TypeDesc::FLOAT;
     void const* pixels = picture->pixels.data();
-    // The scale of 16 bits is the engine's own, which OpenImageIO does not know.
-    if (file_->associatedAlpha || picture->depth == Depth::uint15_1) {
+    if (goesInFloats(path_, format_.channels, picture->depth)) {
         floats = pictureToFloats(*picture);
         if (file_->associatedAlpha)
             changeAlpha(floats, picture->channels, false);

@@ -30,6 +30,11 @@ struct TileFileFormat {
 /// Throws PictureError if the writer would refuse the path for its format or its folder.
 void checkTilesWritable(std::string const& path);
 
+/// Bytes that a pixel of a picture takes in the copies that are made to write it into a file of so many
+/// channels: without alpha, as grey, in floats.
+[[nodiscard]] std::size_t copiesToWrite(std::string const& path, std::size_t fileChannels,
+                                        std::size_t channels, Depth depth);
+
 /// Writes a tiled TIFF or EXR file on a thread of its own, tiles in any order, through a temporary file
 /// beside it that takes its place at the end: without finish(), and after a failure, the path is as it was.
 class TileWriter {

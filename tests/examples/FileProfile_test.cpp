@@ -98,6 +98,8 @@ TEST_F(FileProfile, IsThatOfTheResultUnlessTheFilterChangesColours) {
     Picture const picture = colours(3, sRGB());
     EXPECT_EQ(profileOfResult(*createFilterNamed("FastBilateralBlur"), picture), sRGB());
     EXPECT_TRUE(profileOfResult(*createFilterNamed("ColorspaceTransformer"), picture).empty());
+    for (char const* const name : {"RGBToLABCPU", "LABToRGBCPU"})
+        EXPECT_TRUE(profileOfResult(*createFilterNamed(name), picture).empty()) << name;
     EXPECT_EQ(throughTiles("FastBilateralBlur", {{"spatialSigma", "2,2"}}, picture).profile, sRGB());
     EXPECT_TRUE(throughTiles("ColorspaceTransformer", {{"dstProfile", "P3"}}, picture).profile.empty());
 }

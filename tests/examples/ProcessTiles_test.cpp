@@ -7,6 +7,7 @@
 #include "common/Engine.h"
 #include "common/Picture.h"
 #include "common/PictureIO.h"
+#include "process_tiles/TileFrame.h"
 #include "tests/examples/support/PictureDifference.h"
 
 #include <gtest/gtest.h>
@@ -231,6 +232,33 @@ TEST_F(ProcessTiles, IsRefusedWhereOpenGLHasNoTexturesForAnyTile) {
             << failure.what();
     }
     EXPECT_FALSE(fs::exists(what.output));
+}
+
+// Wider than any driver's textures are.
+TEST_F(ProcessTiles, GoesOnAfterTilesThatOpenGLRefuses) {
+    Picture const picture = scene(std::size_t(1) << 18U, 2, 3, Depth::uint8);
+    TileFrame frame(createFilterNamed("scaleDown4channel"),
+                    {context(), 1 << 18, 2, 3, Depth::uint8, std::size_t(1) << 30U});
+    for (int refusals = 1; refusals <= 3; ++refusals) {
+        for (int i = 0; i < refusals; ++i)
+            EXPECT_ANY_THROW(frame.tryOut(rectangleBetween(0, 0, 1 << 18, 2)));
+        frame.tryOut(rectangleBetween(0, 0, 64, 2));
+    }
+    Band const band = {0, picture};
+    Picture result;
+    frame.run(band, rectangleBetween(32, 0, 96, 2), result);
+    Picture const part = columnsOf(picture, 32, 96);
+    EXPECT_EQ(withoutAlpha(result).pixels,
+              inOnePiece(options("scaleDown4channel", "", ""), context(), part).pixels);
+}
+
+TEST_F(ProcessTiles, CompressesEXRWhateverItsNameLooksLike) {
+    writePicture(file("in.tif"), scene(40, 30, 3, Depth::uint8));
+    for (char const* const name : {"out.exr", "out.EXR"}) {
+        ASSERT_TRUE(processTiles(options("RGBToLABCPU", file("in.tif"), file(name)), nullptr));
+        EXPECT_EQ(OIIO::ImageInput::open(file(name))->spec().get_string_attribute("compression"), "zip")
+            << name;
+    }
 }
 
 // A compressed TIFF file of strips, from floats.

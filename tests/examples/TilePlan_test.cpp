@@ -4,6 +4,7 @@
 #include "common/CommandLine.h"
 #include "process_tiles/Progress.h"
 #include "process_tiles/TileOptions.h"
+#include "process_tiles/TileWriter.h"
 
 #include <gtest/gtest.h>
 
@@ -65,6 +66,26 @@ TEST(TilePlan, GridsTakeSixteenBytesACell) {
     EXPECT_EQ(gridTexturesOf(1e-30F, 1e-30F, 1.0F), 160'000'000U);
     EXPECT_EQ(gridTexturesOf(0.0F, 1.0F, 1.0F), 0U);
     EXPECT_EQ(gridTexturesOf(1.0F, 1.0F, 0.0F), 0U);
+}
+
+TEST(TilePlan, CopiesToWriteAreCounted) {
+    // Nothing, where a picture goes into the file as it is.
+    EXPECT_EQ(copiesToWrite("a.tif", 3, 3, Depth::uint8), 0U);
+    EXPECT_EQ(copiesToWrite("a.exr", 3, 3, Depth::float32), 0U);
+    // Without alpha; as grey, with the way over three channels; in floats.
+    EXPECT_EQ(copiesToWrite("a.tif", 3, 4, Depth::float32), 12U);
+    EXPECT_EQ(copiesToWrite("a.tif", 1, 3, Depth::uint8), 1U);
+    EXPECT_EQ(copiesToWrite("a.tif", 1, 4, Depth::float32), 12U + 4U);
+    EXPECT_EQ(copiesToWrite("a.EXR", 4, 4, Depth::uint8), 16U);
+    EXPECT_EQ(copiesToWrite("a.tif", 3, 3, Depth::uint15_1), 12U);
+    EXPECT_EQ(copiesToWrite("a.exr", 2, 4, Depth::float32), 8U + 8U);
+
+    // 1024 x 1024 pixels of 2 * 3 + 3 * 3 + 32 bytes are 47 MiB, and copies of 4 bytes 4 MiB more.
+    MemoryUse use = rgb8;
+    std::size_t const memory = std::size_t(140 + 48) << 20U;
+    EXPECT_EQ(TilePlan(1024, 1024, 1024, {}, use, memory).tiles().size(), 1U);
+    use.copies = 4;
+    EXPECT_GT(TilePlan(1024, 1024, 1024, {}, use, memory).tiles().size(), 1U);
 }
 
 TEST(TilePlan, TilesBeginOnTheEdgesOfFileTilesAndCoverThePicture) {

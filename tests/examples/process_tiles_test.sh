@@ -31,6 +31,11 @@ refused 2 'has no parameter "sigma"' --filter FastBilateralBlur --set sigma=1 "$
 refused 2 'is of type float2, which "10" is not' --filter FastBilateralBlur --set spatialSigma=10 "$photograph" "$output"
 refused 2 'The filter "premultiply" does not run on cpu' --filter premultiply "$photograph" "$output"
 refused 2 'The filter "SimpleBilateralCPU" does not run on gl' --filter SimpleBilateralCPU --target gl "$photograph" "$output"
+# A value that fails has its own words, and ends no search for a tile that is small enough.
+for target in cpu gl; do
+    refused 1 'Cannot make src profile from code' --filter ColorspaceTransformer --target $target --set srcProfile=Nope \
+        "$photograph" "$output"
+done
 refused 2 'The memory does not suffice: --memory-limit has to be' "${bilateral[@]}" --memory-limit 1 "$photograph" "$output"
 refused 2 'Tiles of every size are refused' --filter FastBilateralBlur --target gl --set spatialSigma=0.1,0.1 \
     --set rangeSigma=0.01 --memory-limit 4096 "$photograph" "$output"
@@ -43,8 +48,8 @@ refused 1 'it is a folder' "${bilateral[@]}" "$photograph" "$scratch"
 refused 1 'it is a folder' "${bilateral[@]}" "$scratch" "$output"
 refused 1 "Cannot write /proc/out.tif: " "${bilateral[@]}" "$photograph" /proc/out.tif
 mkfifo "$scratch/pipe.tif"
-refused 1 'it is a device' "${bilateral[@]}" "$photograph" "$scratch/pipe.tif"
-refused 1 'it is a device' "${bilateral[@]}" "$scratch/pipe.tif" "$output"
+refused 1 'it is not a regular file' "${bilateral[@]}" "$photograph" "$scratch/pipe.tif"
+refused 1 'it is not a regular file' "${bilateral[@]}" "$scratch/pipe.tif" "$output"
 
 # A file that ends too early.
 head -c 300000 "$scratch/reference.tif" > "$scratch/short.tif"
