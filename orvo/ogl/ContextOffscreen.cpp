@@ -10,6 +10,7 @@
 #include "orvo/ogl/internal/Failure.h"
 #include "orvo/ogl/internal/GL.h"
 #include "orvo/ogl/internal/GLXPlatform.h"
+#include "orvo/ogl/internal/Scopes.h"
 
 namespace ORVO::OGL {
 
@@ -30,11 +31,8 @@ NativeContext createNative(NativeContext const& shareWith) {
 }
 
 void setClamping() noexcept {
-    if (epoxy_gl_version() < 30 && !epoxy_has_gl_extension("GL_ARB_color_buffer_float"))
-        return;
-    glClampColor(GL_CLAMP_VERTEX_COLOR, GL_FALSE);
-    glClampColor(GL_CLAMP_FRAGMENT_COLOR, GL_FIXED_ONLY);
-    glClampColor(GL_CLAMP_READ_COLOR, GL_FIXED_ONLY);
+    if (epoxy_gl_version() >= 30 || epoxy_has_gl_extension("GL_ARB_color_buffer_float"))
+        Internal::clampNoFloats();
 }
 
 } // namespace

@@ -15,8 +15,10 @@ class ShareGroup;
 /// Objects are made in the calling thread's current context. Destroyed while a context of the same share
 /// group is current, they delete their name; without one, or with a foreign one, the name is deleted when a
 /// context of the group is next made current through this layer, or an object is made in one. Once no object
-/// and no context of the library is left in the group, names that still wait live as long as the group. Every
-/// operation that speaks to OpenGL throws ExceptionOGL "No OpenGL context is current" if there is none.
+/// and no context of the library is left in the group, names that still wait live as long as the group. No
+/// name waits on a driver without sync objects, where any context passes for one of the group: objects that
+/// die without a context leave theirs to the group's end. Every operation that speaks to OpenGL throws
+/// ExceptionOGL "No OpenGL context is current" if there is none.
 ///
 /// Threads: any thread with a context of the share group current, one thread at a time for one object.
 class ORVO_API Object {

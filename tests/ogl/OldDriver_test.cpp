@@ -2,6 +2,7 @@
 #include <epoxy/gl.h>
 
 #include <array>
+#include <memory>
 #include <string>
 
 #include "orvo/ogl/ContextOffscreen.h"
@@ -146,6 +147,41 @@ TEST_F(OldDriver, HasNamesOfFramebuffersByTheContextAlone) {
     EXPECT_TRUE(framebuffer.isBound());
     framebuffer.unbind();
     EXPECT_EQ(0, ORVO::Test::GLHooks::objects()["sync"]);
+}
+
+TEST_F(OldDriver, LeavesNamesToTheirGroupRatherThanDeletingAStrangers) {
+    auto pHost = OGL::Context::adoptCurrent();
+    auto pTexture =
+        std::make_unique<OGL::Texture2D>(OGL::Texture::INTERNAL_FORMAT_RGBA8, 1, 1, false, nullptr);
+    GLuint const nName = pTexture->objectID();
+    auto const pForeign = host().another(false);
+    pForeign->makeCurrent();
+    GLuint nStranger = 0;
+    glGenTextures(1, &nStranger);
+    // The driver counts names in each group: this is another texture of the same number.
+    ASSERT_EQ(nName, nStranger);
+    glBindTexture(GL_TEXTURE_2D, nStranger);
+    pForeign->release();
+    pTexture.reset();
+    pForeign->makeCurrent();
+    auto pStrange = OGL::Context::adoptCurrent();
+    pStrange->makeCurrent();
+    { OGL::Texture2D const next(OGL::Texture::INTERNAL_FORMAT_RGBA8, 1, 1, false, nullptr); }
+    EXPECT_EQ(GLboolean{GL_TRUE}, glIsTexture(nStranger));
+    // Nor does the end of the group, which every context passes for.
+    pHost.reset();
+    pStrange.reset();
+    EXPECT_EQ(GLboolean{GL_TRUE}, glIsTexture(nStranger));
+    glDeleteTextures(1, &nStranger);
+    host().makeCurrent();
+    EXPECT_EQ(GLboolean{GL_TRUE}, glIsTexture(nName));
+    glDeleteTextures(1, &nName);
+}
+
+TEST_F(OldDriver, DeletesNamesAtOnceWhereAContextIsCurrent) {
+    long const nBefore = ORVO::Test::GLHooks::objects()["texture"];
+    { OGL::Texture2D const texture(OGL::Texture::INTERNAL_FORMAT_RGBA8, 1, 1, false, nullptr); }
+    EXPECT_EQ(nBefore, ORVO::Test::GLHooks::objects()["texture"]);
 }
 
 TEST_F(OldDriver, MakesTexturesWithoutPixelBuffers) {

@@ -5,6 +5,7 @@
 #include "orvo/ogl/Program.h"
 #include "orvo/ogl/TextureRECT.h"
 #include "orvo/ogl/internal/GL.h"
+#include "orvo/ogl/internal/Scopes.h"
 
 #include <algorithm>
 
@@ -12,18 +13,14 @@ namespace ORVO {
 
 namespace {
 
+using OGL::Internal::integerState;
+
 constexpr GLbitfield nSavedAttributes = GL_TEXTURE_BIT | GL_ENABLE_BIT | GL_TRANSFORM_BIT | GL_VIEWPORT_BIT |
                                         GL_COLOR_BUFFER_BIT | GL_CURRENT_BIT | GL_POINT_BIT | GL_POLYGON_BIT |
                                         GL_SCISSOR_BIT;
 
 constexpr std::array<GLenum, 3> aClampTargets{GL_CLAMP_VERTEX_COLOR, GL_CLAMP_FRAGMENT_COLOR,
                                               GL_CLAMP_READ_COLOR};
-
-int integerOf(GLenum name) noexcept {
-    GLint value = 0;
-    glGetIntegerv(name, &value);
-    return value;
-}
 
 void activateUnit(std::size_t nUnit) noexcept {
     OGL::ExtensionManager::Instance()->table()->glActiveTexture(GL_TEXTURE0 + static_cast<GLenum>(nUnit));
@@ -55,6 +52,11 @@ FrameState::Driver::Driver() {
     bPixelBuffers_ = manager.isSupported(OGL::EXTENSION_ARB_PIXEL_BUFFER_OBJECT) ||
                      manager.isSupported(OGL::EXTENSION_EXT_PIXEL_BUFFER_OBJECT);
     nVersion_ = 10 * manager.majorVersion() + manager.minorVersion();
+    bClampedColors_ = nVersion_ >= 30 || epoxy_has_gl_extension("GL_ARB_color_buffer_float");
+    bDiscards_ = nVersion_ >= 30 || epoxy_has_gl_extension("GL_EXT_transform_feedback");
+    bSamplers_ = nVersion_ >= 33 || epoxy_has_gl_extension("GL_ARB_sampler_objects");
+    bPipelines_ = nVersion_ >= 41 || epoxy_has_gl_extension("GL_ARB_separate_shader_objects");
+    bClipControl_ = nVersion_ >= 45 || epoxy_has_gl_extension("GL_ARB_clip_control");
 }
 
 FrameState::FrameState(OGL::Context const& context) : context_(context) {
@@ -83,23 +85,25 @@ void FrameState::save() {
     glGetDoublev(GL_TEXTURE_MATRIX, aTexture_.data());
     glGetDoublev(GL_CURRENT_COLOR, aColor_.data());
     bSumsColors_ = glIsEnabled(GL_COLOR_SUM) == GL_TRUE;
-    nDraw_ = integerOf(GL_FRAMEBUFFER_BINDING);
+    nDraw_ = integerState(GL_FRAMEBUFFER_BINDING);
     if (oDriver_.bSeparateFramebuffers_) {
-        nRead_ = integerOf(GL_READ_FRAMEBUFFER_BINDING);
+        nRead_ = integerState(GL_READ_FRAMEBUFFER_BINDING);
     }
     if (oDriver_.bPrograms_) {
-        nProgram_ = integerOf(GL_CURRENT_PROGRAM);
+        nProgram_ = integerState(GL_CURRENT_PROGRAM);
     }
     if (oDriver_.bPixelBuffers_) {
-        nUnpackBuffer_ = integerOf(GL_PIXEL_UNPACK_BUFFER_BINDING);
-        nPackBuffer_ = integerOf(GL_PIXEL_PACK_BUFFER_BINDING);
+        nUnpackBuffer_ = integerState(GL_PIXEL_UNPACK_BUFFER_BINDING);
+        nPackBuffer_ = integerState(GL_PIXEL_PACK_BUFFER_BINDING);
     }
-    if (oDriver_.nVersion_ >= 30) {
-        std::transform(aClampTargets.begin(), aClampTargets.end(), aClamps_.begin(), &integerOf);
+    if (oDriver_.bClampedColors_) {
+        std::transform(aClampTargets.begin(), aClampTargets.end(), aClamps_.begin(), &integerState);
+    }
+    if (oDriver_.bDiscards_) {
         bDiscards_ = glIsEnabled(GL_RASTERIZER_DISCARD) == GL_TRUE;
     }
-    if (oDriver_.nVersion_ >= 41) {
-        nPipeline_ = integerOf(GL_PROGRAM_PIPELINE_BINDING);
+    if (oDriver_.bPipelines_) {
+        nPipeline_ = integerState(GL_PROGRAM_PIPELINE_BINDING);
     }
 }
 
@@ -107,7 +111,7 @@ void FrameState::makeDrawingPlain() {
     disableAll({GL_ALPHA_TEST, GL_BLEND, GL_COLOR_LOGIC_OP, GL_COLOR_SUM, GL_CULL_FACE, GL_DEPTH_TEST, GL_FOG,
                 GL_LIGHTING, GL_POINT_SMOOTH, GL_POLYGON_SMOOTH, GL_POLYGON_STIPPLE, GL_SCISSOR_TEST,
                 GL_STENCIL_TEST});
-    for (int i = integerOf(GL_MAX_CLIP_PLANES); i-- > 0;) {
+    for (int i = integerState(GL_MAX_CLIP_PLANES); i-- > 0;) {
         glDisable(GL_CLIP_PLANE0 + static_cast<GLenum>(i));
     }
     glColorMask(GL_TRUE, GL_TRUE, GL_TRUE, GL_TRUE);
@@ -128,31 +132,30 @@ void FrameState::makeDrawingPlain() {
     if (oDriver_.nVersion_ >= 20) {
         disableAll({GL_POINT_SPRITE, GL_VERTEX_PROGRAM_POINT_SIZE});
     }
-    if (oDriver_.nVersion_ >= 30) {
-        // As in the library's own contexts: values beyond 0..1 pass.
-        glClampColor(GL_CLAMP_VERTEX_COLOR, GL_FALSE);
-        glClampColor(GL_CLAMP_FRAGMENT_COLOR, GL_FIXED_ONLY);
-        glClampColor(GL_CLAMP_READ_COLOR, GL_FIXED_ONLY);
+    if (oDriver_.bClampedColors_) {
+        OGL::Internal::clampNoFloats();
+    }
+    if (oDriver_.bDiscards_) {
         glDisable(GL_RASTERIZER_DISCARD);
     }
     if (nPipeline_ != 0) {
         glBindProgramPipeline(0);
     }
-    if (oDriver_.nVersion_ >= 45) {
+    if (oDriver_.bClipControl_) {
         glClipControl(GL_LOWER_LEFT, GL_NEGATIVE_ONE_TO_ONE);
     }
 }
 
 void FrameState::makeUnitsPlain() {
     // Passes without a program of their own see all of fixed function.
-    auto const nFixed = static_cast<std::size_t>(integerOf(GL_MAX_TEXTURE_UNITS));
-    if (oDriver_.nVersion_ >= 33) {
-        nUnits_ = std::min(static_cast<std::size_t>(integerOf(GL_MAX_TEXTURE_IMAGE_UNITS)), nMostUnits_);
+    auto const nFixed = static_cast<std::size_t>(integerState(GL_MAX_TEXTURE_UNITS));
+    if (oDriver_.bSamplers_) {
+        nUnits_ = std::min(static_cast<std::size_t>(integerState(GL_MAX_TEXTURE_IMAGE_UNITS)), nMostUnits_);
     }
     for (std::size_t i = std::max(nFixed, nUnits_); i-- > 0;) {
         activateUnit(i);
         if (i < nUnits_) {
-            aSamplers_[i] = integerOf(GL_SAMPLER_BINDING);
+            aSamplers_[i] = integerState(GL_SAMPLER_BINDING);
             if (aSamplers_[i] != 0) {
                 glBindSampler(static_cast<GLuint>(i), 0);
             }
@@ -171,12 +174,22 @@ void FrameState::makeUnitsPlain() {
 }
 
 void FrameState::makeArraysPlain() const {
-    for (GLenum const array : {GL_COLOR_ARRAY, GL_EDGE_FLAG_ARRAY, GL_INDEX_ARRAY, GL_NORMAL_ARRAY,
-                               GL_TEXTURE_COORD_ARRAY, GL_VERTEX_ARRAY}) {
+    // A driver may fetch from all that are enabled, also where a frame draws more vertices than they have.
+    for (GLenum const array :
+         {GL_COLOR_ARRAY, GL_EDGE_FLAG_ARRAY, GL_INDEX_ARRAY, GL_NORMAL_ARRAY, GL_VERTEX_ARRAY}) {
         glDisableClientState(array);
     }
+    if (oDriver_.nVersion_ >= 14) {
+        glDisableClientState(GL_SECONDARY_COLOR_ARRAY);
+        glDisableClientState(GL_FOG_COORD_ARRAY);
+    }
+    for (int i = integerState(oDriver_.nVersion_ >= 20 ? GL_MAX_TEXTURE_COORDS : GL_MAX_TEXTURE_UNITS);
+         i-- > 0;) {
+        glClientActiveTexture(GL_TEXTURE0 + static_cast<GLenum>(i));
+        glDisableClientState(GL_TEXTURE_COORD_ARRAY);
+    }
     // The first of the generic ones would take the place of the vertices.
-    for (int i = oDriver_.nVersion_ >= 20 ? integerOf(GL_MAX_VERTEX_ATTRIBS) : 0; i-- > 0;) {
+    for (int i = oDriver_.nVersion_ >= 20 ? integerState(GL_MAX_VERTEX_ATTRIBS) : 0; i-- > 0;) {
         glDisableVertexAttribArray(static_cast<GLuint>(i));
     }
     if (nUnpackBuffer_ != 0) {
@@ -194,13 +207,13 @@ void FrameState::restore() const noexcept {
     if (nPipeline_ != 0) {
         glBindProgramPipeline(static_cast<GLuint>(nPipeline_));
     }
-    if (oDriver_.nVersion_ >= 30) {
+    if (oDriver_.bClampedColors_) {
         for (std::size_t i = 0; i < aClampTargets.size(); ++i) {
             glClampColor(aClampTargets[i], static_cast<GLenum>(aClamps_[i]));
         }
-        if (bDiscards_) {
-            glEnable(GL_RASTERIZER_DISCARD);
-        }
+    }
+    if (bDiscards_) {
+        glEnable(GL_RASTERIZER_DISCARD);
     }
     if (nUnpackBuffer_ != 0) {
         bindBuffer(GL_PIXEL_UNPACK_BUFFER, nUnpackBuffer_);

@@ -38,6 +38,11 @@ private:
         bool bFragmentAssembly_;
         bool bSeparateFramebuffers_;
         bool bPixelBuffers_;
+        bool bClampedColors_;
+        bool bDiscards_;
+        bool bSamplers_;
+        bool bPipelines_;
+        bool bClipControl_;
         unsigned nVersion_; ///< ten times the major one, and the minor one
     };
 

@@ -53,6 +53,12 @@ void addSources(ShaderProgramProxyOGL& oProgram, std::string const& sVertex, std
     pManager->RegisterShaderProgram(&oProgram);
 }
 
+void clearErrorsOfContext() noexcept {
+    if (OGL::NativeContext::currentHandle() != nullptr) {
+        OGL::Internal::clearErrors();
+    }
+}
+
 /// Unit 0 with 2D texturing enabled and the active one; at the end it is as it was.
 void enableInputUnit(GLStateStack& states) {
     states.push_back(ORVO_NEW ScopedActiveTextureUnitRestore());
@@ -102,16 +108,16 @@ FastBilateralFilterGPU::FastBilateralFilterGPU()
     registerParameter(spSpatialSigma_.get());
     registerParameter(spRangeSigma_.get());
     registerParameter(spColorize_.get());
+    // What a host left pending says nothing of what is tried here.
+    clearErrorsOfContext();
     try {
         pFramebuffer_ = std::make_unique<OGL::Framebuffer>();
         probeFloatTargets();
         compilePrograms();
     } catch (...) {
         bRunInHardware_ = false;
-        if (OGL::NativeContext::currentHandle() != nullptr) {
-            // Nobody asked for what failed here: the next frame in the context must not find it.
-            OGL::Internal::clearErrors();
-        }
+        // Nobody asked for what failed here: the next frame in the context must not find it.
+        clearErrorsOfContext();
     }
     if (!bRunInHardware_) {
         // Programs may be missing: without a framebuffer no frame begins.

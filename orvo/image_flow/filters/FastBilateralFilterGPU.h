@@ -52,7 +52,7 @@ class PixelBuffer;
 ///
 /// Made with a context current that the image runtime knows. Without one, or on a driver without textures of
 /// floats that can be drawn to, the filter stands, willRunInHardware() is false, and a run is refused. The
-/// context's bindings are as they were; errors of OpenGL that are pending where that failed are cleared.
+/// context's bindings are as they were; errors of OpenGL that are pending before or after are cleared.
 ///
 /// Threads: as ImageFilter; a run needs the controller's context current.
 class ORVO_API FastBilateralFilterGPU : public ImageFilter {

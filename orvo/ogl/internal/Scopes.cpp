@@ -58,6 +58,12 @@ int integerState(unsigned nName) noexcept {
     return value;
 }
 
+void clampNoFloats() noexcept {
+    glClampColor(GL_CLAMP_VERTEX_COLOR, GL_FALSE);
+    glClampColor(GL_CLAMP_FRAGMENT_COLOR, GL_FIXED_ONLY);
+    glClampColor(GL_CLAMP_READ_COLOR, GL_FIXED_ONLY);
+}
+
 unsigned boundBuffer(unsigned nTarget) noexcept {
     bool const bPixels = nTarget == GL_PIXEL_UNPACK_BUFFER || nTarget == GL_PIXEL_PACK_BUFFER;
     if (bPixels && !hasPixelBuffers())

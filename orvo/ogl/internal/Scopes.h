@@ -72,5 +72,7 @@ unsigned boundBuffer(unsigned nTarget) noexcept;
 unsigned boundTexture(unsigned nTarget) noexcept;
 /// The value of a state with one integer.
 int integerState(unsigned nName) noexcept;
+/// Lets values beyond 0..1 pass, where pixels are floats; for drivers that can clamp them.
+void clampNoFloats() noexcept;
 
 } // namespace ORVO::OGL::Internal

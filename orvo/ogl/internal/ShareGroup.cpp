@@ -86,6 +86,9 @@ void ShareGroup::destroy(Kind eKind, unsigned nName) const noexcept {
         deleteName({eKind, nName});
         return;
     }
+    // Without a sync object the next context that is current may be a stranger's, and the number his object.
+    if (pSync_ == nullptr)
+        return;
     try {
         std::lock_guard const guard(oLock_);
         aWaiting_.push_back({eKind, nName});

@@ -34,7 +34,8 @@ public:
     bool isCurrent() const noexcept;
 
     /// Deletes a name of the group: at once if a context of the group is current, else when deleteWaiting is
-    /// called in one. Without memory to remember it the name lives as long as the group.
+    /// called in one. Without memory to remember it, or without a sync object to know the group by, the name
+    /// lives as long as the group.
     void destroy(Kind eKind, unsigned nName) const noexcept;
 
     /// Deletes what waits, if a context of the group is current.

@@ -5,6 +5,7 @@
 
 #include "orvo/image_flow/filters/FastBilateralFilterGPU.h"
 #include "orvo/ogl/Buffer.h"
+#include "orvo/ogl/ExtensionManager.h"
 #include "orvo/ogl/TextureRECT.h"
 
 namespace {
@@ -14,6 +15,19 @@ using namespace ORVO::Test;
 
 using HostValues = std::vector<double>;
 
+/// Arrays that drivers may fetch from, though nothing of the frame is in them.
+void expectNoArrays() {
+    for (GLenum const array : {GL_SECONDARY_COLOR_ARRAY, GL_FOG_COORD_ARRAY})
+        EXPECT_EQ(GLboolean{GL_FALSE}, glIsEnabled(array)) << array;
+    GLint nUnit = 0;
+    glGetIntegerv(GL_CLIENT_ACTIVE_TEXTURE, &nUnit);
+    EXPECT_EQ(GL_TEXTURE0, nUnit);
+    for (GLenum const unit : {GL_TEXTURE3, GL_TEXTURE1, GL_TEXTURE0}) {
+        glClientActiveTexture(unit);
+        EXPECT_EQ(GLboolean{GL_FALSE}, glIsEnabled(GL_TEXTURE_COORD_ARRAY)) << unit;
+    }
+}
+
 /// Draws its input without a program.
 class FixedFunctionCopy : public SimpleFilterGPU {
 public:
@@ -22,6 +36,7 @@ public:
 
 protected:
     void internalProcess() override {
+        expectNoArrays();
         preRender();
         inputImageGPU(0)->bind(0);
         inputImageGPU(0)->setFilter(GL_NEAREST, GL_NEAREST);
@@ -312,6 +327,35 @@ HostSetting const aHostSettings[] = {
          glDisableVertexAttribArray(0);
          glDisableVertexAttribArray(3);
      }},
+    {"ArraysThatNothingIsDrawnFrom",
+     [] {
+         glSecondaryColorPointer(3, GL_FLOAT, 0, aHostNowhere);
+         glFogCoordPointer(GL_FLOAT, 0, aHostNowhere);
+         for (GLenum const array : {GL_SECONDARY_COLOR_ARRAY, GL_FOG_COORD_ARRAY})
+             glEnableClientState(array);
+         for (GLenum const unit : {GL_TEXTURE3, GL_TEXTURE1}) {
+             glClientActiveTexture(unit);
+             glTexCoordPointer(4, GL_FLOAT, 0, aHostNowhere);
+             glEnableClientState(GL_TEXTURE_COORD_ARRAY);
+         }
+     },
+     [] {
+         HostValues aValues{hostInteger(GL_CLIENT_ACTIVE_TEXTURE), hostEnabled(GL_SECONDARY_COLOR_ARRAY),
+                            hostEnabled(GL_FOG_COORD_ARRAY)};
+         for (GLenum const unit : {GL_TEXTURE3, GL_TEXTURE1}) {
+             glClientActiveTexture(unit);
+             aValues.push_back(hostEnabled(GL_TEXTURE_COORD_ARRAY));
+         }
+         return aValues;
+     },
+     [] {
+         for (GLenum const array : {GL_SECONDARY_COLOR_ARRAY, GL_FOG_COORD_ARRAY})
+             glDisableClientState(array);
+         for (GLenum const unit : {GL_TEXTURE3, GL_TEXTURE1, GL_TEXTURE0}) {
+             glClientActiveTexture(unit);
+             glDisableClientState(GL_TEXTURE_COORD_ARRAY);
+         }
+     }},
     {"AVertexArrayObject",
      [] {
          glGenVertexArrays(1, aHostNames);
@@ -513,9 +557,12 @@ HostSetting const aHostSettings[] = {
      }},
 };
 
-class HostSettingsTest : public ShaderFlowTest {};
+class HostSettingsTest : public ShaderFlowTest {
+protected:
+    void expectNoEffect();
+};
 
-TEST_F(HostSettingsTest, ChangeNoPixelAndStayAsTheyAre) {
+void HostSettingsTest::expectNoEffect() {
     constexpr char const* aRoads[] = {"fixed function", "shader", "bilateral filter", "bytes", "floats"};
     AllRoads ownRoads(frameContext());
     ownRoads.launch();
@@ -539,6 +586,13 @@ TEST_F(HostSettingsTest, ChangeNoPixelAndStayAsTheyAre) {
         for (std::size_t i = 0; i < aExpected.size(); ++i)
             EXPECT_TRUE(aExpected[i] == aActual[i]) << aRoads[i];
     }
+}
+
+TEST_F(HostSettingsTest, ChangeNoPixelAndStayAsTheyAre) { expectNoEffect(); }
+
+TEST_F(HostSettingsTest, DoSoAlsoWhereOnlyExtensionsHaveThem) {
+    OGL::ExtensionManager::Instance()->overrideVersion(2, 1);
+    expectNoEffect();
 }
 
 } // namespace

@@ -118,6 +118,12 @@ TEST_F(FastBilateralFilterGPUDriverTest, RefusesToRunWhenMadeWithoutAContext) {
     expectRefusal(filter);
 }
 
+TEST_F(FastBilateralFilterGPUDriverTest, RunsWhereAHostLeftAnErrorPending) {
+    glEnable(GL_NONE);
+    EXPECT_TRUE(FastBilateralFilterGPU().willRunInHardware());
+    EXPECT_EQ(GLenum(GL_NO_ERROR), glGetError());
+}
+
 TEST_F(FastBilateralFilterGPUDriverTest, LeavesTheFramebuffersOfAHostBound) {
     std::array<GLuint, 2> aNames{};
     glGenFramebuffers(2, aNames.data());
